@@ -100,7 +100,7 @@ TEST(ErrorClusterStyle, IncomingErrorMakesTheCallANoOp) {
     e.status = 1;
     e.code = -1234;
     InitializeAnalysisWorkspaceH(1024, &e);
-    EXPECT_EQ(e.code, -1234);
+    EXPECT_EQ(int32_t{e.code}, -1234);
     EXPECT_EQ(e.status, 1);
 }
 

@@ -25,7 +25,7 @@ TEST(ArenaStress, LiveBlocksNeverOverlapAndTheArenaReturnsToBase) {
     ErrorCluster e{};
     InitializeAnalysisWorkspaceH(1 << 20, &e);
     EnableAnalysisWorkspaceH(&e);
-    ASSERT_EQ(e.code, 0);
+    ASSERT_EQ(int32_t{e.code}, 0);
 
     constexpr int kThreads = 4;
     std::atomic<long> corrupt{0}, served{0}, refused{0};
@@ -79,7 +79,7 @@ TEST(ArenaStress, LiveBlocksNeverOverlapAndTheArenaReturnsToBase) {
     EXPECT_EQ(view.cursor, view.base);
     DisableAnalysisWorkspaceH(&e);
     UninitializeAnalysisWorkspaceH(&e);
-    EXPECT_EQ(e.code, 0);
+    EXPECT_EQ(int32_t{e.code}, 0);
     std::printf("served %ld blocks, %ld refused for want of room\n", served.load(), refused.load());
 }
 
