@@ -23,9 +23,7 @@ inline constexpr double kEuler = 0.5772156649015329;
 inline constexpr double kInf = std::bit_cast<double>(uint64_t{0x7FF0000000000000});
 
 // Classification by bit pattern: the comparisons of a NaN are never trusted for a screen.
-inline bool IsNaN(double x) {
-    return (std::bit_cast<uint64_t>(x) & 0x7FFFFFFFFFFFFFFF) > 0x7FF0000000000000;
-}
+inline bool IsNaN(double x) { return (std::bit_cast<uint64_t>(x) & 0x7FFFFFFFFFFFFFFF) > 0x7FF0000000000000; }
 inline bool IsPosInf(double x) { return std::bit_cast<uint64_t>(x) == 0x7FF0000000000000; }
 inline bool IsNegInf(double x) { return std::bit_cast<uint64_t>(x) == 0xFFF0000000000000; }
 inline bool IsFinite(double x) {

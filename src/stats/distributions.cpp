@@ -119,8 +119,7 @@ Status FisherQuantile(double p, int32_t numeratorDf, int32_t denominatorDf, doub
         return 0;
     }
     // Below F(1e-6) the lower end never moves: the result is 1e-6, not 0.
-    *f = Bisect(1e-6, 10000.0,
-                [&](double mid) { return !(p <= FCdf(mid, numeratorDf, denominatorDf)); });
+    *f = Bisect(1e-6, 10000.0, [&](double mid) { return !(p <= FCdf(mid, numeratorDf, denominatorDf)); });
     return 0;
 }
 

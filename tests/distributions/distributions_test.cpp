@@ -1,5 +1,7 @@
 // Check orders, boundary results and the bisections' fixed brackets of the distribution exports.
 // Values marked "scipy" come from scipy.stats; the rest follow from the definitions.
+#include "twanlys/distributions.h"
+
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -9,7 +11,6 @@
 #include <string>
 #include <vector>
 
-#include "twanlys/distributions.h"
 #include "twrt.h"
 
 namespace {
@@ -75,7 +76,8 @@ TEST(Distributions, NormalPair) {
         // A NaN probability passes the range test and is not reported.
         Exactly("p = NaN", std::bind(InvN, kNaN, _1, _2), 0, kNaN),
         // scipy: norm.ppf(0.975) = 1.959963984540054
-        {"p = 0.975", std::bind(InvN, 0.975, _1, _2), 0, 1.959963984540054 - 4.5e-4, 1.959963984540054 + 4.5e-4},
+        {"p = 0.975", std::bind(InvN, 0.975, _1, _2), 0, 1.959963984540054 - 4.5e-4,
+         1.959963984540054 + 4.5e-4},
     });
 }
 
@@ -136,7 +138,8 @@ TEST(Distributions, InverseChecksAndFixedBrackets) {
         Exactly("chi: p = 0", std::bind(ChiInv, 0.0, 4, _1, _2), 0, 0.0),
         Exactly("chi: p = 1", std::bind(ChiInv, 1.0, 4, _1, _2), 0, kInf),
         // two degrees: quantile -2 ln(1 - p)
-        {"chi: two degrees", std::bind(ChiInv, 0.5, 2, _1, _2), 0, 2 * std::log(2.0) - 1e-4, 2 * std::log(2.0)},
+        {"chi: two degrees", std::bind(ChiInv, 0.5, 2, _1, _2), 0, 2 * std::log(2.0) - 1e-4,
+         2 * std::log(2.0)},
         // scipy: chi2.ppf(0.5, 1e6) = 999999.3333334123, beyond 200 raises of the upper end
         {"chi: a million degrees", std::bind(ChiInv, 0.5, 1000000, _1, _2), 0, 999999.3333334123 - 1e-4,
          999999.3333334123},

@@ -115,7 +115,8 @@ TEST(GammaFamily, PolesAreNaNAndSelectorsChooseTheForm) {
         {"_85 selector 0 with NaN x", [] { return Sel(TW_Gamma_85, 0, 5.0, kQNaN); }, kQNaN},
         {"_85 selector 1 ignores x", [] { return Sel(TW_Gamma_85, 1, 5.0, 2.0); }, 24.0},
         // scipy.special.gammainc(5, 2)
-        {"_85 selector 2 is incomplete", [] { return Sel(TW_Gamma_85, 2, 5.0, 2.0); }, 0.052653017343711125, 4},
+        {"_85 selector 2 is incomplete", [] { return Sel(TW_Gamma_85, 2, 5.0, 2.0); }, 0.052653017343711125,
+         4},
         {"Gamma(0)", [] { return Sel(TW_Gamma_85, 1, 0.0, 1.0); }, kQNaN},
         {"Gamma(-0)", [] { return Call(TW_Gamma, -0.0, kQNaN); }, kQNaN},
         {"Gamma(-1)", [] { return Call(TW_Gamma, -1.0, kQNaN); }, kQNaN},

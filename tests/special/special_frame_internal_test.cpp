@@ -44,8 +44,8 @@ TEST(SpecialFrame, EvalChebyshevSumsInHalfArgument) {
 }
 
 TEST(SpecialFrame, NaNTestReadsTheBitPattern) {
-    for (const uint64_t bits : {0x7FF8000000000000ull, 0xFFF8000000000000ull, 0x7FF0000000000001ull,
-                                0xFFFFFFFFFFFFFFFFull}) {
+    for (const uint64_t bits :
+         {0x7FF8000000000000ull, 0xFFF8000000000000ull, 0x7FF0000000000001ull, 0xFFFFFFFFFFFFFFFFull}) {
         EXPECT_TRUE(IsNaN(std::bit_cast<double>(bits))) << std::hex << bits;
         EXPECT_FALSE(IsFinite(std::bit_cast<double>(bits)));
     }
