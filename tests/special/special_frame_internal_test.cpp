@@ -7,10 +7,6 @@
 #include <cstdint>
 
 #include "special/special_frame.hpp"
-#include "twrt.h"
-
-// Nothing here calls the host, but the suite's workspace run binds it: keep the host linked in.
-const int32_t* gSpecialSuiteHost = &gTWRTVersion;
 
 namespace {
 
