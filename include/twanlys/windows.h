@@ -54,4 +54,32 @@ TW_API int32_t Kaiser_Bessel(Array1DHandle x, double beta, int32_t* status);
 TW_API int32_t ForceWindCIN(Array1DHandle x, double duty, int32_t* status);
 TW_API int32_t ExpWindCIN(Array1DHandle x, double final, int32_t* status);
 
+/* Windows by number. AllWinH: a NaN parameter takes the window's default (for 61 and 62 also a
+ * negative one), and 61 takes its parameter in dB; scaled divides by the coherent gain,
+ * symmetric builds the form symmetric about (n-1)/2; the two flags exclude each other. */
+TW_API int32_t AllWinH(Array1DHandle x, int32_t window, double parameter, int32_t scaled, int32_t symmetric);
+TW_API int32_t CxAllWinH(Array1DHandle x, int32_t window, double parameter, int32_t scaled,
+                         int32_t symmetric);
+/* The next five take the parameter as it is: 61 as a linear ratio, no defaults. */
+TW_API int32_t ScaledWinH(Array1DHandle x, int32_t window, double parameter, WindowConstants* constants);
+TW_API int32_t CxScaledWinH(Array1DHandle x, int32_t window, double parameter, WindowConstants* constants);
+TW_API int32_t SymmWinH(Array1DHandle x, int32_t window, double parameter);
+TW_API int32_t CxSymmWinH(Array1DHandle x, int32_t window, double parameter);
+/* Constants of the window of length n; NaN on failure. */
+TW_API int32_t WinConstByNameH(int32_t n, int32_t window, double parameter, WindowConstants* constants);
+/* The same with the parameter defaults and dB translation of AllWinH. */
+TW_API int32_t WinConstByNameH_2016(int32_t n, int32_t window, double parameter,
+                                   WindowConstants* constants);
+/* Constants of the window w itself; NaN for an empty w. */
+TW_API void NumWinConstH(Array1DHandle w, WindowConstants* constants);
+
+/* Cosine sums: by number (0 to 9, 11), or from the coefficients a, applied as
+ * sum over j of (-1)^j a[j] cos(2 pi j k / n). Scaled divides by a[0], the coherent gain. */
+TW_API int32_t AllCosWinH(Array1DHandle x, int32_t window, int32_t scaled);
+TW_API int32_t CxAllCosWinH(Array1DHandle x, int32_t window, int32_t scaled);
+TW_API int32_t GenCosWinH(Array1DHandle x, Array1DHandle a);
+TW_API int32_t CxGenCosWinH(Array1DHandle x, Array1DHandle a);
+TW_API int32_t ScaledGenCosWinH(Array1DHandle x, Array1DHandle a);
+TW_API int32_t ScaledCxGenCosWinH(Array1DHandle x, Array1DHandle a);
+
 #endif

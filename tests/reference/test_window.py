@@ -30,6 +30,43 @@ declare("GaussWinH", D, I)
 declare("ForceWinH", D)
 declare("ExpWinH", D)
 declare("CosTaperedH", D)
+declare("AllWinH", I, D, I, I)
+declare("SymmWinH", I, D)
+declare("AllCosWinH", I, I)
+declare("GenCosWinH", ctypes.c_void_p)
+for _name in ("ScaledWinH", "CxScaledWinH"):
+    getattr(tw.lib, _name).argtypes = [ctypes.c_void_p, I, D, ctypes.c_void_p]
+tw.lib.ScaledGenCosWinH.argtypes = [ctypes.c_void_p, ctypes.c_void_p]
+tw.lib.ScaledCxGenCosWinH.argtypes = [ctypes.c_void_p, ctypes.c_void_p]
+for _name in ("WinConstByNameH", "WinConstByNameH_2016"):
+    getattr(tw.lib, _name).argtypes = [I, I, D, ctypes.c_void_p]
+tw.lib.NumWinConstH.argtypes = [ctypes.c_void_p, ctypes.c_void_p]
+tw.lib.NumWinConstH.restype = None
+
+# Cosine-sum coefficients by window number.
+COSINE_SUMS = {
+    1: [0.5, 0.5],
+    2: [0.54, 0.46],
+    3: [0.42323, 0.49755, 0.07922],
+    4: [0.4265907136715391, 0.4965606190885641, 0.07684866723989682],
+    5: [0.42, 0.5, 0.08],
+    6: [0.215578948, 0.41663158, 0.277263158, 0.083578947, 0.006947368],
+    7: [0.35875, 0.48829, 0.14128, 0.01168],
+    8: [0.27105140069342415, 0.43329793923448606, 0.21812299954311062, 0.0659254463880309,
+        0.010811742098372268, 0.0007765848252250934, 1.3887217350903198e-05],
+    9: [0.323215218, 0.471492057, 0.17553428, 0.028497078, 0.001261367],
+    11: [0.3635819, 0.4891775, 0.1365995, 0.0106411],
+}
+SHORTCUTS = {1: windows.hann, 2: windows.hamming, 5: windows.blackman, 7: windows.blackmanharris,
+             11: windows.nuttall}
+
+
+class Constants(ctypes.Structure):
+    _fields_ = [("enbw", ctypes.c_double), ("gain", ctypes.c_double)]
+
+
+def numpy_constants(w):
+    return len(w) * np.sum(w * w) / np.sum(w) ** 2, np.mean(w)
 
 
 def window(name, n, *args, data=None):
@@ -150,6 +187,97 @@ class ParametricWindows(unittest.TestCase):
                 w_low, _ = window("DolChebyWinH", 9, 0.25, flag)
                 w_one, _ = window("DolChebyWinH", 9, 1.0, flag)
                 np.testing.assert_array_equal(w_low, w_one)
+
+
+
+class NumberedWindows(unittest.TestCase):
+    def test_cosine_sums(self):
+        for number, a in COSINE_SUMS.items():
+            for n in LENGTHS:
+                atol = 4e-16 * n * np.sum(a)
+                ref = windows.general_cosine(n, a, sym=False)
+                w, s = window("AllWinH", n, number, float("nan"), 0, 0)
+                self.assertEqual(s, 0)
+                np.testing.assert_allclose(w, ref, rtol=0, atol=atol, err_msg="number %d n=%d" % (number, n))
+                if number in SHORTCUTS:
+                    np.testing.assert_allclose(w, SHORTCUTS[number](n, sym=False), rtol=0, atol=atol)
+                ws, s = window("AllCosWinH", n, number, 1)
+                self.assertEqual(s, 0)
+                np.testing.assert_allclose(ws, ref / a[0], rtol=0, atol=atol / a[0])
+                if n > 2:
+                    sym, s = window("SymmWinH", n, number, 0.0)
+                    self.assertEqual(s, 0)
+                    np.testing.assert_allclose(sym, windows.general_cosine(n, a, sym=True), rtol=0, atol=atol)
+
+    def test_general_cosine_sum(self):
+        rng = np.random.default_rng(11)
+        for m in (1, 2, 3, 6, 9):
+            a = rng.uniform(0.1, 1.0, m)
+            c = tw.array(a)
+            for n in (1, 2, 7, 64, 301):
+                data = rng.standard_normal(n)
+                w, s = window("GenCosWinH", n, c.h, data=data)
+                self.assertEqual(s, 0)
+                ref = data * windows.general_cosine(n, a, sym=False)
+                np.testing.assert_allclose(w, ref, rtol=0, atol=4e-16 * n * np.sum(a) * np.max(np.abs(data)))
+                z = data + 1j * rng.standard_normal(n)
+                x = tw.array(z, np.complex128)
+                self.assertEqual(tw.lib.ScaledCxGenCosWinH(x.h, c.h), 0)
+                zr, zi = tw.array(z.real), tw.array(z.imag)
+                tw.lib.ScaledGenCosWinH(zr.h, c.h)
+                tw.lib.ScaledGenCosWinH(zi.h, c.h)
+                np.testing.assert_array_equal(x.numpy(), zr.numpy() + 1j * zi.numpy())
+
+    def test_symmetric_forms(self):
+        # Length 2 is built from a periodic window of length 1, which is 1: both elements stay.
+        for number in (1, 30, 60):
+            self.assertEqual(window("SymmWinH", 2, number, 3.0)[0].tolist(), [1.0, 1.0])
+        cases = [(30, 0.0, lambda n: windows.bartlett(n, sym=True), 2.3e-16),
+                 (31, 0.0, lambda n: windows.barthann(n, sym=True), 2e-15),
+                 (32, 0.0, lambda n: windows.bohman(n, sym=True), 2e-15),
+                 (60, 6.0, lambda n: windows.kaiser(n, 6.0, sym=True), 1e-9),
+                 (62, 0.25, lambda n: windows.gaussian(n, n * 0.25, sym=True), 1e-15)]
+        for number, p, ref, atol in cases:
+            for n in LENGTHS[1:]:
+                w, s = window("SymmWinH", n, number, p)
+                self.assertEqual(s, 0)
+                np.testing.assert_allclose(w, ref(n), rtol=0, atol=atol, err_msg="number %d n=%d" % (number, n))
+                w2, s = window("AllWinH", n, number, p, 0, 1)
+                np.testing.assert_array_equal(w2, w)
+
+    def test_scaled_windows_and_constants(self):
+        rng = np.random.default_rng(3)
+        for number, p in [(30, 0.0), (31, 0.0), (32, 0.0), (33, 0.0), (34, 0.0), (60, 4.0), (62, 0.3)]:
+            for n in (2, 7, 64, 255):
+                plain, _ = window("AllWinH", n, number, p, 0, 0)
+                enbw, gain = numpy_constants(plain)
+                data = rng.standard_normal(n)
+                x = tw.array(data)
+                c = Constants()
+                self.assertEqual(tw.lib.ScaledWinH(x.h, number, p, ctypes.byref(c)), 0)
+                # Sums in index order against NumPy's pairwise sums.
+                np.testing.assert_allclose([c.enbw, c.gain], [enbw, gain], rtol=2e-16 * n)
+                # The gain checked above scales the plain window, as x * w * (1 / gain).
+                np.testing.assert_array_equal(x.numpy(), data * plain * (1 / c.gain))
+                byname = Constants()
+                self.assertEqual(tw.lib.WinConstByNameH(n, number, p, ctypes.byref(byname)), 0)
+                self.assertEqual((byname.enbw, byname.gain), (c.enbw, c.gain))
+                measured, held = Constants(), tw.array(plain)
+                tw.lib.NumWinConstH(held.h, ctypes.byref(measured))
+                self.assertEqual((measured.enbw, measured.gain), (byname.enbw, byname.gain))
+        # Hann of length 1000: the table's ENBW 1.5 and coherent gain 0.5 match the measured ones.
+        hann, _ = window("AllWinH", 1000, 1, 0.0, 0, 0)
+        np.testing.assert_allclose(numpy_constants(hann), [1.5, 0.5], rtol=1e-12)
+
+    def test_dB_translation(self):
+        a, b = Constants(), Constants()
+        s1 = tw.lib.WinConstByNameH_2016(32, 61, 40.0, ctypes.byref(a))
+        s2 = tw.lib.WinConstByNameH(32, 61, 100.0, ctypes.byref(b))
+        self.assertEqual(s1, s2)
+        if s1 == 0:
+            self.assertEqual((a.enbw, a.gain), (b.enbw, b.gain))
+            w = windows.chebwin(33, at=40.0, sym=True)[:-1]
+            np.testing.assert_allclose([a.enbw, a.gain], numpy_constants(w), rtol=1e-12)
 
 
 if __name__ == "__main__":
