@@ -21,17 +21,16 @@ TW_API int32_t SineWaveCIN(Array1DHandle out, int32_t* length, double* amplitude
                            double* phase, int32_t* status);
 TW_API int32_t SquareWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
                              double* phase, double* duty, int32_t* status);
-TW_API int32_t TriangleWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                               double* frequency, double* phase, int32_t* status);
-TW_API int32_t SawtoothWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                               double* frequency, double* phase, int32_t* status);
+TW_API int32_t TriangleWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                               double* phase, int32_t* status);
+TW_API int32_t SawtoothWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                               double* phase, int32_t* status);
 /* One period of the wave is the table; interpolation 1 is linear, any other value takes the
  * sample at or below the position. */
-TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                                double* frequency, double* phase, Array1DHandle table,
-                                int32_t* interpolation, int32_t* status);
+TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                                double* phase, Array1DHandle table, int32_t* interpolation, int32_t* status);
 /* A linear chirp from start to end frequency over the block; no phase is carried. */
-TW_API int32_t ChirpCIN(Array1DHandle out, int32_t* length, double* amplitude, double* start,
-                        double* end, int32_t* status);
+TW_API int32_t ChirpCIN(Array1DHandle out, int32_t* length, double* amplitude, double* start, double* end,
+                        int32_t* status);
 
 #endif

@@ -68,8 +68,7 @@ TW_API int32_t CxSymmWinH(Array1DHandle x, int32_t window, double parameter);
 /* Constants of the window of length n; NaN on failure. */
 TW_API int32_t WinConstByNameH(int32_t n, int32_t window, double parameter, WindowConstants* constants);
 /* The same with the parameter defaults and dB translation of AllWinH. */
-TW_API int32_t WinConstByNameH_2016(int32_t n, int32_t window, double parameter,
-                                   WindowConstants* constants);
+TW_API int32_t WinConstByNameH_2016(int32_t n, int32_t window, double parameter, WindowConstants* constants);
 /* Constants of the window w itself; NaN for an empty w. */
 TW_API void NumWinConstH(Array1DHandle w, WindowConstants* constants);
 

@@ -40,25 +40,24 @@ TW_API int32_t SquareWaveCIN(Array1DHandle out, int32_t* length, double* amplitu
     });
 }
 
-TW_API int32_t TriangleWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                               double* frequency, double* phase, int32_t* status) {
+TW_API int32_t TriangleWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                               double* phase, int32_t* status) {
     return Generate(out, length, status, [&](Frame&, double* y, int32_t n) {
         TriangleWave(y, n, *amplitude, *frequency, phase);
         return Status{0};
     });
 }
 
-TW_API int32_t SawtoothWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                               double* frequency, double* phase, int32_t* status) {
+TW_API int32_t SawtoothWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                               double* phase, int32_t* status) {
     return Generate(out, length, status, [&](Frame&, double* y, int32_t n) {
         SawtoothWave(y, n, *amplitude, *frequency, phase);
         return Status{0};
     });
 }
 
-TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* amplitude,
-                                double* frequency, double* phase, Array1DHandle table,
-                                int32_t* interpolation, int32_t* status) {
+TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* amplitude, double* frequency,
+                                double* phase, Array1DHandle table, int32_t* interpolation, int32_t* status) {
     return Generate(out, length, status, [&](Frame& f, double* y, int32_t n) {
         const double* wave = nullptr;
         if (const Status s = f.In(table, &wave)) return s;
@@ -66,8 +65,8 @@ TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* ampl
     });
 }
 
-TW_API int32_t ChirpCIN(Array1DHandle out, int32_t* length, double* amplitude, double* start,
-                        double* end, int32_t* status) {
+TW_API int32_t ChirpCIN(Array1DHandle out, int32_t* length, double* amplitude, double* start, double* end,
+                        int32_t* status) {
     return Generate(out, length, status, [&](Frame&, double* y, int32_t n) {
         Chirp(y, n, *amplitude, *start, *end);
         return Status{0};

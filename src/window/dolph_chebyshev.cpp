@@ -52,7 +52,6 @@ Status DolphChebyshevWindow(T* x, int32_t n, double s, int32_t symmetric,
 }
 
 template Status DolphChebyshevWindow<double>(double*, int32_t, double, int32_t, const ChebyshevTransforms&);
-template Status DolphChebyshevWindow<cdouble>(cdouble*, int32_t, double, int32_t,
-                                              const ChebyshevTransforms&);
+template Status DolphChebyshevWindow<cdouble>(cdouble*, int32_t, double, int32_t, const ChebyshevTransforms&);
 
 }  // namespace tw

@@ -57,9 +57,7 @@ Status BartlettHannWindow(T* x, int32_t n) {
 
 template <class T>
 Status BohmanWindow(T* x, int32_t n) {
-    return PhasorMirrored(x, n, [n](int32_t k, double c, double s) {
-        return s * kInvPi - 2.0 * k / n * c;
-    });
+    return PhasorMirrored(x, n, [n](int32_t k, double c, double s) { return s * kInvPi - 2.0 * k / n * c; });
 }
 
 // Odd n: every k up to the middle pair. Even n: the middle element is 1 and stays.
@@ -181,16 +179,16 @@ Status CosineTaper(T* x, int32_t n, double fraction) {
     return 0;
 }
 
-#define TW_PARAMETRIC_WINDOWS(T)                                              \
-    template Status TriangleWindow<T>(T*, int32_t);                           \
-    template Status BartlettHannWindow<T>(T*, int32_t);                       \
-    template Status BohmanWindow<T>(T*, int32_t);                             \
-    template Status ParzenWindow<T>(T*, int32_t);                             \
-    template Status WelchWindow<T>(T*, int32_t);                              \
-    template Status KaiserWindow<T>(T*, int32_t, double);                     \
-    template Status GaussianWindow<T>(T*, int32_t, double, int32_t);          \
-    template Status ForceWindow<T>(T*, int32_t, double);                      \
-    template Status ExponentialWindow<T>(T*, int32_t, double);                \
+#define TW_PARAMETRIC_WINDOWS(T)                                     \
+    template Status TriangleWindow<T>(T*, int32_t);                  \
+    template Status BartlettHannWindow<T>(T*, int32_t);              \
+    template Status BohmanWindow<T>(T*, int32_t);                    \
+    template Status ParzenWindow<T>(T*, int32_t);                    \
+    template Status WelchWindow<T>(T*, int32_t);                     \
+    template Status KaiserWindow<T>(T*, int32_t, double);            \
+    template Status GaussianWindow<T>(T*, int32_t, double, int32_t); \
+    template Status ForceWindow<T>(T*, int32_t, double);             \
+    template Status ExponentialWindow<T>(T*, int32_t, double);       \
     template Status CosineTaper<T>(T*, int32_t, double);
 TW_PARAMETRIC_WINDOWS(double)
 TW_PARAMETRIC_WINDOWS(cdouble)

@@ -12,8 +12,7 @@ namespace {
 
 // The windows whose constants are measured on the window itself when it is scaled.
 bool MeasuredWhenScaled(int32_t number) {
-    return (number >= kTriangle && number <= kWelch) ||
-           (number >= kKaiser && number <= kGaussian);
+    return (number >= kTriangle && number <= kWelch) || (number >= kKaiser && number <= kGaussian);
 }
 
 bool HasSymmetricForm(int32_t number) {
@@ -34,18 +33,30 @@ Status Dispatch(T* x, int32_t n, int32_t number, double p, int32_t symmetric) {
     if (number == kRectangular) return 0;
     if (const CosineSumRow* row = FindCosineSum(number)) return CosineSum(x, n, row->a, row->terms, false);
     switch (number) {
-        case kCosineTaper: return CosineTaper(x, n, p);
-        case kTriangle: return TriangleWindow(x, n);
-        case kBartlettHann: return BartlettHannWindow(x, n);
-        case kBohman: return BohmanWindow(x, n);
-        case kParzen: return ParzenWindow(x, n);
-        case kWelch: return WelchWindow(x, n);
-        case kKaiser: return KaiserWindow(x, n, p);
-        case kDolphChebyshev: return DolphChebyshevWindow(x, n, p, symmetric);
-        case kGaussian: return GaussianWindow(x, n, p, symmetric);
-        case kForce: return ForceWindow(x, n, p);
-        case kExponential: return ExponentialWindow(x, n, p);
-        default: return InvalidSelectorErr;
+        case kCosineTaper:
+            return CosineTaper(x, n, p);
+        case kTriangle:
+            return TriangleWindow(x, n);
+        case kBartlettHann:
+            return BartlettHannWindow(x, n);
+        case kBohman:
+            return BohmanWindow(x, n);
+        case kParzen:
+            return ParzenWindow(x, n);
+        case kWelch:
+            return WelchWindow(x, n);
+        case kKaiser:
+            return KaiserWindow(x, n, p);
+        case kDolphChebyshev:
+            return DolphChebyshevWindow(x, n, p, symmetric);
+        case kGaussian:
+            return GaussianWindow(x, n, p, symmetric);
+        case kForce:
+            return ForceWindow(x, n, p);
+        case kExponential:
+            return ExponentialWindow(x, n, p);
+        default:
+            return InvalidSelectorErr;
     }
 }
 
@@ -53,13 +64,20 @@ Status Dispatch(T* x, int32_t n, int32_t number, double p, int32_t symmetric) {
 
 double WindowParameter(int32_t number, double p) {
     switch (number) {
-        case kCosineTaper: return std::isnan(p) ? 0.2 : p;
-        case kKaiser: return std::isnan(p) ? 0.0 : p;
-        case kForce: return std::isnan(p) ? 50.0 : p;
-        case kExponential: return std::isnan(p) ? 0.1 : p;
-        case kDolphChebyshev: return std::pow(10.0, (std::isnan(p) || p < 0 ? 60.0 : p) / 20);
-        case kGaussian: return std::isnan(p) || p < 0 ? 0.2 : p;
-        default: return 0.0;
+        case kCosineTaper:
+            return std::isnan(p) ? 0.2 : p;
+        case kKaiser:
+            return std::isnan(p) ? 0.0 : p;
+        case kForce:
+            return std::isnan(p) ? 50.0 : p;
+        case kExponential:
+            return std::isnan(p) ? 0.1 : p;
+        case kDolphChebyshev:
+            return std::pow(10.0, (std::isnan(p) || p < 0 ? 60.0 : p) / 20);
+        case kGaussian:
+            return std::isnan(p) || p < 0 ? 0.2 : p;
+        default:
+            return 0.0;
     }
 }
 
@@ -166,11 +184,11 @@ void NumericWindowConstants(const double* w, int32_t n, WindowConstants* constan
     *constants = {n * squares / (sum * sum), sum / n};
 }
 
-#define TW_NUMBERED_WINDOWS(T)                                                                   \
-    template Status ApplyWindow<T>(T*, int32_t, int32_t, double);                                \
-    template Status AllWindow<T>(T*, int32_t, int32_t, double, int32_t, int32_t);                \
-    template Status ScaledWindow<T>(T*, int32_t, int32_t, double, WindowConstants*);             \
-    template Status SymmetricWindow<T>(T*, int32_t, int32_t, double);                            \
+#define TW_NUMBERED_WINDOWS(T)                                                       \
+    template Status ApplyWindow<T>(T*, int32_t, int32_t, double);                    \
+    template Status AllWindow<T>(T*, int32_t, int32_t, double, int32_t, int32_t);    \
+    template Status ScaledWindow<T>(T*, int32_t, int32_t, double, WindowConstants*); \
+    template Status SymmetricWindow<T>(T*, int32_t, int32_t, double);                \
     template Status CosineSumByNumber<T>(T*, int32_t, int32_t, int32_t);
 TW_NUMBERED_WINDOWS(double)
 TW_NUMBERED_WINDOWS(cdouble)

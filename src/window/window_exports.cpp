@@ -42,12 +42,12 @@ Status ConstantsByNumber(int32_t n, int32_t window, double parameter, WindowCons
 }  // namespace
 
 // A real export and its complex twin: the same core instantiated for both element types.
-#define TW_WINDOW_PAIR(Name, Core, Params, Args)                                           \
-    TW_API int32_t Name Params {                                                           \
-        return InPlaceWindow<double>(x, [=](auto* p, int32_t n) { return Core Args; });    \
-    }                                                                                      \
-    TW_API int32_t Cx##Name Params {                                                       \
-        return InPlaceWindow<cdouble>(x, [=](auto* p, int32_t n) { return Core Args; });   \
+#define TW_WINDOW_PAIR(Name, Core, Params, Args)                                         \
+    TW_API int32_t Name Params {                                                         \
+        return InPlaceWindow<double>(x, [=](auto* p, int32_t n) { return Core Args; });  \
+    }                                                                                    \
+    TW_API int32_t Cx##Name Params {                                                     \
+        return InPlaceWindow<cdouble>(x, [=](auto* p, int32_t n) { return Core Args; }); \
     }
 
 TW_WINDOW_PAIR(TriangleWinH, TriangleWindow, (Array1DHandle x), (p, n))
@@ -95,9 +95,15 @@ TW_API int32_t CxScaledWinH(Array1DHandle x, int32_t window, double parameter, W
         x, [=](auto* p, int32_t n) { return ScaledWindow(p, n, window, parameter, constants); }, constants);
 }
 
-TW_API int32_t GenCosWinH(Array1DHandle x, Array1DHandle a) { return GeneralCosineWindow<double>(x, a, false); }
-TW_API int32_t CxGenCosWinH(Array1DHandle x, Array1DHandle a) { return GeneralCosineWindow<cdouble>(x, a, false); }
-TW_API int32_t ScaledGenCosWinH(Array1DHandle x, Array1DHandle a) { return GeneralCosineWindow<double>(x, a, true); }
+TW_API int32_t GenCosWinH(Array1DHandle x, Array1DHandle a) {
+    return GeneralCosineWindow<double>(x, a, false);
+}
+TW_API int32_t CxGenCosWinH(Array1DHandle x, Array1DHandle a) {
+    return GeneralCosineWindow<cdouble>(x, a, false);
+}
+TW_API int32_t ScaledGenCosWinH(Array1DHandle x, Array1DHandle a) {
+    return GeneralCosineWindow<double>(x, a, true);
+}
 TW_API int32_t ScaledCxGenCosWinH(Array1DHandle x, Array1DHandle a) {
     return GeneralCosineWindow<cdouble>(x, a, true);
 }
@@ -106,8 +112,7 @@ TW_API int32_t WinConstByNameH(int32_t n, int32_t window, double parameter, Wind
     return ConstantsByNumber(n, window, parameter, constants);
 }
 
-TW_API int32_t WinConstByNameH_2016(int32_t n, int32_t window, double parameter,
-                                   WindowConstants* constants) {
+TW_API int32_t WinConstByNameH_2016(int32_t n, int32_t window, double parameter, WindowConstants* constants) {
     return ConstantsByNumber(n, window, WindowParameter(window, parameter), constants);
 }
 

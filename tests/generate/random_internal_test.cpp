@@ -51,8 +51,8 @@ TEST(RandomSource, SeedRule) {
     EXPECT_EQ(st.s2, 0);
     EXPECT_EQ(st.s3, 0);
     for (int i = 0; i < 1000; ++i) {
-        const double expected = static_cast<double>(static_cast<int32_t>(st.s1 * 171 % 30269)) *
-                                3.3037100664045725e-05;
+        const double expected =
+            static_cast<double>(static_cast<int32_t>(st.s1 * 171 % 30269)) * 3.3037100664045725e-05;
         const double u = RandomUniform(&st);
         ASSERT_EQ(st.s2, 0);
         ASSERT_EQ(st.s3, 0);

@@ -21,25 +21,25 @@ struct Gen {
 
 const std::vector<Gen>& Generators() {
     static const std::vector<Gen> gens = {
-        {"sine", [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
-             return SineWaveCIN(y.h(), &n, &a, &f, p, s);
-         }},
-        {"square", [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
+        {"sine", [](Out& y, int32_t n, double a, double f, double* p,
+                    int32_t* s) { return SineWaveCIN(y.h(), &n, &a, &f, p, s); }},
+        {"square",
+         [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
              double duty = 30;
              return SquareWaveCIN(y.h(), &n, &a, &f, p, &duty, s);
          }},
-        {"triangle", [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
-             return TriangleWaveCIN(y.h(), &n, &a, &f, p, s);
-         }},
-        {"sawtooth", [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
-             return SawtoothWaveCIN(y.h(), &n, &a, &f, p, s);
-         }},
-        {"arbitrary", [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
+        {"triangle", [](Out& y, int32_t n, double a, double f, double* p,
+                        int32_t* s) { return TriangleWaveCIN(y.h(), &n, &a, &f, p, s); }},
+        {"sawtooth", [](Out& y, int32_t n, double a, double f, double* p,
+                        int32_t* s) { return SawtoothWaveCIN(y.h(), &n, &a, &f, p, s); }},
+        {"arbitrary",
+         [](Out& y, int32_t n, double a, double f, double* p, int32_t* s) {
              const Out table{0.0, 1.0, 0.5, -0.25, -1.0};
              int32_t interpolation = 1;
              return ArbitraryWaveCIN(y.h(), &n, &a, &f, p, table.h(), &interpolation, s);
          }},
-        {"chirp", [](Out& y, int32_t n, double a, double f, double*, int32_t* s) {
+        {"chirp",
+         [](Out& y, int32_t n, double a, double f, double*, int32_t* s) {
              double end = 0.4;
              return ChirpCIN(y.h(), &n, &a, &f, &end, s);
          }},

@@ -105,8 +105,10 @@ TEST(NumberedWindows, RectangularAndSmallCases) {
 TEST(NumberedWindows, DispatchAndParameterDefaults) {
     for (int32_t n : {2, 9, 16}) {
         SCOPED_TRACE(n);
-        ExpectSameCall([](void** x) { return AllWinH(x, 60, 7.5, 0, 0); }, [](void** x) { return KaiserH(x, 7.5); }, n);
-        ExpectSameCall([](void** x) { return AllWinH(x, 60, kNaN, 0, 0); }, [](void** x) { return KaiserH(x, 0); }, n);
+        ExpectSameCall([](void** x) { return AllWinH(x, 60, 7.5, 0, 0); },
+                       [](void** x) { return KaiserH(x, 7.5); }, n);
+        ExpectSameCall([](void** x) { return AllWinH(x, 60, kNaN, 0, 0); },
+                       [](void** x) { return KaiserH(x, 0); }, n);
         ExpectSameCall([](void** x) { return AllWinH(x, 62, kNaN, 0, 0); },
                        [](void** x) { return GaussWinH(x, 0.2, 0); }, n);
         ExpectSameCall([](void** x) { return AllWinH(x, 62, -1, 0, 0); },
@@ -132,8 +134,10 @@ TEST(NumberedWindows, DispatchAndParameterDefaults) {
                            return ScaledWinH(x, 60, 0, &c);
                        },
                        n);
-        ExpectSameCall([](void** x) { return AllWinH(x, 7, 5, 1, 0); }, [](void** x) { return AllCosWinH(x, 7, 1); }, n);
-        ExpectSameCall([](void** x) { return AllWinH(x, 9, 5, 0, 0); }, [](void** x) { return AllCosWinH(x, 9, 0); }, n);
+        ExpectSameCall([](void** x) { return AllWinH(x, 7, 5, 1, 0); },
+                       [](void** x) { return AllCosWinH(x, 7, 1); }, n);
+        ExpectSameCall([](void** x) { return AllWinH(x, 9, 5, 0, 0); },
+                       [](void** x) { return AllCosWinH(x, 9, 0); }, n);
     }
 }
 
@@ -163,7 +167,11 @@ TEST(NumberedWindows, Constants) {
     // Numbers 31 to 34 are measured on the window although the table has rows for them.
     for (int32_t number : {31, 32, 33, 34, 30, 60, 62, 64, 65, 12}) {
         SCOPED_TRACE(number);
-        const double p = number == 60 ? 5.0 : number == 62 ? 0.3 : number == 64 ? 40 : number == 65 ? 0.2 : 0.25;
+        const double p = number == 60   ? 5.0
+                         : number == 62 ? 0.3
+                         : number == 64 ? 40
+                         : number == 65 ? 0.2
+                                        : 0.25;
         WindowConstants byName{0, 0}, measured{0, 0};
         EXPECT_EQ(WinConstByNameH(32, number, p, &byName), 0);
         Real w(Ones(32));
@@ -216,7 +224,8 @@ TEST(NumberedWindows, GeneralCosineSums) {
     EXPECT_EQ(ScaledGenCosWinH(z.h(), odd.h()), WindowSumZeroErr);
     EXPECT_EQ(z.size(), 0);
     // The general form with the Hann coefficients is the Hann window, real and complex.
-    ExpectSameCall([&](void** p) { return GenCosWinH(p, hann.h()); }, [](void** p) { return AllWinH(p, 1, 0, 0, 0); }, 9);
+    ExpectSameCall([&](void** p) { return GenCosWinH(p, hann.h()); },
+                   [](void** p) { return AllWinH(p, 1, 0, 0, 0); }, 9);
     std::vector<cd> data(9);
     for (int i = 0; i < 9; ++i) data[i] = {i * 0.5, 3.0 - i};
     Cx cz(data);
@@ -240,11 +249,14 @@ TEST(NumberedWindows, ComplexTwins) {
         const char* name;
         std::function<int32_t(void**)> real, cx;
     } pairs[] = {
-        {"AllWinH", [](void** x) { return AllWinH(x, 33, 0, 0, 0); }, [](void** x) { return CxAllWinH(x, 33, 0, 0, 0); }},
+        {"AllWinH", [](void** x) { return AllWinH(x, 33, 0, 0, 0); },
+         [](void** x) { return CxAllWinH(x, 33, 0, 0, 0); }},
         {"AllWinH scaled", [](void** x) { return AllWinH(x, 60, 3, 1, 0); },
          [](void** x) { return CxAllWinH(x, 60, 3, 1, 0); }},
-        {"SymmWinH", [](void** x) { return SymmWinH(x, 8, 0); }, [](void** x) { return CxSymmWinH(x, 8, 0); }},
-        {"ScaledWinH", [](void** x) {
+        {"SymmWinH", [](void** x) { return SymmWinH(x, 8, 0); },
+         [](void** x) { return CxSymmWinH(x, 8, 0); }},
+        {"ScaledWinH",
+         [](void** x) {
              WindowConstants c;
              return ScaledWinH(x, 31, 0, &c);
          },
@@ -252,7 +264,8 @@ TEST(NumberedWindows, ComplexTwins) {
              WindowConstants c;
              return CxScaledWinH(x, 31, 0, &c);
          }},
-        {"AllCosWinH", [](void** x) { return AllCosWinH(x, 6, 1); }, [](void** x) { return CxAllCosWinH(x, 6, 1); }},
+        {"AllCosWinH", [](void** x) { return AllCosWinH(x, 6, 1); },
+         [](void** x) { return CxAllCosWinH(x, 6, 1); }},
     };
     for (const Pair& p : pairs) {
         SCOPED_TRACE(p.name);

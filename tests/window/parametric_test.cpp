@@ -19,7 +19,7 @@ struct Export {
     const char* name;
     std::function<int32_t(void**)> real;
     std::function<int32_t(void**)> cx;
-    int32_t fewest;         // the shortest length the window accepts
+    int32_t fewest;          // the shortest length the window accepts
     int32_t tooShortStatus;  // the status below that length
 };
 
@@ -38,8 +38,8 @@ const std::vector<Export>& Exports() {
          [](void** x) { return CxGaussWinH(x, 0.3, 1); }, 1, EmptyArrayErr},
         {"force", [](void** x) { return ForceWinH(x, 37); }, [](void** x) { return CxForceWinH(x, 37); }, 2,
          TooFewSamples2Err},
-        {"exponential", [](void** x) { return ExpWinH(x, 0.05); }, [](void** x) { return CxExpWinH(x, 0.05); },
-         2, TooFewSamples2Err},
+        {"exponential", [](void** x) { return ExpWinH(x, 0.05); },
+         [](void** x) { return CxExpWinH(x, 0.05); }, 2, TooFewSamples2Err},
         {"cosine taper", [](void** x) { return CosTaperedH(x, 0.45); },
          [](void** x) { return CxCosTaperedH(x, 0.45); }, 1, EmptyArrayErr},
     };
@@ -180,7 +180,8 @@ TEST(ParametricWindows, StatusPointerForwarders) {
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         for (int32_t n : {0, 9}) {
-            Real a(std::vector<double>(static_cast<size_t>(n), 1.5)), b(std::vector<double>(static_cast<size_t>(n), 1.5));
+            Real a(std::vector<double>(static_cast<size_t>(n), 1.5)),
+                b(std::vector<double>(static_cast<size_t>(n), 1.5));
             int32_t status = 12345;
             EXPECT_EQ(c.forwarder(a.h(), &status), 0);
             EXPECT_EQ(status, c.export_(b.h()));
