@@ -15,15 +15,13 @@ public:
         ErrorCluster e{};
         InitializeAnalysisWorkspaceH(bytes_, &e);
         EnableAnalysisWorkspaceH(&e);
-        const int32_t code = e.code;  // the record is packed: no reference to its field
-        ASSERT_EQ(code, 0) << "the workspace could not be set up";
+        ASSERT_EQ(e.code, 0) << "the workspace could not be set up";
     }
     void TearDown() override {
         ErrorCluster e{};
         DisableAnalysisWorkspaceH(&e);
         UninitializeAnalysisWorkspaceH(&e);
-        const int32_t code = e.code;
-        EXPECT_EQ(code, 0) << "scratch blocks left live in the workspace";
+        EXPECT_EQ(e.code, 0) << "scratch blocks left live in the workspace";
     }
 
 private:
