@@ -23,12 +23,7 @@ std::atomic<int64_t> g_resizes{0};
 std::atomic<int64_t> g_allocs{0};
 std::atomic<int32_t> g_aligned{0};
 
-// The record sits just below the block, rounded down to its alignment: with element data 64-aligned
-// a 1-D block itself starts at 4 mod 8.
-Prefix* PrefixOf(void* block) {
-    const auto at = (reinterpret_cast<uintptr_t>(block) - sizeof(Prefix)) & ~uintptr_t{alignof(Prefix) - 1};
-    return reinterpret_cast<Prefix*>(at);
-}
+Prefix* PrefixOf(void* block) { return static_cast<Prefix*>(block) - 1; }
 
 void* AllocBlock(size_t bytes, int32_t dims) {
     const size_t header = dims == 2 ? 8 : 4;
