@@ -23,9 +23,6 @@ endfunction()
 function(tw_add_test_program name sources lib)
   add_executable(test_${name} ${sources})
   target_link_libraries(test_${name} PRIVATE tw_testmain ${lib})
-  # A white-box program may call nothing of the host directly, yet its library objects bind to the
-  # host's entries at run time (the workspace run registers a cleanup): keep the host linked.
-  target_link_options(test_${name} PRIVATE -Wl,--no-as-needed)
   target_compile_options(test_${name} PRIVATE ${TW_WARNINGS} -Wno-conversion)
   add_test(NAME ${name} COMMAND test_${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 1200)
