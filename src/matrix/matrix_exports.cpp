@@ -220,13 +220,15 @@ TW_API int32_t Transpose_head(Array2DHandle a, Array2DHandle b) {
 
 TW_API int32_t CxTranspose_head(Array2DHandle a, Array2DHandle b, int32_t* status) {
     int32_t host = 0;
-    return Report(status, Transpose<cdouble>(a, b, &host), host);
+    const Status s = Transpose<cdouble>(a, b, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t MatrixMulAligned_head(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t privateCopies,
                                      int32_t* status) {
     int32_t host = 0;
-    return Report(status, Product<double>(a, b, c, privateCopies, &host), host);
+    const Status s = Product<double>(a, b, c, privateCopies, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t MatrixMul_head(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t* status) {
@@ -236,7 +238,8 @@ TW_API int32_t MatrixMul_head(Array2DHandle a, Array2DHandle b, Array2DHandle c,
 TW_API int32_t AxBCxAlignedCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t privateCopies,
                                int32_t* status) {
     int32_t host = 0;
-    return Report(status, Product<cdouble>(a, b, c, privateCopies, &host), host);
+    const Status s = Product<cdouble>(a, b, c, privateCopies, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t AxBCxCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t* status) {
@@ -247,7 +250,8 @@ TW_API int32_t AxBCxCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32
 TW_API int32_t AxVectAligned_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t,
                                   int32_t* status) {
     int32_t host = 0;
-    return Report(status, MatrixVector<double>(a, x, y, &host), host);
+    const Status s = MatrixVector<double>(a, x, y, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t AxVect_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t* status) {
@@ -256,7 +260,8 @@ TW_API int32_t AxVect_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, in
 
 TW_API int32_t AxVectorCxAligned(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t, int32_t* status) {
     int32_t host = 0;
-    return Report(status, MatrixVector<cdouble>(a, x, y, &host), host);
+    const Status s = MatrixVector<cdouble>(a, x, y, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t AxVectorCx(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t* status) {
@@ -289,12 +294,14 @@ TW_API int32_t DotprodCx(Array1DHandle x, Array1DHandle y, ComplexDouble* result
 
 TW_API int32_t OuterProd_head(Array1DHandle x, Array1DHandle y, Array2DHandle m, int32_t* status) {
     int32_t host = 0;
-    return Report(status, Outer<double>(x, y, m, &host), host);
+    const Status s = Outer<double>(x, y, m, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t OuterProdCx_head(Array1DHandle x, Array1DHandle y, Array2DHandle m, int32_t* status) {
     int32_t host = 0;
-    return Report(status, Outer<cdouble>(x, y, m, &host), host);
+    const Status s = Outer<cdouble>(x, y, m, &host);
+    return Report(status, s, host);
 }
 
 TW_API int32_t Trace_head(Array2DHandle a, double* result, int32_t* status) {
