@@ -2,8 +2,11 @@
 
 #include <cstdarg>
 #include <cstdio>
+#include <algorithm>
+#include <complex>
 #include <cstring>
 
+#include "frame/frame.hpp"
 #include "twanlys/matrix.h"
 
 namespace tw {
@@ -60,6 +63,49 @@ void Report(const char* name, int parameter) {
 }
 
 }  // namespace
+
+namespace {
+
+void Lqf(int m, int n, double* a, int lda, double* tau, double* work, int lwork, int* info) {
+    dgelqf_(&m, &n, a, &lda, tau, work, &lwork, info);
+}
+void Lqf(int m, int n, cdouble* a, int lda, cdouble* tau, cdouble* work, int lwork, int* info) {
+    zgelqf_(&m, &n, a, &lda, tau, work, &lwork, info);
+}
+void Glq(int m, int n, int k, double* a, int lda, const double* tau, double* work, int lwork, int* info) {
+    dorglq_(&m, &n, &k, a, &lda, tau, work, &lwork, info);
+}
+void Glq(int m, int n, int k, cdouble* a, int lda, const cdouble* tau, cdouble* work, int lwork, int* info) {
+    zunglq_(&m, &n, &k, a, &lda, tau, work, &lwork, info);
+}
+
+// The driver called twice: first for its workspace size (work[0], truncated), then for the work.
+template <class T, class Call>
+Status WithWorkspace(Call call) {
+    T size = 0;
+    int info = 0;
+    call(&size, -1, &info);
+    const int lwork = std::max(1, static_cast<int>(std::real(size)));
+    Scratch<T> work;
+    if (work.Allocate(static_cast<size_t>(lwork)) != 0) return OutOfMemoryErr;
+    call(work.get(), lwork, &info);
+    return work.Release();
+}
+
+}  // namespace
+
+template <class T> Status Gelqf(int m, int n, T* a, int lda, T* tau) {
+    return WithWorkspace<T>([&](T* w, int lw, int* info) { Lqf(m, n, a, lda, tau, w, lw, info); });
+}
+
+template <class T> Status Orglq(int m, int n, int k, T* a, int lda, const T* tau) {
+    return WithWorkspace<T>([&](T* w, int lw, int* info) { Glq(m, n, k, a, lda, tau, w, lw, info); });
+}
+
+template Status Gelqf<double>(int, int, double*, int, double*);
+template Status Gelqf<cdouble>(int, int, cdouble*, int, cdouble*);
+template Status Orglq<double>(int, int, int, double*, int, const double*);
+template Status Orglq<cdouble>(int, int, int, cdouble*, int, const cdouble*);
 
 Status LapackStatus(Lapack routine, int info, int n) {
     for (const InfoRule& r : kRules)

@@ -298,10 +298,40 @@ Status FullSvd(const T* a, int32_t m, int32_t n, T* u, double* s, T* v) {
     return MergeRelease(st, work.Release());
 }
 
+template <class T>
+Status FullSvd(const T* a, int32_t m, int32_t n, T* u, double* s, T* v, int32_t full) {
+    if (full == 0 || m == n) return FullSvd<T>(a, m, n, u, s, v);
+    const int32_t r = std::min(m, n), p = std::max(m, n);
+    Scratch<T> shortFactor, square, tri;
+    if (shortFactor.Allocate(static_cast<size_t>(p) * r) != 0 || square.Allocate(static_cast<size_t>(p) * p) != 0 ||
+        tri.Allocate(static_cast<size_t>(p) * r) != 0)
+        return OutOfMemoryErr;
+    // The factor with p rows is the short one; the other is already square.
+    Status st = m > n ? FullSvd<T>(a, m, n, shortFactor.get(), s, v) : FullSvd<T>(a, m, n, u, s, shortFactor.get());
+    if (st == 0) st = QrHouseholder<T>(shortFactor.get(), p, r, 0, square.get(), tri.get());
+    if (st == 0) {
+        // Q's leading columns equal the computed ones up to the phase of R's diagonal.
+        T* q = square.get();
+        for (int32_t i = 0; i < r; ++i) {
+            const T d = tri[static_cast<size_t>(i) * r + i];
+            if constexpr (kIsComplex<T>) {
+                const T ph = Phase(d);
+                for (int32_t k = 0; k < p; ++k) q[static_cast<size_t>(k) * p + i] *= ph;
+            } else if (d < 0) {
+                for (int32_t k = 0; k < p; ++k) q[static_cast<size_t>(k) * p + i] = -q[static_cast<size_t>(k) * p + i];
+            }
+        }
+        T* out = m > n ? u : v;
+        if (out != nullptr) std::memcpy(out, q, static_cast<size_t>(p) * p * sizeof(T));
+    }
+    return MergeRelease(MergeRelease(MergeRelease(st, shortFactor.Release()), square.Release()), tri.Release());
+}
+
 #define TW_SVD(T)                                                                                \
     template size_t SvdWorkSize<T>(int32_t, int32_t);                                            \
     template Status ReentrantSvd<T>(const T*, int32_t, int32_t, T*, double*, T*, T*, size_t*);   \
-    template Status FullSvd<T>(const T*, int32_t, int32_t, T*, double*, T*);
+    template Status FullSvd<T>(const T*, int32_t, int32_t, T*, double*, T*);                    \
+    template Status FullSvd<T>(const T*, int32_t, int32_t, T*, double*, T*, int32_t);
 TW_SVD(double)
 TW_SVD(cdouble)
 #undef TW_SVD
