@@ -128,40 +128,28 @@ Status FromCompact(const CompactMatrix* c, Handle& m, int32_t* host) {
 }  // namespace
 
 TW_API int32_t LU_head(Array2DHandle a, Array1DHandle perm, int32_t* parity, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Lu<double>(a, perm, parity, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Lu<double>(a, perm, parity, host); });
 }
 
 TW_API int32_t CxLU_head(Array2DHandle a, Array1DHandle perm, int32_t* parity, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Lu<cdouble>(a, perm, parity, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Lu<cdouble>(a, perm, parity, host); });
 }
 
 TW_API int32_t qrd_head(Array2DHandle a, QrdMethod* method, Array2DHandle q, Array2DHandle r, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Qrd<double>(a, *method, q, r, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Qrd<double>(a, *method, q, r, host); });
 }
 
 // The method is not read: complex QR is always Householder.
 TW_API int32_t Cxqrd_head(Array2DHandle a, QrdMethod*, Array2DHandle q, Array2DHandle r, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Qrd<cdouble>(a, 0, q, r, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Qrd<cdouble>(a, 0, q, r, host); });
 }
 
 TW_API int32_t SVD_head(Array2DHandle a, Array1DHandle s, Array2DHandle v, int32_t* status) {
-    int32_t host = 0;
-    const Status st = Svd<double, double>(a, 0, nullptr, s, &v, &host);
-    return Report(status, st, host);
+    return PointerStyle(status, [&](int32_t* host) { return Svd<double, double>(a, 0, nullptr, s, &v, host); });
 }
 
 TW_API int32_t CxSVD_head(Array2DHandle a, Array1DHandle s, Array2DHandle v, int32_t* status) {
-    int32_t host = 0;
-    const Status st = Svd<cdouble, cdouble>(a, 0, nullptr, s, &v, &host);
-    return Report(status, st, host);
+    return PointerStyle(status, [&](int32_t* host) { return Svd<cdouble, cdouble>(a, 0, nullptr, s, &v, host); });
 }
 
 TW_API int32_t SVDEx_head(Array2DHandle a, int32_t full, Array2DHandle u, Array1DHandle s, Array2DHandle v) {
@@ -175,39 +163,27 @@ TW_API int32_t CxSVDEx_head(Array2DHandle a, int32_t full, Array2DHandle u, Arra
 }
 
 TW_API int32_t SVDS_head(Array2DHandle a, Array1DHandle s, int32_t* status) {
-    int32_t host = 0;
-    const Status st = Svd<double, double>(a, 0, nullptr, s, nullptr, &host);
-    return Report(status, st, host);
+    return PointerStyle(status, [&](int32_t* host) { return Svd<double, double>(a, 0, nullptr, s, nullptr, host); });
 }
 
 TW_API int32_t CxSVDS_head(Array2DHandle a, Array1DHandle s, int32_t* status) {
-    int32_t host = 0;
-    const Status st = Svd<cdouble, double>(a, 0, nullptr, s, nullptr, &host);
-    return Report(status, st, host);
+    return PointerStyle(status, [&](int32_t* host) { return Svd<cdouble, double>(a, 0, nullptr, s, nullptr, host); });
 }
 
 TW_API int32_t Matrix_to_Compact_head(Array2DHandle a, int32_t* kind, Array1DHandle out, int32_t* status) {
-    int32_t host = 0;
-    const Status s = ToCompact<double>(a, *kind, out, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return ToCompact<double>(a, *kind, out, host); });
 }
 
 TW_API int32_t CxMatrix_to_Compact_head(Array2DHandle a, int32_t* kind, Array1DHandle out, int32_t* status) {
-    int32_t host = 0;
-    const Status s = ToCompact<cdouble>(a, *kind, out, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return ToCompact<cdouble>(a, *kind, out, host); });
 }
 
 TW_API int32_t Compact_to_Matrix_head(CompactMatrix* compact, Array2DHandle m, int32_t* status) {
-    int32_t host = 0;
-    const Status s = FromCompact<double>(compact, m, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return FromCompact<double>(compact, m, host); });
 }
 
 TW_API int32_t CxCompact_to_Matrix_head(CompactMatrix* compact, Array2DHandle m, int32_t* status) {
-    int32_t host = 0;
-    const Status s = FromCompact<cdouble>(compact, m, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return FromCompact<cdouble>(compact, m, host); });
 }
 
 // No checks, no resize, no status: the caller has sized both blocks. The element data are copied

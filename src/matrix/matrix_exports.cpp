@@ -195,16 +195,12 @@ TW_API int32_t Transpose_head(Array2DHandle a, Array2DHandle b) {
 }
 
 TW_API int32_t CxTranspose_head(Array2DHandle a, Array2DHandle b, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Transpose<cdouble>(a, b, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Transpose<cdouble>(a, b, host); });
 }
 
 TW_API int32_t MatrixMulAligned_head(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t privateCopies,
                                      int32_t* status) {
-    int32_t host = 0;
-    const Status s = Product<double>(a, b, c, privateCopies, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Product<double>(a, b, c, privateCopies, host); });
 }
 
 TW_API int32_t MatrixMul_head(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t* status) {
@@ -213,9 +209,7 @@ TW_API int32_t MatrixMul_head(Array2DHandle a, Array2DHandle b, Array2DHandle c,
 
 TW_API int32_t AxBCxAlignedCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t privateCopies,
                                int32_t* status) {
-    int32_t host = 0;
-    const Status s = Product<cdouble>(a, b, c, privateCopies, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Product<cdouble>(a, b, c, privateCopies, host); });
 }
 
 TW_API int32_t AxBCxCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32_t* status) {
@@ -225,9 +219,7 @@ TW_API int32_t AxBCxCIN(Array2DHandle a, Array2DHandle b, Array2DHandle c, int32
 // privateCopies has no effect on the plain matrix-vector loop.
 TW_API int32_t AxVectAligned_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t,
                                   int32_t* status) {
-    int32_t host = 0;
-    const Status s = MatrixVector<double>(a, x, y, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return MatrixVector<double>(a, x, y, host); });
 }
 
 TW_API int32_t AxVect_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t* status) {
@@ -235,9 +227,7 @@ TW_API int32_t AxVect_head(Array2DHandle a, Array1DHandle x, Array1DHandle y, in
 }
 
 TW_API int32_t AxVectorCxAligned(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t, int32_t* status) {
-    int32_t host = 0;
-    const Status s = MatrixVector<cdouble>(a, x, y, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return MatrixVector<cdouble>(a, x, y, host); });
 }
 
 TW_API int32_t AxVectorCx(Array2DHandle a, Array1DHandle x, Array1DHandle y, int32_t* status) {
@@ -269,15 +259,11 @@ TW_API int32_t DotprodCx(Array1DHandle x, Array1DHandle y, ComplexDouble* result
 }
 
 TW_API int32_t OuterProd_head(Array1DHandle x, Array1DHandle y, Array2DHandle m, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Outer<double>(x, y, m, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Outer<double>(x, y, m, host); });
 }
 
 TW_API int32_t OuterProdCx_head(Array1DHandle x, Array1DHandle y, Array2DHandle m, int32_t* status) {
-    int32_t host = 0;
-    const Status s = Outer<cdouble>(x, y, m, &host);
-    return Report(status, s, host);
+    return PointerStyle(status, [&](int32_t* host) { return Outer<cdouble>(x, y, m, host); });
 }
 
 TW_API int32_t Trace_head(Array2DHandle a, double* result, int32_t* status) {

@@ -12,6 +12,14 @@ inline int32_t Report(int32_t* status, Status s, int32_t host) {
     return host;
 }
 
+// Runs a frame that reports the host's code of a failed resize, in the status-by-pointer style.
+template <class Call>
+int32_t PointerStyle(int32_t* status, Call call) {
+    int32_t host = 0;
+    const Status s = call(&host);
+    return Report(status, s, host);
+}
+
 template <class T>
 Status Out2D(Frame& f, Handle& h, int32_t rows, int32_t cols, T** p, int32_t* host) {
     if (const Status s = f.Resize2D<T>(h, rows, cols, p)) {
