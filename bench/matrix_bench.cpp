@@ -68,8 +68,8 @@ void LapackSvd(benchmark::State& state) {
     const int n = static_cast<int>(state.range(0));
     const bool divide = state.range(1) != 0;
     const std::vector<double> a0 = Random(size_t(n) * n, 3);
-    std::vector<double> a(a0.size()), s(size_t(n)), u(a0.size()), vt(a0.size()), work(1);
-    std::vector<int> iwork(size_t(8) * n);
+    std::vector<double> a(a0.size()), s(static_cast<size_t>(n)), u(a0.size()), vt(a0.size()), work(1);
+    std::vector<int> iwork(8 * static_cast<size_t>(n));
     int info = 0, lwork = -1;
     divide ? dgesdd_("S", &n, &n, a.data(), &n, s.data(), u.data(), &n, vt.data(), &n, work.data(), &lwork,
                      iwork.data(), &info, 1)
@@ -103,7 +103,7 @@ void OwnLu(benchmark::State& state) {
 void LapackLu(benchmark::State& state) {
     const int n = static_cast<int>(state.range(0));
     const std::vector<double> a0 = Random(size_t(n) * n, 4);
-    std::vector<int> ipiv(size_t(n));
+    std::vector<int> ipiv(static_cast<size_t>(n));
     int info = 0;
     for (auto _ : state) {
         std::vector<double> a = a0;
