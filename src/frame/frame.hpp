@@ -99,6 +99,13 @@ public:
         return View<T>(h, 1, Count(h), true, data);
     }
 
+    template <class T>
+    Status InPlace2D(Handle& h, T** data) {
+        Register(h, kTypeCode<T>, 2);
+        const Shape d = Dims(h);
+        return View<T>(h, 2, d.rows * d.cols, true, data);
+    }
+
     // Resizes a 1-D output to n elements and stores its count. Returns the host's own status; a
     // failed resize makes Finish() shrink every output whatever the status.
     template <class T>

@@ -1,0 +1,41 @@
+// Pieces shared by the frames of the matrix family.
+#pragma once
+
+#include "frame/frame.hpp"
+
+namespace tw {
+
+// In the status-by-pointer frames of this family a failed resize stores -20001 in the status
+// cell while the export itself returns the host's code.
+inline int32_t Report(int32_t* status, Status s, int32_t host) {
+    if (status != nullptr) *status = s;
+    return host;
+}
+
+// Runs a frame that reports the host's code of a failed resize, in the status-by-pointer style.
+template <class Call>
+int32_t PointerStyle(int32_t* status, Call call) {
+    int32_t host = 0;
+    const Status s = call(&host);
+    return Report(status, s, host);
+}
+
+template <class T>
+Status Out2D(Frame& f, Handle& h, int32_t rows, int32_t cols, T** p, int32_t* host) {
+    if (const Status s = f.Resize2D<T>(h, rows, cols, p)) {
+        *host = s;
+        return OutOfMemoryErr;
+    }
+    return 0;
+}
+
+template <class T>
+Status Out1D(Frame& f, Handle& h, int32_t n, T** p, int32_t* host) {
+    if (const Status s = f.Resize<T>(h, n, p)) {
+        *host = s;
+        return OutOfMemoryErr;
+    }
+    return 0;
+}
+
+}  // namespace tw
