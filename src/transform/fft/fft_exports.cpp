@@ -178,6 +178,7 @@ Status PackedForward(Handle x, Handle& y, void** cell) {
 template <bool InstanceData>
 Status PackedInverse(Handle& x, Handle& y, void** cell) {
     Frame f(tw::FailOn::NonZero);
+    f.Output<double>(x);
     f.Output<cdouble>(y);
     const int32_t count = tw::Count(x);
     Status s = count < 1 ? EmptyArrayErr : 0;
