@@ -78,13 +78,8 @@ void TwExportComplex(benchmark::State& state) {
     SetRate(state, n);
 }
 
-template <unsigned Flags>
-void FftwReal(benchmark::State& state) {
-    const int n = static_cast<int>(state.range(0));
-    double* in = fftw_alloc_real(static_cast<size_t>(n));
-    fftw_complex* out = fftw_alloc_complex(static_cast<size_t>(n / 2 + 1));
-    fftw_plan p = fftw_plan_dft_r2c_1d(n, in, out, Flags);
-    Fill(in, static_cast<size_t>(n));
+// Times one FFTW plan and releases it with its buffers.
+void RunPlan(benchmark::State& state, fftw_plan p, void* in, void* out, int64_t n) {
     for (auto _ : state) {
         fftw_execute(p);
         benchmark::DoNotOptimize(out);
@@ -96,20 +91,23 @@ void FftwReal(benchmark::State& state) {
 }
 
 template <unsigned Flags>
+void FftwReal(benchmark::State& state) {
+    const int n = static_cast<int>(state.range(0));
+    double* in = fftw_alloc_real(static_cast<size_t>(n));
+    fftw_complex* out = fftw_alloc_complex(static_cast<size_t>(n / 2 + 1));
+    fftw_plan p = fftw_plan_dft_r2c_1d(n, in, out, Flags);
+    Fill(in, static_cast<size_t>(n));
+    RunPlan(state, p, in, out, n);
+}
+
+template <unsigned Flags>
 void FftwComplex(benchmark::State& state) {
     const int n = static_cast<int>(state.range(0));
     fftw_complex* in = fftw_alloc_complex(static_cast<size_t>(n));
     fftw_complex* out = fftw_alloc_complex(static_cast<size_t>(n));
     fftw_plan p = fftw_plan_dft_1d(n, in, out, FFTW_FORWARD, Flags);
     Fill(reinterpret_cast<double*>(in), 2 * static_cast<size_t>(n));
-    for (auto _ : state) {
-        fftw_execute(p);
-        benchmark::DoNotOptimize(out);
-    }
-    fftw_destroy_plan(p);
-    fftw_free(in);
-    fftw_free(out);
-    SetRate(state, n);
+    RunPlan(state, p, in, out, n);
 }
 
 void Sizes(benchmark::internal::Benchmark* b) {
