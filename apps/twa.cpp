@@ -1,28 +1,54 @@
 // twa: runs the library on a built-in signal and prints a readable report.
+//   twa demo               statistics, histogram and window of the built-in signal
+//   twa window NAME N      a window of length N and its constants (NAME: number or name)
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
-#include <numbers>
 #include <string>
 #include <vector>
 
+#include "twanlys/generate.h"
 #include "twanlys/stats.h"
+#include "twanlys/windows.h"
 #include "twrt.hpp"
 
 namespace {
 
-// The built-in signal: a 50 Hz sine with a third harmonic, sampled at 1 kHz.
-std::vector<double> DemoSignal(int n) {
-    std::vector<double> x(static_cast<size_t>(n));
-    for (int i = 0; i < n; ++i) {
-        const double t = i / 1000.0;
-        x[static_cast<size_t>(i)] = std::sin(2 * std::numbers::pi * 50 * t) +
-                                    0.3 * std::sin(2 * std::numbers::pi * 150 * t);
-    }
+using twrt::Array1D;
+
+constexpr int kSamples = 1000;
+constexpr double kRate = 1000.0;  // the demo's sampling rate, Hz
+
+struct NamedWindow {
+    const char* name;
+    int32_t number;
+};
+constexpr NamedWindow kWindows[] = {
+    {"rectangular", 0}, {"hann", 1},     {"hamming", 2},  {"blackman-harris-3", 3},
+    {"exact-blackman", 4}, {"blackman", 5}, {"flattop", 6}, {"blackman-harris-4", 7},
+    {"blackman-harris-7", 8}, {"low-sidelobe", 9}, {"blackman-nuttall", 11}, {"cosine-taper", 12},
+    {"triangle", 30},   {"bartlett-hanning", 31}, {"bohman", 32}, {"parzen", 33}, {"welch", 34},
+    {"kaiser", 60},     {"dolph-chebyshev", 61},  {"gaussian", 62}, {"force", 64}, {"exponential", 65},
+};
+
+// The built-in signal, made by the library's generators: a 50 Hz sine, a 120 Hz square wave at a
+// quarter of the amplitude, and a faint chirp sweeping 200 to 400 Hz.
+Array1D<double> DemoSignal() {
+    int32_t n = kSamples, status = 0;
+    double amplitude = 1.0, frequency = 50 / kRate, phase = 0;
+    Array1D<double> sine, square, chirp;
+    SineWaveCIN(sine.h(), &n, &amplitude, &frequency, &phase, &status);
+    double squareAmplitude = 0.25, squareFrequency = 120 / kRate, squarePhase = 0, duty = 50;
+    SquareWaveCIN(square.h(), &n, &squareAmplitude, &squareFrequency, &squarePhase, &duty, &status);
+    double chirpAmplitude = 0.1, start = 200 / kRate, end = 400 / kRate;
+    ChirpCIN(chirp.h(), &n, &chirpAmplitude, &start, &end, &status);
+    Array1D<double> x(n);
+    for (int32_t i = 0; i < n; ++i) x.set(i, sine[i] + square[i] + chirp[i]);
     return x;
 }
 
-void Statistics(const twrt::Array1D<double>& x) {
+void Statistics(const Array1D<double>& x) {
     double mean, rms, median, variance;
     int32_t status, order = 2;
     Mean_head(x.h(), &mean, &status);
@@ -34,10 +60,10 @@ void Statistics(const twrt::Array1D<double>& x) {
                 rms, median, variance);
 }
 
-void Histogram(const twrt::Array1D<double>& x) {
-    int32_t bins = 10, status;
-    twrt::Array1D<int32_t> counts;
-    twrt::Array1D<double> centres;
+void Histogram(const Array1D<double>& x) {
+    int32_t bins = 12, status;
+    Array1D<int32_t> counts;
+    Array1D<double> centres;
     histgran_head(x.h(), &bins, counts.h(), centres.h(), &status);
     if (status != 0) {
         std::printf("histogram failed: %d\n", status);
@@ -50,23 +76,61 @@ void Histogram(const twrt::Array1D<double>& x) {
     std::printf("\n");
 }
 
+void Window(const Array1D<double>& x) {
+    Array1D<double> windowed(x.vec());
+    const int32_t status = AllWinH(windowed.h(), 1, NAN, 0, 0);
+    WindowConstants c{};
+    WinConstByNameH(windowed.size(), 1, NAN, &c);
+    double rms = 0;
+    int32_t s;
+    RMS_head(windowed.h(), &rms, &s);
+    std::printf("Hann window (status %d)\n  ENBW %.4f bins, coherent gain %.4f, windowed rms %.6f\n\n",
+                status, c.enbw, c.coherentGain, rms);
+}
+
 int Demo() {
-    const twrt::Array1D<double> x(DemoSignal(1000));
-    std::printf("twa demo: 1000 samples of a 50 Hz sine with a 150 Hz harmonic at 1 kHz\n\n");
+    const Array1D<double> x = DemoSignal();
+    std::printf("twa demo: %d samples at %.0f Hz of a 50 Hz sine, a 120 Hz square wave and a\n"
+                "200-400 Hz chirp\n\n", kSamples, kRate);
     Statistics(x);
     Histogram(x);
+    Window(x);
+    return 0;
+}
+
+int WindowCommand(const char* name, const char* length) {
+    int32_t number = -1;
+    char* rest = nullptr;
+    const long asNumber = std::strtol(name, &rest, 10);
+    if (rest != name && *rest == '\0') number = static_cast<int32_t>(asNumber);
+    for (const NamedWindow& w : kWindows)
+        if (std::strcmp(w.name, name) == 0) number = w.number;
+    const int32_t n = std::atoi(length);
+    Array1D<double> w(std::vector<double>(static_cast<size_t>(n > 0 ? n : 0), 1.0));
+    const int32_t status = AllWinH(w.h(), number, NAN, 0, 0);
+    if (status != 0) {
+        std::fprintf(stderr, "twa: window %s of length %s failed with status %d\n", name, length, status);
+        return 1;
+    }
+    WindowConstants c{};
+    WinConstByNameH_2016(n, number, NAN, &c);
+    std::printf("window %d, %d samples: ENBW %.6f bins, coherent gain %.6f\n", number, n, c.enbw,
+                c.coherentGain);
+    for (int32_t i = 0; i < w.size(); ++i) std::printf("%6d  % .17g\n", i, w[i]);
     return 0;
 }
 
 int Usage() {
-    std::fprintf(stderr, "usage: twa demo\n");
+    std::fprintf(stderr, "usage: twa demo\n       twa window NAME N   (NAME: a number or one of");
+    for (const NamedWindow& w : kWindows) std::fprintf(stderr, " %s", w.name);
+    std::fprintf(stderr, ")\n");
     return 2;
 }
 
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc < 2) return Usage();
-    if (std::strcmp(argv[1], "demo") == 0) return Demo();
+    if (argc == 2 && std::strcmp(argv[1], "demo") == 0) return Demo();
+    if (argc == 4 && std::strcmp(argv[1], "window") == 0) return WindowCommand(argv[2], argv[3]);
     return Usage();
 }

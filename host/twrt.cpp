@@ -23,7 +23,12 @@ std::atomic<int64_t> g_resizes{0};
 std::atomic<int64_t> g_allocs{0};
 std::atomic<int32_t> g_aligned{0};
 
-Prefix* PrefixOf(void* block) { return static_cast<Prefix*>(block) - 1; }
+// Blocks may start at any 4-byte boundary, so the prefix is copied, never dereferenced in place.
+Prefix ReadPrefix(const void* block) {
+    Prefix p;
+    std::memcpy(&p, static_cast<const unsigned char*>(block) - sizeof(Prefix), sizeof p);
+    return p;
+}
 
 void* AllocBlock(size_t bytes, int32_t dims) {
     const size_t header = dims == 2 ? 8 : 4;
@@ -40,16 +45,14 @@ void* AllocBlock(size_t bytes, int32_t dims) {
         data = reinterpret_cast<unsigned char*>(at) + header;
     }
     unsigned char* block = data - header;
-    auto* p = PrefixOf(block);
-    p->raw = raw;
-    p->bytes = bytes;
-    p->dims = dims;
+    const Prefix p{raw, bytes, dims, 0};
+    std::memcpy(block - sizeof(Prefix), &p, sizeof p);
     g_allocs.fetch_add(1, std::memory_order_relaxed);
     return block;
 }
 
 void FreeBlock(void* block) {
-    if (block != nullptr) std::free(PrefixOf(block)->raw);
+    if (block != nullptr) std::free(ReadPrefix(block).raw);
 }
 
 struct Cleanup {
@@ -125,7 +128,7 @@ int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int3
     if (fresh == nullptr) return TWRTResizeFailed;
     void* old = **handle;
     if (old != nullptr) {
-        std::memcpy(fresh, old, std::min(bytes, PrefixOf(old)->bytes));
+        std::memcpy(fresh, old, std::min(bytes, ReadPrefix(old).bytes));
         FreeBlock(old);
     }
     **handle = fresh;

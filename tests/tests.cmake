@@ -24,6 +24,9 @@ function(tw_add_test_program name sources lib)
   add_executable(test_${name} ${sources})
   target_link_libraries(test_${name} PRIVATE tw_testmain ${lib})
   target_compile_options(test_${name} PRIVATE ${TW_WARNINGS} -Wno-conversion)
+  target_compile_definitions(test_${name} PRIVATE
+    TW_SOURCE_DIR="${PROJECT_SOURCE_DIR}" TW_BINARY_DIR="${CMAKE_BINARY_DIR}")
+  add_dependencies(test_${name} tw_no_host tw_fake_host twanlys)
   add_test(NAME ${name} COMMAND test_${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 1200)
   # Every suite runs a second time with scratch memory served by the Analysis Workspace.

@@ -5,7 +5,9 @@ NumPy arrays become host handles and back, so an export is called in a line or t
     import numpy as np, twanlys as tw
     x = tw.array(np.arange(5.0))
     mean, status = tw.f64(), tw.i32()
-    tw.lib.Mean_head(x.h, mean.ref, status.ref)
+    tw.lib.Mean_head(x, mean.ref, status.ref)
+
+Pass arrays themselves, not their `.h`: a temporary array would be freed before the call.
 """
 import ctypes
 import os
@@ -44,6 +46,11 @@ class Array:
             raise MemoryError("the host could not allocate the array")
         if a.size:
             ctypes.memmove(self._data(), a.ctypes.data, a.nbytes)
+
+    @property
+    def _as_parameter_(self):
+        # Passing the Array itself (not .h) keeps it alive for the length of the call.
+        return self.h
 
     def __del__(self):
         if getattr(self, "h", None):

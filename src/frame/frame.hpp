@@ -53,6 +53,13 @@ inline int32_t ReadWord(Handle h, int index) {
 inline int32_t Count(Handle h) { return ReadWord(h, 0); }
 inline Shape Dims(Handle h) { return {ReadWord(h, 0), ReadWord(h, 1)}; }
 
+// rows * cols, or -1 when a dimension is negative or the product does not fit an i32.
+inline int32_t Elements(Shape d) {
+    if (d.rows < 0 || d.cols < 0) return -1;
+    const int64_t n = int64_t{d.rows} * d.cols;
+    return n > INT32_MAX ? -1 : static_cast<int32_t>(n);
+}
+
 enum class FailOn { Negative, NonZero };
 
 class Frame {
@@ -79,9 +86,8 @@ public:
     }
     template <class T>
     Status In2D(Handle h, const T** data) {
-        const Shape d = Dims(h);
         T* p = nullptr;
-        const Status s = View<T>(h, 2, d.rows * d.cols, false, &p);
+        const Status s = View<T>(h, 2, Elements(Dims(h)), false, &p);
         *data = p;
         return s;
     }
@@ -107,10 +113,12 @@ public:
     Status Resize2D(Handle& h, int32_t rows, int32_t cols, T** data) {
         *data = nullptr;
         Register(h, kTypeCode<T>, 2);
-        if (const Status s = HostResize(kTypeCode<T>, 2, &h, rows * cols)) return ResizeFailed(s);
+        const int32_t n = Elements({rows, cols});
+        if (n < 0) return ResizeFailed(OutOfMemoryErr);
+        if (const Status s = HostResize(kTypeCode<T>, 2, &h, n)) return ResizeFailed(s);
         const int32_t words[2] = {rows, cols};
         std::memcpy(*h, words, sizeof words);
-        return View<T>(h, 2, rows * cols, true, data);
+        return View<T>(h, 2, n, true, data);
     }
 
     // Commits or applies the failure contract; returns the status with the releases merged in.

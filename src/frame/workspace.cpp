@@ -88,12 +88,23 @@ Status SetEnabled(uint8_t on) {
     return 0;
 }
 
+// Falls the cursor back to base when the last live block (or reservation) goes.
+void DropLive(uintptr_t seen) {
+    if (g_arena.live.fetch_sub(1, std::memory_order_acq_rel) == 1)
+        g_arena.cursor.compare_exchange_strong(seen, g_arena.base, std::memory_order_acq_rel);
+}
+
 }  // namespace
 
 AllocatorKind ScratchRoute() {
     return g_arena.enabled.load(std::memory_order_relaxed) != 0 ? kAllocArena : kRouting;
 }
 
+// The live count is taken before the cursor moves, not after: otherwise a release that brings it
+// to 0 could rewind the cursor to base under a block that another thread has just carved out but
+// not yet counted. A request that fails therefore gives its count back like a release, so an
+// arena exhausted while nothing is live recovers at once; with blocks live, the cursor stays at
+// limit until they are gone.
 void* ArenaAllocate(size_t bytes) {
     {
         std::lock_guard<std::mutex> lock(g_ownerLock);
@@ -105,6 +116,7 @@ void* ArenaAllocate(size_t bytes) {
     const uintptr_t span = g_arena.limit - g_arena.base;
     const uintptr_t fitted = bytes > span ? span : bytes;
     const uintptr_t size = (kBlockHeader + fitted + 1 + 15) & ~uintptr_t{15};
+    g_arena.live.fetch_add(1, std::memory_order_acq_rel);
     const uintptr_t start = g_arena.cursor.fetch_add(size, std::memory_order_acq_rel);
     const uintptr_t end = start + size;
     if (end >= g_arena.limit) {
@@ -112,27 +124,28 @@ void* ArenaAllocate(size_t bytes) {
         // the top, a failed block may start past limit.
         uintptr_t expected = end;
         g_arena.cursor.compare_exchange_strong(expected, g_arena.limit, std::memory_order_acq_rel);
+        DropLive(g_arena.cursor.load(std::memory_order_acquire));
         return nullptr;  // WorkspaceExhaustedErr
     }
     StoreWord(start, start);
     StoreWord(start + sizeof(uintptr_t), end);
-    g_arena.live.fetch_add(1, std::memory_order_acq_rel);
     return reinterpret_cast<void*>(start + kBlockHeader);
 }
 
+// The top test runs while the block still counts as live, before its rewind address is handed to
+// the block behind: then no reset to base and no rewind past this block can have happened, so a
+// cursor equal to this block's end really means it is the top block.
 void ArenaRelease(void* p) {
     const uintptr_t start = reinterpret_cast<uintptr_t>(p) - kBlockHeader;
     const uintptr_t end = LoadWord(start + sizeof(uintptr_t));
-    // The block behind inherits this block's rewind address: released neighbours coalesce.
-    const uintptr_t rewind = std::atomic_ref<uintptr_t>(Word(start)).load(std::memory_order_acquire);
-    std::atomic_ref<uintptr_t>(Word(end)).exchange(rewind, std::memory_order_acq_rel);
-    uintptr_t seen = g_arena.cursor.load(std::memory_order_acquire);
-    if (g_arena.live.fetch_sub(1, std::memory_order_acq_rel) == 1) {
-        g_arena.cursor.compare_exchange_strong(seen, g_arena.base, std::memory_order_acq_rel);
-    } else {
-        uintptr_t expected = end;
-        g_arena.cursor.compare_exchange_strong(expected, LoadWord(start), std::memory_order_acq_rel);
+    const uintptr_t rewind = LoadWord(start);
+    uintptr_t expected = end;
+    if (!g_arena.cursor.compare_exchange_strong(expected, rewind, std::memory_order_acq_rel)) {
+        // Not the top: the block behind inherits the rewind address, so released neighbours
+        // coalesce, oldest first, without any list.
+        std::atomic_ref<uintptr_t>(Word(end)).exchange(rewind, std::memory_order_acq_rel);
     }
+    DropLive(g_arena.cursor.load(std::memory_order_acquire));
 }
 
 size_t ArenaCapacity(const void* p) {

@@ -15,13 +15,13 @@ public:
         ErrorCluster e{};
         InitializeAnalysisWorkspaceH(bytes_, &e);
         EnableAnalysisWorkspaceH(&e);
-        ASSERT_EQ(e.code, 0) << "the workspace could not be set up";
+        ASSERT_EQ(int32_t{e.code}, 0) << "the workspace could not be set up";
     }
     void TearDown() override {
         ErrorCluster e{};
         DisableAnalysisWorkspaceH(&e);
         UninitializeAnalysisWorkspaceH(&e);
-        EXPECT_EQ(e.code, 0) << "scratch blocks left live in the workspace";
+        EXPECT_EQ(int32_t{e.code}, 0) << "scratch blocks left live in the workspace";
     }
 
 private:

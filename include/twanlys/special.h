@@ -1,0 +1,27 @@
+/* Special functions: scalar entries. The real functions report nothing: an argument outside a
+ * function's domain gives NaN and a pole or overflow its stated infinity, through the result
+ * pointer. */
+#ifndef TWANLYS_SPECIAL_H
+#define TWANLYS_SPECIAL_H
+
+#include "twanlys/types.h"
+
+/* NaN as x selects the complete gamma function of a; otherwise the lower regularised P(a, x). */
+TW_API void TW_Gamma(double a, double x, double* out);
+/* selector 1: the complete gamma function of a (x ignored); any other value P(a, x). */
+TW_API void TW_Gamma_85(double a, double x, double* out, int32_t selector);
+/* The upper regularised incomplete gamma function Q(a, x). */
+TW_API void TW_GammaC(double a, double x, double* out);
+TW_API void TW_LnGamma(double x, double* out);
+TW_API void TW_Stirling(double x, double* out);
+TW_API void TW_Fact(int32_t n, double* out);
+TW_API void TW_LnFact(int32_t n, double* out);
+TW_API void TW_Psi(double x, double* out);
+/* NaN as x selects the complete beta function B(a, b); otherwise the regularised I_x(a, b). */
+TW_API void TW_Beta(double a, double b, double x, double* out);
+/* selector 1: B(a, b) (x ignored); any other value I_x(a, b). */
+TW_API void TW_Beta_85(double a, double b, double x, double* out, int32_t selector);
+TW_API void TW_Erf(double x, double* out);
+TW_API void TW_ErfC(double x, double* out);
+
+#endif
