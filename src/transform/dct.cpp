@@ -145,9 +145,13 @@ int32_t TrigTableLength(TrigKind kind, int32_t n) {
     int64_t m = n;
     switch (kind) {
         case TrigKind::CosForward:
-        case TrigKind::CosInverse: m = n % 2 == 0 ? n : 2 * m; break;
+        case TrigKind::CosInverse:
+            m = n % 2 == 0 ? n : 2 * m;
+            break;
         case TrigKind::SinForward:
-        case TrigKind::SinInverse: m = 2 * m + 2; break;
+        case TrigKind::SinInverse:
+            m = 2 * m + 2;
+            break;
     }
     return m > INT32_MAX ? 0 : static_cast<int32_t>(m);
 }
@@ -155,10 +159,13 @@ int32_t TrigTableLength(TrigKind kind, int32_t n) {
 size_t TrigWorkLength(TrigKind kind, int32_t n) {
     const size_t m = static_cast<size_t>(n);
     switch (kind) {
-        case TrigKind::CosForward: return n % 2 == 0 ? 2 * m : 4 * m;
-        case TrigKind::CosInverse: return 4 * m;
+        case TrigKind::CosForward:
+            return n % 2 == 0 ? 2 * m : 4 * m;
+        case TrigKind::CosInverse:
+            return 4 * m;
         case TrigKind::SinForward:
-        case TrigKind::SinInverse: break;
+        case TrigKind::SinInverse:
+            break;
     }
     return 4 * (m + 1);
 }
@@ -167,10 +174,14 @@ Status TrigTransformStrided(TrigKind kind, const FftTable* table, const double* 
                             ptrdiff_t inStride, double* y, ptrdiff_t outStride, int32_t n, double* work) {
     const Source source{x, count, inStride};
     switch (kind) {
-        case TrigKind::CosForward: return CosForward(table, source, y, outStride, n, work);
-        case TrigKind::CosInverse: return CosInverse(table, source, y, outStride, n, work);
-        case TrigKind::SinForward: return SinTransform<false>(table, source, y, outStride, n, work);
-        case TrigKind::SinInverse: return SinTransform<true>(table, source, y, outStride, n, work);
+        case TrigKind::CosForward:
+            return CosForward(table, source, y, outStride, n, work);
+        case TrigKind::CosInverse:
+            return CosInverse(table, source, y, outStride, n, work);
+        case TrigKind::SinForward:
+            return SinTransform<false>(table, source, y, outStride, n, work);
+        case TrigKind::SinInverse:
+            return SinTransform<true>(table, source, y, outStride, n, work);
     }
     return InternalErr;
 }
@@ -191,7 +202,8 @@ Status TrigTransform2D(TrigKind kind, const FftTable* rowTable, const FftTable* 
     for (int32_t r = 0; s == 0 && r < rows; ++r) {
         double* row = y + r * stride;
         if (r < xRows)
-            s = TrigTransformStrided(kind, rowTable, x + r * ptrdiff_t{xCols}, xCols, 1, row, 1, cols, work.get());
+            s = TrigTransformStrided(kind, rowTable, x + r * ptrdiff_t{xCols}, xCols, 1, row, 1, cols,
+                                     work.get());
         else
             std::fill(row, row + cols, 0.0);
     }

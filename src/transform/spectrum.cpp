@@ -27,8 +27,7 @@ Status PowerSpectrum(const FftTable* table, double* x, int32_t n) {
     if (st == 0) {
         const double s = InverseSquare(n);
         x[0] = h[0] * h[0] * s;
-        for (int32_t k = 1; k <= (n - 1) / 2; ++k)
-            x[k] = x[n - k] = (h[k] * h[k] + h[n - k] * h[n - k]) * s;
+        for (int32_t k = 1; k <= (n - 1) / 2; ++k) x[k] = x[n - k] = (h[k] * h[k] + h[n - k] * h[n - k]) * s;
         if (n % 2 == 0) x[n / 2] = h[n / 2] * h[n / 2] * s;
     }
     return MergeRelease(st, h.Release());
@@ -81,10 +80,12 @@ Status CrossSpectrum(const FftTable* table, const cdouble* x, const cdouble* y, 
     Scratch<cdouble> ty;
     Status st = ty.Allocate(static_cast<size_t>(n));
     if (st == 0) st = FftComplexForward(table, Lanes(x), Lanes(x) + 1, Lanes(z), Lanes(z) + 1, 2, 2, n);
-    if (st == 0) st = FftComplexForward(table, Lanes(y), Lanes(y) + 1, Lanes(ty.get()), Lanes(ty.get()) + 1, 2, 2, n);
+    if (st == 0)
+        st = FftComplexForward(table, Lanes(y), Lanes(y) + 1, Lanes(ty.get()), Lanes(ty.get()) + 1, 2, 2, n);
     if (st == 0) {
         const double s = InverseSquare(n);
-        for (int32_t k = 0; k < n; ++k) z[k] = ConjProduct(z[k].real(), z[k].imag(), ty[k].real(), ty[k].imag(), s);
+        for (int32_t k = 0; k < n; ++k)
+            z[k] = ConjProduct(z[k].real(), z[k].imag(), ty[k].real(), ty[k].imag(), s);
     }
     return MergeRelease(st, ty.Release());
 }

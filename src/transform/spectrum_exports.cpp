@@ -17,23 +17,9 @@ using tw::Status;
 // host's own status.
 Status AsOutOfMemory(Status s) { return s == 0 ? 0 : OutOfMemoryErr; }
 
-template <bool InstanceData>
-Status RealSpectrum(Handle& x, void** cell) {
-    Frame f;
-    f.Output<double>(x);
-    const int32_t n = tw::Count(x);
-    Status s = n < 1 ? EmptyArrayErr : 0;
-    tw::CachedTables tables(cell, InstanceData);
-    FftTable* table = nullptr;
-    if (s == 0) s = tables.Acquire(0, n, &table);
-    double* xs = nullptr;
-    if (s == 0) s = f.InPlace(x, &xs);
-    if (s == 0) s = tw::PowerSpectrum(table, xs, n);
-    return f.Finish(s);
-}
-
-template <bool InstanceData>
-Status ComplexSpectrum(Handle x, Handle& y, void** cell) {
+// A real record is replaced by its spectrum (y is x); a complex one gives it in y.
+template <class T, bool InstanceData>
+Status Power(Handle x, Handle& y, void** cell) {
     Frame f;
     f.Output<double>(y);
     const int32_t n = tw::Count(x);
@@ -41,11 +27,17 @@ Status ComplexSpectrum(Handle x, Handle& y, void** cell) {
     tw::CachedTables tables(cell, InstanceData);
     FftTable* table = nullptr;
     if (s == 0) s = tables.Acquire(0, n, &table);
-    double* out = nullptr;
-    if (s == 0) s = AsOutOfMemory(f.Resize(y, n, &out));
-    const cdouble* xs = nullptr;
-    if (s == 0) s = f.In(x, &xs);
-    if (s == 0) s = tw::PowerSpectrum(table, xs, out, n);
+    if constexpr (std::is_same_v<T, double>) {
+        double* xs = nullptr;
+        if (s == 0) s = f.InPlace(y, &xs);
+        if (s == 0) s = tw::PowerSpectrum(table, xs, n);
+    } else {
+        double* out = nullptr;
+        if (s == 0) s = AsOutOfMemory(f.Resize(y, n, &out));
+        const cdouble* xs = nullptr;
+        if (s == 0) s = f.In(x, &xs);
+        if (s == 0) s = tw::PowerSpectrum(table, xs, out, n);
+    }
     return f.Finish(s);
 }
 
@@ -74,16 +66,16 @@ Status Cross(Handle x, Handle y, Handle& z, void** cell) {
 
 }  // namespace
 
-TW_API int32_t SpectrumH(Array1DHandle x, void** cell) { return RealSpectrum<false>(x, cell); }
+TW_API int32_t SpectrumH(Array1DHandle x, void** cell) { return Power<double, false>(x, x, cell); }
 
-TW_API int32_t SpectrumH_IDP(Array1DHandle x, void** cell) { return RealSpectrum<true>(x, cell); }
+TW_API int32_t SpectrumH_IDP(Array1DHandle x, void** cell) { return Power<double, true>(x, x, cell); }
 
 TW_API int32_t CxSpectrumH(Array1DHandle x, Array1DHandle y, void** cell) {
-    return ComplexSpectrum<false>(x, y, cell);
+    return Power<cdouble, false>(x, y, cell);
 }
 
 TW_API int32_t CxSpectrumH_IDP(Array1DHandle x, Array1DHandle y, void** cell) {
-    return ComplexSpectrum<true>(x, y, cell);
+    return Power<cdouble, true>(x, y, cell);
 }
 
 TW_API int32_t CrossSpectrumH(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell) {

@@ -40,8 +40,8 @@ TEST(TrigCore, StridedInPlaceEqualsContiguous) {
             }
             ASSERT_EQ(tw::TrigTransform(kind, table.t, x.data(), n, y.data(), n), 0);
             std::vector<double> work(tw::TrigWorkLength(kind, n));
-            ASSERT_EQ(tw::TrigTransformStrided(kind, table.t, column.data(), count, kStride, column.data(), kStride, n,
-                                               work.data()),
+            ASSERT_EQ(tw::TrigTransformStrided(kind, table.t, column.data(), count, kStride, column.data(),
+                                               kStride, n, work.data()),
                       0);
             for (int32_t k = 0; k < n; ++k) EXPECT_EQ(column[k * kStride], y[k]) << k;
             for (size_t i = 0; i < column.size(); ++i) {

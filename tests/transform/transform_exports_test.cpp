@@ -221,7 +221,8 @@ TEST(SpectrumFailure, ResizeFailureIsOutOfMemoryForComplexDataAndTheHostsStatusF
         int32_t (*call)(void** real, void** complex, void** out);
     };
     const Case cases[] = {
-        {"CxSpectrumH", OutOfMemoryErr, [](void**, void** a, void** o) { return CxSpectrumH(a, o, nullptr); }},
+        {"CxSpectrumH", OutOfMemoryErr,
+         [](void**, void** a, void** o) { return CxSpectrumH(a, o, nullptr); }},
         {"CxCrossSpectrumH", OutOfMemoryErr,
          [](void**, void** a, void** o) { return CxCrossSpectrumH(a, a, o, nullptr); }},
         {"CrossSpectrumH", TWRTResizeFailed,
