@@ -103,21 +103,6 @@ class OneD(unittest.TestCase):
             self.assertAlmostEqual(y[0], 2.5 * np.sqrt(n), delta=4 * EPS * 2.5 * np.sqrt(n) * np.log2(2 * n))
             self.assertLess(np.max(np.abs(y[1:]), initial=0), 8 * EPS * 2.5 * np.sqrt(n) * np.log2(2 * n))
 
-    def test_instance_data_twins_match(self):
-        rng = np.random.default_rng(8)
-        for n in (1, 6, 7, 53):
-            x = rng.standard_normal(n)
-            for name in ONE_D:
-                cell = Cell()
-                plain = run1(name, x, 0)
-                twin = run1(name, x, 0, cell=cell, idp=True)
-                self.assertEqual(plain[0], 0)
-                self.assertEqual(twin[0], 0)
-                self.assertTrue(np.array_equal(plain[1], twin[1]), name)
-                self.assertNotEqual(cell.c.value, None)
-                self.assertEqual(lib.TransformUnreserveProc(cell.ref), 0)
-                self.assertEqual(cell.c.value, None)
-
     def test_empty_input_fails_and_empties_the_output(self):
         for name in ONE_D:
             for idp in (False, True):

@@ -53,14 +53,6 @@ TEST(TrigCore, StridedInPlaceEqualsContiguous) {
     }
 }
 
-TEST(TrigCore, TableLengthsFollowTheParityRule) {
-    EXPECT_EQ(tw::TrigTableLength(TrigKind::CosForward, 8), 8);
-    EXPECT_EQ(tw::TrigTableLength(TrigKind::CosInverse, 9), 18);
-    EXPECT_EQ(tw::TrigTableLength(TrigKind::SinForward, 9), 20);
-    EXPECT_EQ(tw::TrigTableLength(TrigKind::SinInverse, 1 << 30), 0);
-    EXPECT_EQ(tw::TrigTableLength(TrigKind::CosForward, (1 << 30) + 1), 0);
-}
-
 long double Pi() { return std::numbers::pi_v<long double>; }
 
 TEST(ChebyshevTransforms, InverseRealIsTheInverseDftOfAnEvenSpectrum) {
