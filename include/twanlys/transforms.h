@@ -1,0 +1,54 @@
+/* Transforms built on the FFT: cosine and sine transforms, power and cross spectra.
+ *
+ * Every export returns its status; on failure (a negative status) its output is emptied. A cell
+ * is a work cell that keeps the FFT table between calls (null before the first call). The _IDP
+ * twins take the host's instance-data cell instead, released by TransformUnreserveProc. */
+#ifndef TWANLYS_TRANSFORMS_H
+#define TWANLYS_TRANSFORMS_H
+
+#include "twanlys/types.h"
+
+/* Orthonormal cosine transform of type II of x (f64), cut or zero-padded to size (below 1: the
+ * count of x), into y (f64). */
+TW_API int32_t DCT_1DH(Array1DHandle x, Array1DHandle y, int32_t size, void** cell);
+/* Its inverse, the orthonormal type III, of the length of x. */
+TW_API int32_t InvDCT_1DH(Array1DHandle x, Array1DHandle y, void** cell);
+/* Unscaled sine transform of type I: y[k-1] = sum over j of x[j-1] sin(pi j k / (size+1)). */
+TW_API int32_t DST_1DH(Array1DHandle x, Array1DHandle y, int32_t size, void** cell);
+/* Its inverse: the same sum times 2 / (n+1). */
+TW_API int32_t InvDST_1DH(Array1DHandle x, Array1DHandle y, void** cell);
+
+/* Separable 2-D forms on f64 matrices: rows first, then columns. The forward forms cut or pad x to
+ * rows x cols (below 1: the size of x). The first cell keeps the table of the row transforms (of
+ * length cols), the second that of the column transforms. */
+TW_API int32_t DCT_2DH(Array2DHandle x, Array2DHandle y, int32_t rows, int32_t cols, void** rowCell,
+                       void** colCell);
+TW_API int32_t InvDCT_2DH(Array2DHandle x, Array2DHandle y, void** rowCell, void** colCell);
+TW_API int32_t DST_2DH(Array2DHandle x, Array2DHandle y, int32_t rows, int32_t cols, void** rowCell,
+                       void** colCell);
+TW_API int32_t InvDST_2DH(Array2DHandle x, Array2DHandle y, void** rowCell, void** colCell);
+
+/* Instance-data twins; the 2-D ones keep the row table in slot 0 and the column table in slot 1. */
+TW_API int32_t DCT_1DH_IDP(Array1DHandle x, Array1DHandle y, int32_t size, void** cell);
+TW_API int32_t InvDCT_1DH_IDP(Array1DHandle x, Array1DHandle y, void** cell);
+TW_API int32_t DST_1DH_IDP(Array1DHandle x, Array1DHandle y, int32_t size, void** cell);
+TW_API int32_t InvDST_1DH_IDP(Array1DHandle x, Array1DHandle y, void** cell);
+TW_API int32_t DCT_2DH_IDP(Array2DHandle x, Array2DHandle y, int32_t rows, int32_t cols, void** cell);
+TW_API int32_t InvDCT_2DH_IDP(Array2DHandle x, Array2DHandle y, void** cell);
+TW_API int32_t DST_2DH_IDP(Array2DHandle x, Array2DHandle y, int32_t rows, int32_t cols, void** cell);
+TW_API int32_t InvDST_2DH_IDP(Array2DHandle x, Array2DHandle y, void** cell);
+
+/* Two-sided power spectrum |X[k]|^2 / n^2 in the order of the DFT. SpectrumH replaces x (f64) by
+ * it; CxSpectrumH writes that of complex x to y (f64). */
+TW_API int32_t SpectrumH(Array1DHandle x, void** cell);
+TW_API int32_t CxSpectrumH(Array1DHandle x, Array1DHandle y, void** cell);
+/* Cross spectrum conj(X[k]) Y[k] / n^2 of two records of one length, into complex z. */
+TW_API int32_t CrossSpectrumH(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
+TW_API int32_t CxCrossSpectrumH(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
+
+TW_API int32_t SpectrumH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t CxSpectrumH_IDP(Array1DHandle x, Array1DHandle y, void** cell);
+TW_API int32_t CrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
+TW_API int32_t CxCrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
+
+#endif
