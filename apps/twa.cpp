@@ -9,11 +9,10 @@
 #include <vector>
 
 #include <algorithm>
-#include <complex>
 
-#include "twanlys/fft.h"
 #include "twanlys/generate.h"
 #include "twanlys/stats.h"
+#include "twanlys/transforms.h"
 #include "twanlys/windows.h"
 #include "twrt.hpp"
 
@@ -80,43 +79,31 @@ void Histogram(const Array1D<double>& x) {
     std::printf("\n");
 }
 
-void Window(const Array1D<double>& x) {
-    Array1D<double> windowed(x.vec());
-    const int32_t status = AllWinH(windowed.h(), 1, NAN, 0, 0);
-    WindowConstants c{};
-    WinConstByNameH(windowed.size(), 1, NAN, &c);
-    double rms = 0;
-    int32_t s;
-    RMS_head(windowed.h(), &rms, &s);
-    std::printf("Hann window (status %d)\n  ENBW %.4f bins, coherent gain %.4f, windowed rms %.6f\n\n",
-                status, c.enbw, c.coherentGain, rms);
-}
-
-// The strongest lines of the windowed signal's spectrum (one-sided magnitude, scaled so that a
-// sine of amplitude A shows as A at its bin).
+// The Hann-windowed power spectrum and its strongest lines. The two-sided power |X|^2 / n^2 of a
+// sine of amplitude A is (A g / 2)^2 at its bin, g being the window's coherent gain, so the
+// amplitude reads back as 2 sqrt(P) / g and the sine's power A^2 / 2 as 2 P / g^2.
 void Spectrum(const Array1D<double>& x) {
-    Array1D<double> windowed(x.vec());
-    AllWinH(windowed.h(), 1, NAN, 0, 0);
-    Array1D<std::complex<double>> spectrum;
+    Array1D<double> power(x.vec());
+    const int32_t windowStatus = AllWinH(power.h(), 1, NAN, 0, 0);
+    WindowConstants c{};
+    WinConstByNameH(x.size(), 1, NAN, &c);
     void* cell = nullptr;
-    const int32_t status = ReQXFFTH(windowed.h(), spectrum.h(), &cell);
-    TWRTRunCleanups(2);  // the table cached in the cell is released with the call site
-    if (status != 0) {
-        std::printf("FFT failed: %d\n", status);
+    const int32_t status = SpectrumH(power.h(), &cell);
+    TWRTRunCleanups(2);  // the FFT table cached in the cell goes with the call site
+    if (windowStatus != 0 || status != 0) {
+        std::printf("spectrum failed: %d %d\n", windowStatus, status);
         return;
     }
-    const int32_t n = spectrum.size();
+    std::printf("Hann window: ENBW %.4f bins, coherent gain %.4f\n", c.enbw, c.coherentGain);
+    const int32_t n = power.size();
     std::vector<std::pair<double, int32_t>> lines;
-    for (int32_t k = 1; k < n / 2; ++k) {
-        const double magnitude = 2 * std::abs(spectrum[k]) / (0.5 * n);
-        // A line is a local maximum of the magnitude.
-        if (magnitude > std::abs(spectrum[k - 1]) * 4 / n && magnitude > std::abs(spectrum[k + 1]) * 4 / n)
-            lines.emplace_back(magnitude, k);
-    }
+    for (int32_t k = 1; k < n / 2; ++k)
+        if (power[k] > power[k - 1] && power[k] > power[k + 1]) lines.emplace_back(power[k], k);
     std::sort(lines.rbegin(), lines.rend());
-    std::printf("Strongest lines of the Hann-windowed spectrum (%d-point FFT)\n", n);
+    std::printf("Strongest lines of the windowed power spectrum (%d points)\n", n);
     for (size_t i = 0; i < lines.size() && i < 6; ++i)
-        std::printf("  %7.1f Hz  amplitude %.4f\n", lines[i].second * kRate / n, lines[i].first);
+        std::printf("  %7.1f Hz  %8.2f dB  amplitude %.4f\n", lines[i].second * kRate / n,
+                    10 * std::log10(2 * lines[i].first / (c.coherentGain * c.coherentGain)), 2 * std::sqrt(lines[i].first) / c.coherentGain);
     std::printf("\n");
 }
 
@@ -126,7 +113,6 @@ int Demo() {
                 "200-400 Hz chirp\n\n", kSamples, kRate);
     Statistics(x);
     Histogram(x);
-    Window(x);
     Spectrum(x);
     return 0;
 }
