@@ -209,6 +209,13 @@ template <class T> Status InvertByCholesky(T* a, int32_t n) {
     return MergeRelease(MergeRelease(s, l.Release()), column.Release());
 }
 
+template <class T> Status InvertFromCholesky(T* l, int32_t n) {
+    Scratch<T> column;
+    if (column.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    CholeskyInverse(l, n, column.get());
+    return column.Release();
+}
+
 Status PreallocCholeskyInverse(double* a, int32_t n, double* work1, double* work2) {
     PackCompact(a, n, 0, work1);
     const Status s = FactorLoop<double, false>(work1, n);
@@ -238,6 +245,24 @@ template <class T> Status CompactTriInverse(const T* t, int32_t n, int32_t kind,
     return 0;
 }
 
+template <class T>
+Status SolveTriangular(const T* a, int32_t n, int32_t kind, const T* b, int32_t k, T* x) {
+    Scratch<T> t;
+    if (t.Allocate(static_cast<size_t>(n) * (n + 1) / 2) != 0) return OutOfMemoryErr;
+    PackCompact(a, n, kind, t.get());
+    const Status s = CompactTriSolve(t.get(), n, b, k, kind, x);
+    return MergeRelease(s, t.Release());
+}
+
+template <class T> Status InvertTriangular(T* a, int32_t n, int32_t kind) {
+    Scratch<T> t;
+    if (t.Allocate(static_cast<size_t>(n) * (n + 1) / 2) != 0) return OutOfMemoryErr;
+    PackCompact(a, n, kind, t.get());
+    Status s = CompactTriInverse(t.get(), n, kind, t.get());
+    if (s == 0) ExpandCompact(t.get(), n, kind, a);
+    return MergeRelease(s, t.Release());
+}
+
 #define TW_COMPACT_SOLVE(T)                                                                 \
     template Status CholeskyFactor<T>(T*, int32_t);                                         \
     template void CholeskySolve<T>(const T*, const T*, int32_t, T*);                        \
@@ -247,6 +272,9 @@ template <class T> Status CompactTriInverse(const T* t, int32_t n, int32_t kind,
     template Status FullCholesky<T>(T*, int32_t);                                           \
     template Status SolveByCholesky<T>(const T*, int32_t, int32_t, const T*, int32_t, T*);  \
     template Status InvertByCholesky<T>(T*, int32_t);                                       \
+    template Status InvertFromCholesky<T>(T*, int32_t);                                     \
+    template Status SolveTriangular<T>(const T*, int32_t, int32_t, const T*, int32_t, T*);  \
+    template Status InvertTriangular<T>(T*, int32_t, int32_t);                              \
     template Status CompactTriSolve<T>(const T*, int32_t, const T*, int32_t, int32_t, T*);  \
     template Status CompactTriInverse<T>(const T*, int32_t, int32_t, T*);
 TW_COMPACT_SOLVE(double)

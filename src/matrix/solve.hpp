@@ -71,6 +71,8 @@ template <class T> Status FullCholesky(T* a, int32_t n);
 // n by k right-hand sides of b into x.
 template <class T>
 Status SolveByCholesky(const T* a, int32_t n, int32_t triangle, const T* b, int32_t k, T* x);
+// The inverse of L L^H from the factor, in place, in the lower layout.
+template <class T> Status InvertFromCholesky(T* l, int32_t n);
 // Driver: the inverse of a from its lower triangle, over both triangles.
 template <class T> Status InvertByCholesky(T* a, int32_t n);
 // The inner-loop form: packs into work1, factors without the screen and the sqrt(eps) test (a
@@ -82,6 +84,11 @@ Status PreallocCholeskyInverse(double* a, int32_t n, double* work1, double* work
 template <class T> Status CompactTriSolve(const T* t, int32_t n, const T* b, int32_t k, int32_t kind, T* x);
 // The inverse on compact storage; out may be t.
 template <class T> Status CompactTriInverse(const T* t, int32_t n, int32_t kind, T* out);
+// The same on the lower (kind 0) or upper (1) triangle of the full n by n a: the solve of the n by k
+// b into x, and the inverse in place, with the other triangle cleared.
+template <class T>
+Status SolveTriangular(const T* a, int32_t n, int32_t kind, const T* b, int32_t k, T* x);
+template <class T> Status InvertTriangular(T* a, int32_t n, int32_t kind);
 
 // --- Band and tridiagonal routes ---------------------------------------------------------------
 
