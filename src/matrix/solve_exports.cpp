@@ -137,16 +137,19 @@ Status LuLinEqs(Handle lu, Handle perm, Handle& b) {
     return f.Finish(s);
 }
 
-template <class T>
-Status InvLuDri(Handle& a) {
+// The frame of the inversions in place of a full matrix: core(elements, order).
+template <class T, class Core>
+Status InvertInPlace(Handle& a, Core core) {
     Frame f;
     T* pa = nullptr;
     Status s = SquareWins(Dims(a));
     const Status view = f.InPlace2D(a, &pa);
     if (s == 0) s = view;
-    if (s == 0) s = InvertByLu(pa, Dims(a).rows);
+    if (s == 0) s = core(pa, Dims(a).rows);
     return f.Finish(s);
 }
+
+template <class T> Status InvLuDri(Handle& a) { return InvertInPlace<T>(a, InvertByLu<T>); }
 
 template <class T>
 Status LuInvMatrix(Handle& lu, Handle perm) {
@@ -166,9 +169,10 @@ Status LuInvMatrix(Handle& lu, Handle perm) {
 
 // --- Cholesky route ------------------------------------------------------------------------------
 
-// One right-hand side (b 1-D, triangle 1) or several (b 2-D, triangle given).
-template <class T, bool Set>
-Status LinEqsCholesky(Handle a, int32_t triangle, Handle b, Handle& x, int32_t* host) {
+// The square drivers with a triangle or kind selector: one right-hand side (b 1-D) or several
+// (b 2-D), solved by core(a, n, selector, b, k, x).
+template <class T, bool Set, class Core>
+Status SelectorSolve(Handle a, int32_t selector, Handle b, Handle& x, int32_t* host, Core core) {
     Frame f;
     if (Set)
         f.Output2D<T>(x);
@@ -179,12 +183,17 @@ Status LinEqsCholesky(Handle a, int32_t triangle, Handle b, Handle& x, int32_t* 
     T* px = nullptr;
     Status s = (Empty(d) || (Set && Empty(db))) ? EmptyArrayErr : d.rows != d.cols ? NotSquareErr : 0;
     if (s == 0 && db.rows != d.rows) s = EqSamplesErr;
-    if (s == 0 && static_cast<uint32_t>(triangle) > 1) s = InvalidSelectorErr;
+    if (s == 0 && static_cast<uint32_t>(selector) > 1) s = InvalidSelectorErr;
     if (s == 0) s = Set ? Out2D(f, x, d.rows, db.cols, &px, host) : Out1D(f, x, d.rows, &px, host);
     if (s == 0) s = f.In2D(a, &pa);
     if (s == 0) s = Set ? f.In2D(b, &pb) : f.In(b, &pb);
-    if (s == 0) s = SolveByCholesky(pa, d.rows, triangle, pb, db.cols, px);
+    if (s == 0) s = core(pa, d.rows, selector, pb, db.cols, px);
     return f.Finish(s);
+}
+
+template <class T, bool Set>
+Status LinEqsCholesky(Handle a, int32_t triangle, Handle b, Handle& x, int32_t* host) {
+    return SelectorSolve<T, Set>(a, triangle, b, x, host, SolveByCholesky<T>);
 }
 
 template <class T>
@@ -202,16 +211,7 @@ Status CholeskyLinEqs(Handle l, Handle& b) {
     return f.Finish(s);
 }
 
-template <class T>
-Status InvChoDri(Handle& a) {
-    Frame f;
-    T* pa = nullptr;
-    Status s = SquareWins(Dims(a));
-    const Status view = f.InPlace2D(a, &pa);
-    if (s == 0) s = view;
-    if (s == 0) s = InvertByCholesky(pa, Dims(a).rows);
-    return f.Finish(s);
-}
+template <class T> Status InvChoDri(Handle& a) { return InvertInPlace<T>(a, InvertByCholesky<T>); }
 
 template <class T>
 Status CholeskyInvMatrix(Handle& l) {
@@ -244,31 +244,13 @@ Status TriLinEqs(const CompactMatrix* t, Handle& b) {
 
 template <class T>
 Status TriEqsSet(Handle a, int32_t kind, Handle b, Handle& x) {
-    Frame f;
-    f.Output2D<T>(x);
-    const Shape d = Dims(a), db = Dims(b);
-    const T *pa = nullptr, *pb = nullptr;
-    T* px = nullptr;
     int32_t host = 0;
-    Status s = (Empty(d) || Empty(db)) ? EmptyArrayErr : d.rows != d.cols ? NotSquareErr : 0;
-    if (s == 0 && db.rows != d.rows) s = EqSamplesErr;
-    if (s == 0 && static_cast<uint32_t>(kind) > 1) s = InvalidSelectorErr;
-    if (s == 0) s = Out2D(f, x, d.rows, db.cols, &px, &host);
-    if (s == 0) s = f.In2D(a, &pa);
-    if (s == 0) s = f.In2D(b, &pb);
-    if (s == 0) s = SolveTriangular(pa, d.rows, kind, pb, db.cols, px);
-    return f.Finish(s);
+    return SelectorSolve<T, true>(a, kind, b, x, &host, SolveTriangular<T>);
 }
 
 template <class T>
 Status InvTriDri(Handle& a, int32_t kind) {
-    Frame f;
-    T* pa = nullptr;
-    Status s = SquareWins(Dims(a));
-    const Status view = f.InPlace2D(a, &pa);
-    if (s == 0) s = view;
-    if (s == 0) s = InvertTriangular(pa, Dims(a).rows, kind);
-    return f.Finish(s);
+    return InvertInPlace<T>(a, [kind](T* p, int32_t n) { return InvertTriangular(p, n, kind); });
 }
 
 template <class T>

@@ -4,6 +4,7 @@
 #include <cmath>
 #include <complex>
 #include <functional>
+#include <limits>
 #include <string>
 #include <vector>
 
@@ -298,6 +299,34 @@ TEST(CheckOrder, DeterminantAndPseudoInverse) {
     PseudoInverse_head(empty.h(), &tol, &status);
     EXPECT_EQ(status, EmptyArrayErr);
     EXPECT_EQ(empty.cols(), 0);
+}
+
+// The drivers that hand data to the SVD or to a factorisation screen it first; the loops on
+// factors the caller made do not.
+TEST(CheckOrder, NonFiniteInput) {
+    const double inf = std::numeric_limits<double>::infinity();
+    int32_t status = 0;
+    D2 a = Matrix(3, 3), x;
+    D1 nanB{1, std::nan(""), 1}, xv;
+    GenLinEqs_head(a.h(), nanB.h(), xv.h(), &status);
+    EXPECT_EQ(status, NanInfErr);
+    EXPECT_EQ(xv.size(), 0);
+    D2 infA(3, 3, {4, 1, inf, 1, 4, 1, 1, 1, 4});
+    D1 b = Vector(3);
+    EqsByCholeskyDri_head(infA.h(), b.h(), xv.h(), &status);
+    EXPECT_EQ(status, NanInfErr);
+    // Only the triangle that is read is screened: the lower one here.
+    EXPECT_EQ(EqsSetByCholeskyDri_head(infA.h(), 0, a.h(), x.h()), 0);
+    EXPECT_EQ(EqsSetBySVDDri_head(infA.h(), a.h(), x.h()), NanInfErr);
+    D2 big(1, 1, {1.7976931348623157e308});
+    double tol = -1;
+    PseudoInverse_head(big.h(), &tol, &status);
+    EXPECT_EQ(status, NanInfErr);
+    // A compact factor with Infinity is substituted as it stands.
+    D1 l{1, 0, inf}, rhs{1, 1};
+    CholeskyLinEqs_head(l.h(), rhs.h(), &status);
+    EXPECT_EQ(status, 0);
+    EXPECT_EQ(rhs[1], 0.0);
 }
 
 // --- Quirks ------------------------------------------------------------------------------------

@@ -7,22 +7,9 @@ import scipy.linalg as sl
 from scipy.linalg import lapack
 
 import twanlys as tw
+from matrix_common import C128, rel as err, rnd, unitary_err
 
-C128 = np.complex128
 SHAPES = [(5, 5), (7, 4), (4, 7), (1, 3), (3, 1), (40, 25)]
-
-
-def rnd(rng, shape, cx):
-    a = rng.standard_normal(shape)
-    return a + 1j * rng.standard_normal(shape) if cx else a
-
-
-def err(x, ref):
-    return np.abs(x - ref).max() / max(np.abs(ref).max(), 1e-300)
-
-
-def unitary_err(q):
-    return np.abs(q.conj().T @ q - np.eye(q.shape[1])).max()
 
 
 def lu_product(lu, perm, m, n):

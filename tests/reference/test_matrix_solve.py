@@ -7,27 +7,14 @@ import scipy.linalg as sl
 from scipy.linalg import lapack
 
 import twanlys as tw
+from matrix_common import C128, EPS, ill, rel, rnd
 
-C128 = np.complex128
-EPS = 2.0 ** -52
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p
 
 
 class Compact(ctypes.Structure):
     _pack_ = 1
     _fields_ = [("data", P), ("kind", I32)]
-
-
-def rnd(rng, shape, cx):
-    a = rng.standard_normal(shape)
-    return a + 1j * rng.standard_normal(shape) if cx else a
-
-
-def hilbert(n, cx):
-    """Condition about 1.5e10 at n = 8; the complex form has a unit phase per row."""
-    i = np.arange(n)
-    h = 1.0 / (i[:, None] + i[None, :] + 1)
-    return h * np.exp(1j * i)[:, None] if cx else h
 
 
 def hpd(rng, n, cx):
@@ -41,16 +28,6 @@ def lower_compact(a):
 
 def upper_compact(a):
     return a.T[np.tril_indices(a.shape[0])]
-
-
-def from_lower_compact(c, n):
-    out = np.zeros((n, n), dtype=c.dtype)
-    out.T[np.triu_indices(n)] = c
-    return out
-
-
-def rel(got, want):
-    return np.abs(got - want).max() / max(np.abs(want).max(), 1e-300)
 
 
 def svd_tol(a, x, rtol):
@@ -87,7 +64,7 @@ class Solvers(unittest.TestCase):
         for cx in (False, True):
             for n in (1, 6, 17):
                 yield cx, rnd(self.rng, (n, n), cx), True
-            yield cx, hilbert(8, cx), False
+            yield cx, ill(8, cx), False
 
     def check_solution(self, a, x, want, well):
         cond = np.linalg.cond(a)
@@ -130,7 +107,7 @@ class Solvers(unittest.TestCase):
             for shape in ((7, 4), (4, 7), (6, 6), (1, 5), (5, 1)):
                 yield cx, rnd(self.rng, shape, cx)
             yield cx, rnd(self.rng, (8, 3), cx) @ rnd(self.rng, (3, 6), cx)  # rank 3
-            yield cx, hilbert(9, cx)
+            yield cx, ill(9, cx)
 
     def test_least_squares(self):
         for cx, a in self.svd_systems():
@@ -182,7 +159,7 @@ class Solvers(unittest.TestCase):
 
     def test_refinement_reduces_the_residual(self):
         # A consistent, ill-conditioned square system: each pass of refinement may only help.
-        a = hilbert(10, False)
+        a = ill(10, False)
         b = a @ np.ones(10)
         res = []
         for passes in (1, 2, 3):
