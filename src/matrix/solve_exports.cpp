@@ -50,24 +50,33 @@ Status LinEqsSvd(Handle a, Handle b, Handle& x, double tol, int32_t* host) {
     return f.Finish(s == RankDeficientWarn ? 0 : s);
 }
 
-// The routes with a caller-owned work handle: sized by a first call of the core, then used.
+// The routes with a caller-owned work handle, sized by a first call of the core. b and x are
+// copied through the work block as well, so that nothing is allocated even where the host's 1-D
+// blocks are only 4-byte aligned: one spare element leaves room to align.
 Status LinEqsWork(Handle a, Handle b, Handle& x, double tol, int32_t refinements, Handle& work) {
     Frame f;
     f.Output<double>(x);
     f.Output<double>(work);
     const Shape d = Dims(a);
-    const double *pa = nullptr, *pb = nullptr;
-    double *px = nullptr, *pw = nullptr;
+    const int32_t m = d.rows, n = d.cols;
+    const double* pa = nullptr;
+    unsigned char *xBytes = nullptr, *wBytes = nullptr;
     int32_t host = 0;
     size_t needed = 0;
-    Status s = Empty(d) ? EmptyArrayErr : Count(b) != d.rows ? EqSamplesErr : 0;
-    if (s == 0) s = Out1D(f, x, d.cols, &px, &host);
-    if (s == 0) s = RefinedSolveBySvd<double>(nullptr, d.rows, d.cols, nullptr, nullptr, tol, refinements, nullptr, &needed);
-    if (s == 0 && needed > INT32_MAX) s = OutOfMemoryErr;
-    if (s == 0) s = Out1D(f, work, static_cast<int32_t>(needed), &pw, &host);
+    Status s = Empty(d) ? EmptyArrayErr : Count(b) != m ? EqSamplesErr : 0;
+    if (s == 0) s = RawOut1D<double>(f, x, n, &xBytes, &host);
+    if (s == 0) s = RefinedSolveBySvd<double>(nullptr, m, n, nullptr, nullptr, tol, refinements, nullptr, &needed);
+    const size_t total = needed + static_cast<size_t>(m) + static_cast<size_t>(n) + 1;
+    if (s == 0 && total > INT32_MAX) s = OutOfMemoryErr;
+    if (s == 0) s = RawOut1D<double>(f, work, static_cast<int32_t>(total), &wBytes, &host);
     if (s == 0) s = f.In2D(a, &pa);
-    if (s == 0) s = f.In(b, &pb);
-    if (s == 0) s = RefinedSolveBySvd(pa, d.rows, d.cols, pb, px, tol, refinements, pw, nullptr);
+    if (s == 0) {
+        double* rhs = AlignedIn<double>(wBytes);
+        double* solution = rhs + m;
+        std::memcpy(rhs, static_cast<unsigned char*>(*b) + 4, static_cast<size_t>(m) * sizeof(double));
+        s = RefinedSolveBySvd(pa, m, n, rhs, solution, tol, refinements, solution + n, nullptr);
+        if (s >= 0) std::memcpy(xBytes, solution, static_cast<size_t>(n) * sizeof(double));
+    }
     return f.Finish(s == RankDeficientWarn ? 0 : s);
 }
 

@@ -410,11 +410,14 @@ TEST(Quirks, RefinementChangesOnlyTheCutOff) {
     EXPECT_EQ(work2.size(), work.size());
 }
 
-// The caller's work handle is the only memory the 2010 route takes: with a workspace arena too
-// small for any scratch block, it still succeeds, and the host sees only the two resizes.
-TEST(Quirks, GenLinEqs2010AllocatesOnlyItsOutputs) {
+// The caller's work handle is the only memory the 2010 route takes, in both placements of the
+// host's blocks: with a workspace arena too small for any scratch block, it still succeeds, and the
+// host sees only the two resizes.
+class WorkRoute : public ::testing::TestWithParam<bool> {};
+
+TEST_P(WorkRoute, AllocatesOnlyItsOutputs) {
     if (twtest::WorkspaceMode()) GTEST_SKIP() << "the suite's own workspace is in use";
-    twrt::Placement aligned(true);
+    twrt::Placement where(GetParam());
     D2 a(5, 3, {2, 1, 0, 1, 3, 1, 0, 1, 4, 1, 0, 1, 2, 2, 2});
     D1 b{1, 2, 3, 4, 5}, x, work, reference;
     int32_t status = 1;
@@ -427,6 +430,7 @@ TEST(Quirks, GenLinEqs2010AllocatesOnlyItsOutputs) {
     ASSERT_EQ(int32_t{e.code}, 0);
     const int64_t allocs = TWRTAllocCount(), resizes = TWRTResizeCount();
     const int32_t first = GenLinEqs2010_head(a.h(), b.h(), x.h(), -1.0, work.h());
+    const int32_t refined = GenLinEqsbySVD2011_head(a.h(), b.h(), x.h(), -1.0, 2, work.h());
     const int64_t allocsAfter = TWRTAllocCount(), resizesAfter = TWRTResizeCount();
     // The control: the allocating route cannot run in the same arena.
     D1 y;
@@ -436,18 +440,24 @@ TEST(Quirks, GenLinEqs2010AllocatesOnlyItsOutputs) {
     EXPECT_EQ(int32_t{e.code}, 0);
 
     EXPECT_EQ(first, 0);
-    EXPECT_EQ(resizesAfter - resizes, 2);
+    EXPECT_EQ(refined, 0);
+    EXPECT_EQ(resizesAfter - resizes, 4);
     EXPECT_EQ(allocsAfter - allocs, resizesAfter - resizes);
-    EXPECT_EQ(x.vec(), reference.vec());
+    ASSERT_EQ(x.size(), 3);
+    for (int i = 0; i < 3; ++i) EXPECT_NEAR(x[i], reference[i], 1e-14);
     EXPECT_GT(work.size(), 0);
     EXPECT_EQ(status, OutOfMemoryErr);
 
+    GenLinEqs2010_head(a.h(), b.h(), x.h(), -1.0, work.h());
+    EXPECT_EQ(x.vec(), reference.vec());
     // Failure empties the work handle as well.
     D1 shortB{1, 2};
     EXPECT_EQ(GenLinEqs2010_head(a.h(), shortB.h(), x.h(), -1.0, work.h()), EqSamplesErr);
     EXPECT_EQ(work.size(), 0);
     EXPECT_EQ(x.size(), 0);
 }
+
+INSTANTIATE_TEST_SUITE_P(Placements, WorkRoute, ::testing::Bool(), twtest::PlacementName);
 
 TEST(Quirks, TriangularKindsAndThresholds) {
     // Kind 2: the real export leaves b alone and reports 0, the complex one refuses it.
