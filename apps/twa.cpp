@@ -8,6 +8,10 @@
 #include <string>
 #include <vector>
 
+#include <algorithm>
+#include <complex>
+
+#include "twanlys/fft.h"
 #include "twanlys/generate.h"
 #include "twanlys/stats.h"
 #include "twanlys/windows.h"
@@ -88,6 +92,34 @@ void Window(const Array1D<double>& x) {
                 status, c.enbw, c.coherentGain, rms);
 }
 
+// The strongest lines of the windowed signal's spectrum (one-sided magnitude, scaled so that a
+// sine of amplitude A shows as A at its bin).
+void Spectrum(const Array1D<double>& x) {
+    Array1D<double> windowed(x.vec());
+    AllWinH(windowed.h(), 1, NAN, 0, 0);
+    Array1D<std::complex<double>> spectrum;
+    void* cell = nullptr;
+    const int32_t status = ReQXFFTH(windowed.h(), spectrum.h(), &cell);
+    TWRTRunCleanups(2);  // the table cached in the cell is released with the call site
+    if (status != 0) {
+        std::printf("FFT failed: %d\n", status);
+        return;
+    }
+    const int32_t n = spectrum.size();
+    std::vector<std::pair<double, int32_t>> lines;
+    for (int32_t k = 1; k < n / 2; ++k) {
+        const double magnitude = 2 * std::abs(spectrum[k]) / (0.5 * n);
+        // A line is a local maximum of the magnitude.
+        if (magnitude > std::abs(spectrum[k - 1]) * 4 / n && magnitude > std::abs(spectrum[k + 1]) * 4 / n)
+            lines.emplace_back(magnitude, k);
+    }
+    std::sort(lines.rbegin(), lines.rend());
+    std::printf("Strongest lines of the Hann-windowed spectrum (%d-point FFT)\n", n);
+    for (size_t i = 0; i < lines.size() && i < 6; ++i)
+        std::printf("  %7.1f Hz  amplitude %.4f\n", lines[i].second * kRate / n, lines[i].first);
+    std::printf("\n");
+}
+
 int Demo() {
     const Array1D<double> x = DemoSignal();
     std::printf("twa demo: %d samples at %.0f Hz of a 50 Hz sine, a 120 Hz square wave and a\n"
@@ -95,6 +127,7 @@ int Demo() {
     Statistics(x);
     Histogram(x);
     Window(x);
+    Spectrum(x);
     return 0;
 }
 

@@ -1,10 +1,47 @@
 #include "transform/fft/holder.hpp"
 
-#include "frame/memory.hpp"
+#include "frame/host_link.hpp"
 
 namespace tw {
+namespace {
 
-// Provisional until the FFT table list exists: no transform stores a holder yet.
-void ReleaseTableHolder(void* holder) { PlainFree(holder); }
+void HolderCleanup(void* holder) { ReleaseTableHolder(holder); }
+
+}  // namespace
+
+void ReleaseTableHolder(void* holder) {
+    if (holder == nullptr) return;
+    DestroyFftTable(static_cast<TableHolder*>(holder)->table);
+    PlainFree(holder);
+}
+
+Status AcquireTableHolder(void** cell, int32_t n, bool registerCleanup, FftTable** table) {
+    *table = nullptr;
+    if (*cell == nullptr) {
+        *cell = PlainZeroAlloc(sizeof(TableHolder));
+        if (*cell == nullptr) return OutOfMemoryErr;
+    }
+    auto* holder = static_cast<TableHolder*>(*cell);
+    if (holder->table == nullptr) {
+        holder->table = CreateFftTable(n);
+        if (holder->table == nullptr) {
+            PlainFree(holder);
+            *cell = nullptr;
+            return OutOfMemoryErr;
+        }
+        if (registerCleanup) HostSetCleanup(&HolderCleanup, holder, 2);
+    } else if (holder->table->size != n) {
+        DestroyFftTable(holder->table);
+        holder->table = CreateFftTable(n);
+        if (holder->table == nullptr) {
+            if (registerCleanup) HostSetCleanup(&HolderCleanup, holder, 0);
+            PlainFree(holder);
+            *cell = nullptr;
+            return OutOfMemoryErr;
+        }
+    }
+    *table = holder->table;
+    return 0;
+}
 
 }  // namespace tw

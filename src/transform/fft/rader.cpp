@@ -1,0 +1,142 @@
+// Rader's algorithm for a prime stage p: the DFT at the indices other than 0 is a cyclic
+// convolution of length p-1 in the order of the powers of a primitive root, carried out by two
+// forward transforms on a shared table of length p-1.
+#include "transform/fft/generic_dft.hpp"
+#include "transform/fft/table_internal.hpp"
+
+namespace tw::fft {
+namespace {
+
+int32_t SmallestPrimitiveRoot(int32_t p) {
+    if (p <= 2) return 1;
+    for (int32_t g = 2;; ++g) {
+        int32_t power = g, order = 1;
+        while (power != 1) {
+            int64_t next = static_cast<int64_t>(power) * g;
+            while (next >= p) next -= p;
+            power = static_cast<int32_t>(next);
+            ++order;
+        }
+        if (order == p - 1) return g;
+    }
+}
+
+// The product of a transformed element by the kernel, conjugated: a forward transform of the
+// conjugate is the conjugate of the inverse, so the second pass needs no inverse kernel.
+inline void ConjugateProduct(double& u, double& v, double c, double d) {
+    const double re = c * u - d * v;
+    const double im = -(d * u) - c * v;
+    u = re;
+    v = im;
+}
+
+}  // namespace
+
+bool SetupRaderStage(FftStage* st, int32_t p) {
+    const int32_t m = p - 1;
+    st->raderTable = CreateLocked(m);
+    st->raderGather = static_cast<int32_t*>(PlainAlloc(static_cast<size_t>(p) * sizeof(int32_t)));
+    st->raderScatter = static_cast<int32_t*>(PlainAlloc(static_cast<size_t>(p) * sizeof(int32_t)));
+    st->raderKernelRe = static_cast<double*>(PlainAlloc(static_cast<size_t>(m) * sizeof(double)));
+    st->raderKernelIm = static_cast<double*>(PlainAlloc(static_cast<size_t>(m) * sizeof(double)));
+    if (st->raderTable == nullptr || st->raderGather == nullptr || st->raderScatter == nullptr ||
+        st->raderKernelRe == nullptr || st->raderKernelIm == nullptr)
+        return false;
+    const int32_t g = SmallestPrimitiveRoot(p);
+    st->raderGather[0] = 0;
+    st->raderGather[1] = 1;
+    st->raderScatter[0] = 0;
+    st->raderScatter[1] = 1;
+    int64_t x = g;
+    for (int32_t k = 2; k <= p - 1; ++k) {
+        st->raderGather[k] = static_cast<int32_t>(x);
+        st->raderScatter[p + 1 - k] = static_cast<int32_t>(x);
+        x = x * g % p;
+    }
+    Scratch<double> w;
+    if (w.Allocate(4 * static_cast<size_t>(m)) != 0) return false;
+    double *er = w.get(), *ei = er + m, *cr = ei + m, *ci = cr + m;
+    ExpRun(static_cast<long double>(kTwoPi) / p, 1, p - 1, er, ei, 1);
+    const double scale = 1.0 / m;
+    for (int32_t q = 0; q < m; ++q) {
+        const int32_t j = st->raderScatter[q + 1];
+        cr[q] = scale * er[j - 1];
+        ci[q] = scale * ei[j - 1];
+    }
+    Status s = FftComplexForward(st->raderTable, cr, ci, st->raderKernelRe, st->raderKernelIm, 1, 1, m);
+    s = MergeRelease(s, w.Release());
+    return s == 0;
+}
+
+void ReleaseRaderStage(FftStage* st) {
+    DestroyLocked(st->raderTable);
+    PlainFree(st->raderGather);
+    PlainFree(st->raderScatter);
+    PlainFree(st->raderKernelRe);
+    PlainFree(st->raderKernelIm);
+}
+
+Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
+                    double* yi, double* work) {
+    const int32_t m = p - 1;
+    const int32_t* gather = st->raderGather;
+    const int32_t* scatter = st->raderScatter;
+    double *ar = work, *ai = ar + m;
+    const double x0r = xr[0], x0i = xi[0];
+    double sr = x0r, si = x0i;
+    for (int32_t q = 0; q < m; ++q) {
+        ar[q] = xr[gather[q + 1]];
+        ai[q] = xi[gather[q + 1]];
+        sr += ar[q];
+        si += ai[q];
+    }
+    yr[0] = sr;
+    yi[0] = si;
+    if (const Status s = FftComplexForward(st->raderTable, ar, ai, yr + 1, yi + 1, 1, 1, m)) return s;
+    for (int32_t q = 0; q < m; ++q)
+        ConjugateProduct(yr[q + 1], yi[q + 1], st->raderKernelRe[q], st->raderKernelIm[q]);
+    if (const Status s = FftComplexForward(st->raderTable, yr + 1, yi + 1, ar, ai, 1, 1, m)) return s;
+    for (int32_t k = 1; k <= m; ++k) {
+        yr[scatter[k]] = ar[k - 1] + x0r;
+        yi[scatter[k]] = x0i - ai[k - 1];
+    }
+    return 0;
+}
+
+Status RaderReal(const FftStage* st, int32_t p, const double* x, double* y, double* work) {
+    const int32_t m = p - 1;
+    const int32_t* gather = st->raderGather;
+    const int32_t* scatter = st->raderScatter;
+    double *tr = work, *ti = tr + m, *er = ti + m, *ei = er + m;
+    const double x0 = x[0];
+    double sum = x0;
+    for (int32_t q = 0; q < m; ++q) {
+        tr[q] = x[gather[q + 1]];
+        sum += tr[q];
+    }
+    y[0] = sum;
+    if (const Status s = FftRealForward(st->raderTable, tr, y + 1, 1, 1, m)) return s;
+    // m = p - 1 is even: expand the half-complex result into the full spectrum.
+    const double* h = y + 1;
+    er[0] = h[0];
+    ei[0] = 0;
+    er[m / 2] = h[m / 2];
+    ei[m / 2] = 0;
+    for (int32_t k = 1; k < m / 2; ++k) {
+        er[k] = er[m - k] = h[k];
+        ei[k] = h[m - k];
+        ei[m - k] = -h[m - k];
+    }
+    for (int32_t q = 0; q < m; ++q) ConjugateProduct(er[q], ei[q], st->raderKernelRe[q], st->raderKernelIm[q]);
+    if (const Status s = FftComplexForward(st->raderTable, er, ei, tr, ti, 1, 1, m)) return s;
+    for (int32_t k = 1; k <= m; ++k) {
+        const int32_t j = scatter[k];
+        if (j <= p / 2) {
+            y[j] = tr[k - 1] + x0;
+            y[p - j] = -ti[k - 1];
+        }
+    }
+    return 0;
+}
+
+}  // namespace tw::fft

@@ -1,0 +1,257 @@
+#include <algorithm>
+#include <utility>
+
+#include "transform/fft/fft.hpp"
+#include "transform/fft/generic_dft.hpp"
+#include "transform/fft/kernels/loops.hpp"
+
+namespace tw {
+namespace fft {
+
+Status GenericDft::Complex(const double* xr, const double* xi, double* yr, double* yi) const {
+    return kind == KindOdd ? OddComplex(stage, radix, xr, xi, yr, yi, work)
+                           : RaderComplex(stage, radix, xr, xi, yr, yi, work);
+}
+
+Status GenericDft::Real(const double* x, double* y) const {
+    return kind == KindOdd ? OddReal(stage, radix, x, y, work) : RaderReal(stage, radix, x, y, work);
+}
+
+Status OddComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
+                  double* yi, double* work) {
+    const int32_t h = (p - 1) / 2;
+    double *ar = work, *ai = ar + p, *br = ai + p, *bi = br + p;
+    double sr = xr[0], si = xi[0];
+    for (int32_t q = 1; q <= h; ++q) {
+        ar[q] = xr[q] + xr[p - q];
+        ai[q] = xi[q] + xi[p - q];
+        br[q] = xr[q] - xr[p - q];
+        bi[q] = xi[q] - xi[p - q];
+        sr += ar[q];
+        si += ai[q];
+    }
+    const double* c = st->oddCos;
+    const double* s = st->oddSin;
+    for (int32_t k = 1; k <= h; ++k) {
+        double tr = xr[0], ti = xi[0], ur = 0, ui = 0;
+        int32_t idx = k;
+        for (int32_t q = 1; q <= h; ++q) {
+            tr += ar[q] * c[idx];
+            ti += ai[q] * c[idx];
+            ur += br[q] * s[idx];
+            ui += bi[q] * s[idx];
+            idx += k;
+            if (idx >= p) idx -= p;
+        }
+        // X[k] = T + i U and X[p-k] = T - i U, with U the sum over the (negative) sines.
+        yr[k] = tr - ui;
+        yi[k] = ti + ur;
+        yr[p - k] = tr + ui;
+        yi[p - k] = ti - ur;
+    }
+    yr[0] = sr;
+    yi[0] = si;
+    return 0;
+}
+
+Status OddReal(const FftStage* st, int32_t p, const double* x, double* y, double* work) {
+    const int32_t h = (p - 1) / 2;
+    double *a = work, *b = a + p;
+    double sum = x[0];
+    for (int32_t q = 1; q <= h; ++q) {
+        a[q] = x[q] + x[p - q];
+        b[q] = x[q] - x[p - q];
+        sum += a[q];
+    }
+    for (int32_t k = 1; k <= h; ++k) {
+        double re = x[0], im = 0;
+        int32_t idx = k;
+        for (int32_t q = 1; q <= h; ++q) {
+            re += a[q] * st->oddCos[idx];
+            im += b[q] * st->oddSin[idx];
+            idx += k;
+            if (idx >= p) idx -= p;
+        }
+        y[k] = re;
+        y[p - k] = im;
+    }
+    y[0] = sum;
+    return 0;
+}
+
+namespace {
+
+struct RealPtr {
+    double* p;
+    RealPtr At(ptrdiff_t o) const { return {p + o}; }
+};
+struct ComplexPtr {
+    double* re;
+    double* im;
+    ComplexPtr At(ptrdiff_t o) const { return {re + o, im + o}; }
+};
+
+// Runs f on a GenericDft of stage i with its scratch; the scratch status merges into f's.
+template <class F>
+Status WithGeneric(const FftTable* t, int32_t i, F f) {
+    const int32_t p = t->factors[i];
+    Scratch<double> scratch;
+    if (const Status s = scratch.Allocate(GenericScratch(p))) return s;
+    GenericDft d{p, t->kinds[i], t->stages[i], scratch.get(), scratch.get() + 4 * static_cast<ptrdiff_t>(p)};
+    const Status s = f(d);
+    return MergeRelease(s, scratch.Release());
+}
+
+Status Leaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
+    if (t->kinds[i] == KindCodelet) {
+        t->leafReal[i](in.p, out.p, si, so, count);
+        return 0;
+    }
+    return WithGeneric(t, i, [&](GenericDft& d) {
+        return RealLeafForm<ScalarLanes>(d, in.p, out.p, si, so, count);
+    });
+}
+
+Status Leaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff_t si, ptrdiff_t so,
+            int32_t count) {
+    if (t->kinds[i] == KindCodelet) {
+        t->leafComplex[i](in.re, in.im, out.re, out.im, si, so, count);
+        return 0;
+    }
+    return WithGeneric(t, i, [&](GenericDft& d) {
+        return ComplexLeafForm<ScalarLanes>(d, in.re, in.im, out.re, out.im, si, so, count);
+    });
+}
+
+Status Combine(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int32_t m) {
+    const FftStage* st = t->stages[i];
+    if (t->kinds[i] == KindCodelet) {
+        t->combineReal[i](data.p, st->twiddleRe, st->twiddleIm, s, m);
+        return 0;
+    }
+    return WithGeneric(t, i, [&](GenericDft& d) {
+        return RealCombineForm<ScalarLanes>(d, data.p, st->twiddleRe, st->twiddleIm, s, m);
+    });
+}
+
+Status Combine(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32_t m) {
+    const FftStage* st = t->stages[i];
+    if (t->kinds[i] == KindCodelet) {
+        t->combineComplex[i](data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
+        return 0;
+    }
+    return WithGeneric(t, i, [&](GenericDft& d) {
+        return ComplexCombineForm<ScalarLanes>(d, data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
+    });
+}
+
+template <class D>
+Status Recurse(const FftTable* t, int32_t level, int32_t length, D in, D out, ptrdiff_t si, ptrdiff_t so) {
+    const int32_t r = t->factors[level], m = length / r;
+    if (level == t->stageCount - 2) {
+        if (const Status s = Leaf(t, level + 1, in, out, si, so, r); s < 0) return s;
+    } else {
+        for (int32_t q = 0; q < r; ++q) {
+            const Status s = Recurse(t, level + 1, m, in.At(q * si),
+                                     out.At(static_cast<ptrdiff_t>(q) * m * so), r * si, so);
+            if (s < 0) return s;
+        }
+    }
+    return Combine(t, level, out, so, m);
+}
+
+template <class D>
+Status Forward(const FftTable* t, D in, D out, ptrdiff_t si, ptrdiff_t so) {
+    if (t->stageCount == 1) return Leaf(t, 0, in, out, si, so, 1);
+    return Recurse(t, 0, t->size, in, out, si, so);
+}
+
+}  // namespace
+}  // namespace fft
+
+Status FftRealForward(const FftTable* t, const double* in, double* out, ptrdiff_t inStride,
+                      ptrdiff_t outStride, int32_t n) {
+    if (t == nullptr || t->size != n) return InternalErr;
+    if (n == 1) {
+        out[0] = in[0];
+        return 0;
+    }
+    return fft::Forward(t, fft::RealPtr{const_cast<double*>(in)}, fft::RealPtr{out}, inStride, outStride);
+}
+
+Status FftComplexForward(const FftTable* t, const double* inRe, const double* inIm, double* outRe,
+                         double* outIm, ptrdiff_t inStride, ptrdiff_t outStride, int32_t n) {
+    // A deliberate difference from the real form, kept for callers that test for below 0.
+    if (t == nullptr || t->size != n) return -1;
+    if (n == 1) {
+        outRe[0] = inRe[0];
+        outIm[0] = inIm[0];
+        return 0;
+    }
+    return fft::Forward(t, fft::ComplexPtr{const_cast<double*>(inRe), const_cast<double*>(inIm)},
+                        fft::ComplexPtr{outRe, outIm}, inStride, outStride);
+}
+
+Status FftComplexInverse(const FftTable* t, const double* inRe, const double* inIm, double* outRe,
+                         double* outIm, ptrdiff_t inStride, ptrdiff_t outStride, int32_t n) {
+    const Status s = FftComplexForward(t, inRe, inIm, outRe, outIm, inStride, outStride, n);
+    if (s != 0) return s;
+    for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
+        std::swap(outRe[k * outStride], outRe[(n - k) * outStride]);
+        std::swap(outIm[k * outStride], outIm[(n - k) * outStride]);
+    }
+    const double scale = 1.0 / n;
+    for (int32_t k = 0; k < n; ++k) {
+        outRe[k * outStride] *= scale;
+        outIm[k * outStride] *= scale;
+    }
+    return 0;
+}
+
+namespace {
+
+// (a, b) at k and n-k become (a - b, a + b): half-complex to Hartley order and back.
+void HartleyPairs(double* x, ptrdiff_t stride, int32_t n) {
+    for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
+        const double a = x[k * stride], b = x[(n - k) * stride];
+        x[k * stride] = a - b;
+        x[(n - k) * stride] = a + b;
+    }
+}
+
+}  // namespace
+
+Status FftRealInverse(const FftTable* t, double* in, double* out, ptrdiff_t inStride, ptrdiff_t outStride,
+                      int32_t n) {
+    if (t == nullptr || t->size != n) return InternalErr;
+    const double scale = 1.0 / n;
+    for (int32_t k = 0; k < n; ++k) in[k * inStride] *= scale;
+    HartleyPairs(in, inStride, n);
+    if (const Status s = FftRealForward(t, in, out, inStride, outStride, n)) return s;
+    HartleyPairs(out, outStride, n);
+    return 0;
+}
+
+void FftUnpackHalfComplex(std::complex<double>* data, int32_t n, int32_t shift) {
+    for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
+        const double re = data[k].real(), im = data[n - k].real();
+        data[k] = {re, im};
+        data[n - k] = {re, -im};
+    }
+    data[0] = {data[0].real(), 0.0};
+    if (n % 2 == 0) data[n / 2] = {data[n / 2].real(), 0.0};
+    // The centred order puts X[0] at n/2 for both parities (the lower half goes behind the upper).
+    if (shift != 0) std::rotate(data, data + (n - n / 2), data + n);
+}
+
+void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out) {
+    const int32_t base = shift != 0 ? n / 2 : 0;
+    out[0] = in[base].real();
+    for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
+        out[k] = in[base + k].real();
+        out[n - k] = in[base + k].imag();
+    }
+    if (n % 2 == 0) out[n / 2] = in[shift != 0 ? 0 : n / 2].real();
+}
+
+}  // namespace tw
