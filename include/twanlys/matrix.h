@@ -61,11 +61,33 @@ typedef struct {
 
 /* 0 Householder, 1 Givens, 2 fast Givens. */
 typedef int32_t QrdMethod;
+/* 0 full (Q m by m, R m by n), 1 economy, 2 R only. */
+typedef int32_t QrOption;
+/* 0 none, 1 permute, 2 scale, 3 both. */
+typedef int32_t BalanceJob;
 
 TW_API int32_t LU_head(Array2DHandle a, Array1DHandle perm, int32_t* parity, int32_t* status);
 TW_API int32_t CxLU_head(Array2DHandle a, Array1DHandle perm, int32_t* parity, int32_t* status);
 TW_API int32_t qrd_head(Array2DHandle a, QrdMethod* method, Array2DHandle q, Array2DHandle r, int32_t* status);
 TW_API int32_t Cxqrd_head(Array2DHandle a, QrdMethod* method, Array2DHandle q, Array2DHandle r, int32_t* status);
+TW_API int32_t QRDecH(Array2DHandle a, int32_t pivot, QrOption option, Array2DHandle p, Array2DHandle q,
+                      Array2DHandle r);
+TW_API int32_t CxQRDecH(Array2DHandle a, int32_t pivot, QrOption option, Array2DHandle p, Array2DHandle q,
+                        Array2DHandle r);
+TW_API int32_t Cholesky_head(Array1DHandle compact, int32_t* status);
+TW_API int32_t CxCholesky_head(Array1DHandle compact, int32_t* status);
+/* The status is stored and also returned. */
+TW_API int32_t FullCholesky_head(Array2DHandle a, int32_t* status);
+TW_API int32_t CxFullCholesky_head(Array2DHandle a, int32_t* status);
+TW_API int32_t GSVD_head(Array2DHandle a, Array2DHandle b, int32_t valuesOnly, int32_t full, Array1DHandle s,
+                         Array2DHandle u, Array2DHandle v, Array2DHandle q, Array2DHandle d1, Array2DHandle d2);
+TW_API int32_t CxGSVD_head(Array2DHandle a, Array2DHandle b, int32_t valuesOnly, int32_t full, Array1DHandle s,
+                           Array2DHandle u, Array2DHandle v, Array2DHandle q, Array2DHandle d1, Array2DHandle d2);
+TW_API int32_t Hessenberg_head(Array2DHandle a, int32_t ilo, int32_t ihi, Array2DHandle q);
+TW_API int32_t CxHessenberg_head(Array2DHandle a, int32_t ilo, int32_t ihi, Array2DHandle q);
+TW_API int32_t MatrixBalance_head(Array2DHandle a, BalanceJob job, int32_t* ilo, int32_t* ihi, Array1DHandle scale);
+TW_API int32_t CxMatrixBalance_head(Array2DHandle a, BalanceJob job, int32_t* ilo, int32_t* ihi,
+                                    Array1DHandle scale);
 TW_API int32_t SVD_head(Array2DHandle a, Array1DHandle s, Array2DHandle v, int32_t* status);
 TW_API int32_t CxSVD_head(Array2DHandle a, Array1DHandle s, Array2DHandle v, int32_t* status);
 TW_API int32_t SVDEx_head(Array2DHandle a, int32_t full, Array2DHandle u, Array1DHandle s, Array2DHandle v);

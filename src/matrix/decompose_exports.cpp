@@ -1,9 +1,11 @@
-// Frames of the decompositions: LU, QR, SVD and the compact conversions.
+// Frames of the decompositions: LU, Cholesky, QR, SVD, generalised SVD, Hessenberg, balancing and
+// the compact conversions.
 #include <algorithm>
 #include <cstring>
 
 #include "matrix/decompose.hpp"
 #include "matrix/matrix_frame.hpp"
+#include "matrix/solve.hpp"
 #include "twanlys/matrix.h"
 
 using namespace tw;
@@ -46,6 +48,125 @@ Status Qrd(Handle a, int32_t method, Handle& q, Handle& r, int32_t* host) {
                 : method == 2 ? QrFastGivens(pa, d.rows, d.cols, pq, pr)
                               : QrHouseholder(pa, d.rows, d.cols, 0, pq, pr);
     }
+    return f.Finish(s);
+}
+
+// Pivoted QR, or Householder QR with an empty P when pivot is 0.
+template <class T>
+Status QrDec(Handle a, int32_t pivot, int32_t option, Handle& p, Handle& q, Handle& r) {
+    Frame f;
+    f.Output2D<int32_t>(p);
+    f.Output2D<T>(q);
+    f.Output2D<T>(r);
+    const Shape d = Dims(a);
+    const int32_t m = d.rows, n = d.cols;
+    int32_t qRows = 0, qCols = 0, rRows = 0, host = 0;
+    const T* pa = nullptr;
+    T *pq = nullptr, *pr = nullptr;
+    int32_t* pp = nullptr;
+    Scratch<int32_t> perm;
+    Status s = (m < 1 || n < 1) ? EmptyArrayErr : static_cast<uint32_t>(option) > 2 ? InvalidSelectorErr : 0;
+    if (s == 0) QrShape(m, n, option, &qRows, &qCols, &rRows);
+    const int32_t pSide = pivot != 0 ? n : 0;
+    if (s == 0) s = Out2D(f, p, pSide, pSide, &pp, &host);
+    if (s == 0) s = Out2D(f, q, qRows, qCols, &pq, &host);
+    if (s == 0) s = Out2D(f, r, rRows, n, &pr, &host);
+    if (s == 0) s = f.In2D(a, &pa);
+    if (s == 0 && pivot == 0) s = QrHouseholder(pa, m, n, option, pq, pr);
+    if (s == 0 && pivot != 0) {
+        s = perm.Allocate(static_cast<size_t>(n));
+        if (s == 0) s = QrPivoted(pa, m, n, option, perm.get(), pq, pr);
+        if (s == 0) {
+            std::fill(pp, pp + static_cast<size_t>(n) * n, 0);
+            for (int32_t i = 0; i < n; ++i) pp[static_cast<size_t>(perm[i]) * n + i] = 1;
+        }
+    }
+    return f.Finish(MergeRelease(s, perm.Release()));
+}
+
+template <class T>
+Status Cholesky(Handle& c) {
+    Frame f;
+    const int32_t length = Count(c);
+    int32_t n = 0;
+    T* pc = nullptr;
+    Status s = length < 1 ? EmptyArrayErr : CompactOrder(length, &n);
+    const Status view = f.InPlace(c, &pc);
+    if (s == 0) s = view;
+    if (s == 0) s = CholeskyFactor(pc, n);
+    return f.Finish(s);
+}
+
+template <class T>
+Status FullCholeskyFrame(Handle& a) {
+    Frame f;
+    const Shape d = Dims(a);
+    T* pa = nullptr;
+    Status s = d.rows != d.cols ? NotSquareErr : d.rows < 1 ? EmptyArrayErr : 0;
+    const Status view = f.InPlace2D(a, &pa);
+    if (s == 0) s = view;
+    if (s == 0) s = FullCholesky(pa, d.rows);
+    return f.Finish(s);
+}
+
+template <class T>
+Status Gsvd(Handle a, Handle b, int32_t valuesOnly, int32_t full, Handle& s, Handle& u, Handle& v, Handle& q,
+            Handle& d1, Handle& d2) {
+    Frame f;
+    f.Output<double>(s);
+    for (Handle* h : {&u, &v, &q, &d1, &d2}) f.Output2D<T>(*h);
+    const Shape da = Dims(a), db = Dims(b);
+    const int32_t m = da.rows, n = da.cols, p = db.rows;
+    const bool vectors = valuesOnly == 0;
+    const int32_t uCols = full != 0 ? m : std::min(m, n), vCols = full != 0 ? p : std::min(p, n);
+    int32_t host = 0;
+    const T *pa = nullptr, *pb = nullptr;
+    double* ps = nullptr;
+    T *pu = nullptr, *pv = nullptr, *pq = nullptr, *pd1 = nullptr, *pd2 = nullptr;
+    Status st = da.cols != db.cols ? BandStructureErr : (m < 1 || n < 1 || p < 1) ? EmptyArrayErr : 0;
+    if (st == 0) st = Out1D(f, s, n, &ps, &host);
+    if (st == 0) st = Out2D(f, u, vectors ? m : 0, vectors ? uCols : 0, &pu, &host);
+    if (st == 0) st = Out2D(f, v, vectors ? p : 0, vectors ? vCols : 0, &pv, &host);
+    if (st == 0) st = Out2D(f, q, vectors ? n : 0, vectors ? n : 0, &pq, &host);
+    if (st == 0) st = Out2D(f, d1, vectors ? uCols : 0, vectors ? n : 0, &pd1, &host);
+    if (st == 0) st = Out2D(f, d2, vectors ? vCols : 0, vectors ? n : 0, &pd2, &host);
+    if (st == 0) st = f.In2D(a, &pa);
+    if (st == 0) st = f.In2D(b, &pb);
+    if (st == 0) st = GeneralisedSvd(pa, m, n, pb, p, vectors ? 1 : 0, full, ps, pu, pv, pq, pd1, pd2);
+    return f.Finish(st);
+}
+
+template <class T>
+Status Hessenberg(Handle& a, int32_t ilo, int32_t ihi, Handle& q) {
+    Frame f;
+    f.Output2D<T>(q);
+    const Shape d = Dims(a);
+    const int32_t n = d.rows;
+    int32_t host = 0;
+    T *pa = nullptr, *pq = nullptr;
+    Status s = d.rows != d.cols ? NotSquareErr : n < 1 ? EmptyArrayErr
+               : (ilo < 0 || ihi >= n || ihi < ilo) ? IndexRangeErr : 0;
+    const Status view = f.InPlace2D(a, &pa);
+    if (s == 0) s = view;
+    if (s == 0) s = Out2D(f, q, n, n, &pq, &host);
+    if (s == 0) s = HessenbergReduce(pa, n, ilo, ihi, pq);
+    return f.Finish(s);
+}
+
+template <class T>
+Status Balance(Handle& a, int32_t job, int32_t* ilo, int32_t* ihi, Handle& scale) {
+    Frame f;
+    f.Output<double>(scale);
+    const Shape d = Dims(a);
+    const int32_t n = d.rows;
+    int32_t host = 0;
+    T* pa = nullptr;
+    double* ps = nullptr;
+    Status s = (d.rows < 1 || d.cols < 1) ? EmptyArrayErr : d.rows != d.cols ? NotSquareErr : 0;
+    const Status view = f.InPlace2D(a, &pa);
+    if (s == 0) s = view;
+    if (s == 0) s = Out1D(f, scale, n, &ps, &host);
+    if (s == 0) s = MatrixBalance(pa, n, job, ilo, ihi, ps);
     return f.Finish(s);
 }
 
@@ -142,6 +263,62 @@ TW_API int32_t qrd_head(Array2DHandle a, QrdMethod* method, Array2DHandle q, Arr
 // The method is not read: complex QR is always Householder.
 TW_API int32_t Cxqrd_head(Array2DHandle a, QrdMethod*, Array2DHandle q, Array2DHandle r, int32_t* status) {
     return PointerStyle(status, [&](int32_t* host) { return Qrd<cdouble>(a, 0, q, r, host); });
+}
+
+TW_API int32_t QRDecH(Array2DHandle a, int32_t pivot, QrOption option, Array2DHandle p, Array2DHandle q,
+                      Array2DHandle r) {
+    return QrDec<double>(a, pivot, option, p, q, r);
+}
+
+TW_API int32_t CxQRDecH(Array2DHandle a, int32_t pivot, QrOption option, Array2DHandle p, Array2DHandle q,
+                        Array2DHandle r) {
+    return QrDec<cdouble>(a, pivot, option, p, q, r);
+}
+
+TW_API int32_t Cholesky_head(Array1DHandle compact, int32_t* status) {
+    return ToPointer(status, Cholesky<double>(compact));
+}
+
+TW_API int32_t CxCholesky_head(Array1DHandle compact, int32_t* status) {
+    return ToPointer(status, Cholesky<cdouble>(compact));
+}
+
+TW_API int32_t FullCholesky_head(Array2DHandle a, int32_t* status) {
+    const Status s = FullCholeskyFrame<double>(a);
+    ToPointer(status, s);
+    return s;
+}
+
+TW_API int32_t CxFullCholesky_head(Array2DHandle a, int32_t* status) {
+    const Status s = FullCholeskyFrame<cdouble>(a);
+    ToPointer(status, s);
+    return s;
+}
+
+TW_API int32_t GSVD_head(Array2DHandle a, Array2DHandle b, int32_t valuesOnly, int32_t full, Array1DHandle s,
+                         Array2DHandle u, Array2DHandle v, Array2DHandle q, Array2DHandle d1, Array2DHandle d2) {
+    return Gsvd<double>(a, b, valuesOnly, full, s, u, v, q, d1, d2);
+}
+
+TW_API int32_t CxGSVD_head(Array2DHandle a, Array2DHandle b, int32_t valuesOnly, int32_t full, Array1DHandle s,
+                           Array2DHandle u, Array2DHandle v, Array2DHandle q, Array2DHandle d1, Array2DHandle d2) {
+    return Gsvd<cdouble>(a, b, valuesOnly, full, s, u, v, q, d1, d2);
+}
+
+TW_API int32_t Hessenberg_head(Array2DHandle a, int32_t ilo, int32_t ihi, Array2DHandle q) {
+    return Hessenberg<double>(a, ilo, ihi, q);
+}
+
+TW_API int32_t CxHessenberg_head(Array2DHandle a, int32_t ilo, int32_t ihi, Array2DHandle q) {
+    return Hessenberg<cdouble>(a, ilo, ihi, q);
+}
+
+TW_API int32_t MatrixBalance_head(Array2DHandle a, BalanceJob job, int32_t* ilo, int32_t* ihi, Array1DHandle scale) {
+    return Balance<double>(a, job, ilo, ihi, scale);
+}
+
+TW_API int32_t CxMatrixBalance_head(Array2DHandle a, BalanceJob job, int32_t* ilo, int32_t* ihi, Array1DHandle scale) {
+    return Balance<cdouble>(a, job, ilo, ihi, scale);
 }
 
 TW_API int32_t SVD_head(Array2DHandle a, Array1DHandle s, Array2DHandle v, int32_t* status) {

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <complex>
 #include <cstring>
+#include <type_traits>
 
 #include "frame/frame.hpp"
 #include "twanlys/matrix.h"
@@ -12,6 +13,8 @@
 namespace tw {
 
 namespace {
+
+template <class T> inline constexpr bool kIsComplexLapack = !std::is_same_v<T, double>;
 
 enum class When { Negative, Positive, NonZero, OneToN, NPlus1, NPlus2, One };
 
@@ -92,6 +95,56 @@ Status WithWorkspace(Call call) {
     return work.Release();
 }
 
+void Qp3(int m, int n, double* a, int lda, int* jpvt, double* tau, double* work, int lwork, double*, int* info) {
+    dgeqp3_(&m, &n, a, &lda, jpvt, tau, work, &lwork, info);
+}
+void Qp3(int m, int n, cdouble* a, int lda, int* jpvt, cdouble* tau, cdouble* work, int lwork, double* rwork,
+         int* info) {
+    zgeqp3_(&m, &n, a, &lda, jpvt, tau, work, &lwork, rwork, info);
+}
+void Gqr(int m, int n, int k, double* a, int lda, const double* tau, double* work, int lwork, int* info) {
+    dorgqr_(&m, &n, &k, a, &lda, tau, work, &lwork, info);
+}
+void Gqr(int m, int n, int k, cdouble* a, int lda, const cdouble* tau, cdouble* work, int lwork, int* info) {
+    zungqr_(&m, &n, &k, a, &lda, tau, work, &lwork, info);
+}
+void Hrd(int n, int lo, int hi, double* a, int lda, double* tau, double* work, int lwork, int* info) {
+    dgehrd_(&n, &lo, &hi, a, &lda, tau, work, &lwork, info);
+}
+void Hrd(int n, int lo, int hi, cdouble* a, int lda, cdouble* tau, cdouble* work, int lwork, int* info) {
+    zgehrd_(&n, &lo, &hi, a, &lda, tau, work, &lwork, info);
+}
+void Ghr(int n, int lo, int hi, double* a, int lda, const double* tau, double* work, int lwork, int* info) {
+    dorghr_(&n, &lo, &hi, a, &lda, tau, work, &lwork, info);
+}
+void Ghr(int n, int lo, int hi, cdouble* a, int lda, const cdouble* tau, cdouble* work, int lwork, int* info) {
+    zunghr_(&n, &lo, &hi, a, &lda, tau, work, &lwork, info);
+}
+void Bal(const char* job, int n, double* a, int lda, int* ilo, int* ihi, double* scale, int* info) {
+    dgebal_(job, &n, a, &lda, ilo, ihi, scale, info, 1);
+}
+void Bal(const char* job, int n, cdouble* a, int lda, int* ilo, int* ihi, double* scale, int* info) {
+    zgebal_(job, &n, a, &lda, ilo, ihi, scale, info, 1);
+}
+void Gsv(const char* jobs, int m, int n, int p, int* k, int* l, double* a, int lda, double* b, int ldb, double* alpha,
+         double* beta, double* u, int ldu, double* v, int ldv, double* q, int ldq, double* work, double*, int* iwork,
+         int* info) {
+    dggsvd_(jobs, jobs + 1, jobs + 2, &m, &n, &p, k, l, a, &lda, b, &ldb, alpha, beta, u, &ldu, v, &ldv, q, &ldq,
+            work, iwork, info, 1, 1, 1);
+}
+void Gsv(const char* jobs, int m, int n, int p, int* k, int* l, cdouble* a, int lda, cdouble* b, int ldb,
+         double* alpha, double* beta, cdouble* u, int ldu, cdouble* v, int ldv, cdouble* q, int ldq, cdouble* work,
+         double* rwork, int* iwork, int* info) {
+    zggsvd_(jobs, jobs + 1, jobs + 2, &m, &n, &p, k, l, a, &lda, b, &ldb, alpha, beta, u, &ldu, v, &ldv, q, &ldq,
+            work, rwork, iwork, info, 1, 1, 1);
+}
+void Gbs(int n, int kl, int ku, int nrhs, double* ab, int ldab, int* ipiv, double* b, int ldb, int* info) {
+    dgbsv_(&n, &kl, &ku, &nrhs, ab, &ldab, ipiv, b, &ldb, info);
+}
+void Gbs(int n, int kl, int ku, int nrhs, cdouble* ab, int ldab, int* ipiv, cdouble* b, int ldb, int* info) {
+    zgbsv_(&n, &kl, &ku, &nrhs, ab, &ldab, ipiv, b, &ldb, info);
+}
+
 }  // namespace
 
 template <class T> Status Gelqf(int m, int n, T* a, int lda, T* tau) {
@@ -101,6 +154,81 @@ template <class T> Status Gelqf(int m, int n, T* a, int lda, T* tau) {
 template <class T> Status Orglq(int m, int n, int k, T* a, int lda, const T* tau) {
     return WithWorkspace<T>([&](T* w, int lw, int* info) { Glq(m, n, k, a, lda, tau, w, lw, info); });
 }
+
+template <class T> Status Geqp3(int m, int n, T* a, int lda, int* jpvt, T* tau) {
+    Scratch<double> rwork;
+    if (kIsComplexLapack<T> && rwork.Allocate(2 * static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    const Status s = WithWorkspace<T>([&](T* w, int lw, int* info) { Qp3(m, n, a, lda, jpvt, tau, w, lw, rwork.get(), info); });
+    return MergeRelease(s, rwork.Release());
+}
+
+template <class T> Status Orgqr(int m, int n, int k, T* a, int lda, const T* tau) {
+    return WithWorkspace<T>([&](T* w, int lw, int* info) { Gqr(m, n, k, a, lda, tau, w, lw, info); });
+}
+
+template <class T> Status Gehrd(int n, int ilo, int ihi, T* a, int lda, T* tau) {
+    return WithWorkspace<T>([&](T* w, int lw, int* info) { Hrd(n, ilo, ihi, a, lda, tau, w, lw, info); });
+}
+
+template <class T> Status Orghr(int n, int ilo, int ihi, T* a, int lda, const T* tau) {
+    return WithWorkspace<T>([&](T* w, int lw, int* info) { Ghr(n, ilo, ihi, a, lda, tau, w, lw, info); });
+}
+
+template <class T> Status Gebal(char job, int n, T* a, int lda, int* ilo, int* ihi, double* scale) {
+    int info = 0;
+    Bal(&job, n, a, lda, ilo, ihi, scale, &info);
+    return LapackStatus(Lapack::Gebal, info, n);
+}
+
+template <class T>
+Status Ggsvd(bool vectors, int m, int n, int p, int* k, int* l, T* a, int lda, T* b, int ldb, double* alpha,
+             double* beta, T* u, int ldu, T* v, int ldv, T* q, int ldq) {
+    const char jobs[3] = {vectors ? 'U' : 'N', vectors ? 'V' : 'N', vectors ? 'Q' : 'N'};
+    Scratch<T> work;
+    Scratch<double> rwork;
+    Scratch<int> iwork;
+    if (work.Allocate(static_cast<size_t>(std::max({3 * n, m, p}) + n)) != 0 ||
+        iwork.Allocate(static_cast<size_t>(n)) != 0 ||
+        (kIsComplexLapack<T> && rwork.Allocate(2 * static_cast<size_t>(n)) != 0))
+        return OutOfMemoryErr;
+    int info = 0;
+    Gsv(jobs, m, n, p, k, l, a, lda, b, ldb, alpha, beta, u, ldu, v, ldv, q, ldq, work.get(), rwork.get(),
+        iwork.get(), &info);
+    const Status s = MergeRelease(LapackStatus(Lapack::Ggsvd, info, n), work.Release());
+    return MergeRelease(MergeRelease(s, rwork.Release()), iwork.Release());
+}
+
+template <class T> Status Gbsv(int n, int kl, int ku, int nrhs, T* ab, int ldab, int* ipiv, T* b, int ldb) {
+    int info = 0;
+    Gbs(n, kl, ku, nrhs, ab, ldab, ipiv, b, ldb, &info);
+    return LapackStatus(Lapack::Gbsv, info, n);
+}
+
+Status Gttrf(int n, double* dl, double* d, double* du, double* du2, int* ipiv) {
+    int info = 0;
+    dgttrf_(&n, dl, d, du, du2, ipiv, &info);
+    return LapackStatus(Lapack::Gttrf, info, n);
+}
+
+Status Gttrs(char trans, int n, int nrhs, const double* dl, const double* d, const double* du, const double* du2,
+             const int* ipiv, double* b, int ldb) {
+    int info = 0;
+    dgttrs_(&trans, &n, &nrhs, dl, d, du, du2, ipiv, b, &ldb, &info, 1);
+    return 0;
+}
+
+#define TW_LAPACK(T)                                                                          \
+    template Status Geqp3<T>(int, int, T*, int, int*, T*);                                    \
+    template Status Orgqr<T>(int, int, int, T*, int, const T*);                               \
+    template Status Gehrd<T>(int, int, int, T*, int, T*);                                     \
+    template Status Orghr<T>(int, int, int, T*, int, const T*);                               \
+    template Status Gebal<T>(char, int, T*, int, int*, int*, double*);                        \
+    template Status Gbsv<T>(int, int, int, int, T*, int, int*, T*, int);                      \
+    template Status Ggsvd<T>(bool, int, int, int, int*, int*, T*, int, T*, int, double*, double*, T*, int, T*, int, \
+                             T*, int);
+TW_LAPACK(double)
+TW_LAPACK(cdouble)
+#undef TW_LAPACK
 
 template Status Gelqf<double>(int, int, double*, int, double*);
 template Status Gelqf<cdouble>(int, int, cdouble*, int, cdouble*);

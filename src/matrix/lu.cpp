@@ -10,19 +10,6 @@ namespace tw {
 
 namespace {
 
-inline double Divide(double a, double b) { return a / b; }
-
-// Smith's division: the ratio taken is the one of magnitude at most 1.
-inline cdouble Divide(cdouble a, cdouble b) {
-    const double c = b.real(), d = b.imag();
-    if (std::fabs(d) >= std::fabs(c)) {
-        const double r = c / d, den = c * r + d;
-        return {(a.real() * r + a.imag()) / den, (a.imag() * r - a.real()) / den};
-    }
-    const double r = d / c, den = c + d * r;
-    return {(a.real() + a.imag() * r) / den, (a.imag() - a.real() * r) / den};
-}
-
 // Pivots of the real core are ranked by |x|, of the complex one by |z|^2.
 inline double PivotSize(double x) { return std::fabs(x); }
 inline double PivotSize(cdouble z) { return Abs2(z); }

@@ -27,6 +27,18 @@ inline double Abs2(cdouble z) { return z.real() * z.real() + z.imag() * z.imag()
 inline double Magnitude(double x) { return std::fabs(x); }
 inline double Magnitude(cdouble z) { return std::sqrt(Abs2(z)); }
 
+inline double Divide(double a, double b) { return a / b; }
+// Smith's division: the ratio taken is the one of magnitude at most 1.
+inline cdouble Divide(cdouble a, cdouble b) {
+    const double c = b.real(), d = b.imag();
+    if (std::fabs(d) >= std::fabs(c)) {
+        const double r = c / d, den = c * r + d;
+        return {(a.real() * r + a.imag()) / den, (a.imag() * r - a.real()) / den};
+    }
+    const double r = d / c, den = c + d * r;
+    return {(a.real() + a.imag() * r) / den, (a.imag() - a.real() * r) / den};
+}
+
 // 1 if an element fails the NaN/Infinity screen.
 int32_t HasNonFinite(const double* x, int32_t n);
 int32_t CxHasNonFinite(const cdouble* x, int32_t n);

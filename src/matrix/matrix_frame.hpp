@@ -1,6 +1,9 @@
 // Pieces shared by the frames of the matrix family.
 #pragma once
 
+#include <cstdint>
+#include <cstring>
+
 #include "frame/frame.hpp"
 
 namespace tw {
@@ -36,6 +39,27 @@ Status Out1D(Frame& f, Handle& h, int32_t n, T** p, int32_t* host) {
         return OutOfMemoryErr;
     }
     return 0;
+}
+
+// Resizes a 1-D output and hands out its element bytes where the host put them, without the
+// frame's aligned copy: for frames that must not allocate, which align their data themselves.
+template <class T>
+Status RawOut1D(Frame& f, Handle& h, int32_t n, unsigned char** bytes, int32_t* host) {
+    f.Output<T>(h);
+    if (const Status s = HostResize(kTypeCode<T>, 1, &h, n)) {
+        *host = s;
+        return OutOfMemoryErr;
+    }
+    std::memcpy(*h, &n, sizeof n);
+    *bytes = static_cast<unsigned char*>(*h) + 4;
+    return 0;
+}
+
+// The first T-aligned address at or after p, for a block that is at least 4-byte aligned.
+template <class T>
+T* AlignedIn(unsigned char* p) {
+    const uintptr_t a = reinterpret_cast<uintptr_t>(p), mask = alignof(T) - 1;
+    return reinterpret_cast<T*>((a + mask) & ~mask);
 }
 
 }  // namespace tw

@@ -1,5 +1,5 @@
-// QR decompositions: Householder through LAPACK's LQ of the transposed view, and the library's own
-// plain and fast Givens forms.
+// QR decompositions: Householder through LAPACK's LQ of the transposed view, pivoted QR through a
+// transposing copy, and the library's own plain and fast Givens forms.
 #include <algorithm>
 #include <cstring>
 
@@ -45,6 +45,38 @@ Status QrHouseholder(const T* a, int32_t m, int32_t n, int32_t option, T* q, T* 
         for (int32_t i = 0; s == 0 && i < m; ++i)
             std::memcpy(q + static_cast<size_t>(i) * qCols, b + static_cast<size_t>(i) * lda,
                         static_cast<size_t>(qCols) * sizeof(T));
+    }
+    return MergeRelease(MergeRelease(s, buffer.Release()), tau.Release());
+}
+
+template <class T>
+Status QrPivoted(const T* a, int32_t m, int32_t n, int32_t option, int32_t* perm, T* q, T* r) {
+    if (Screen(a, m * n)) return NanInfErr;
+    int32_t qRows, qCols, rRows;
+    QrShape(m, n, option, &qRows, &qCols, &rRows);
+    const int32_t k = std::min(m, n);
+    const bool wantQ = q != nullptr && qCols > 0;
+    // Column-major with leading dimension m; room for the columns of a full Q when it is wider.
+    const int32_t cols = std::max(n, wantQ ? qCols : 0);
+    Scratch<T> buffer, tau;
+    if (buffer.Allocate(static_cast<size_t>(m) * cols) != 0 || tau.Allocate(static_cast<size_t>(k)) != 0)
+        return OutOfMemoryErr;
+    T* b = buffer.get();
+    Status s = TransposeMatrix<T>(const_cast<T*>(a), m, n, b);
+    // All columns free: every entry 0 before the call.
+    std::fill(perm, perm + n, 0);
+    if (s == 0) s = Geqp3<T>(m, n, b, m, perm, tau.get());
+    if (s == 0) {
+        for (int32_t j = 0; j < n; ++j) --perm[j];
+        if (r != nullptr) {
+            std::fill(r, r + static_cast<size_t>(rRows) * n, T(0));
+            for (int32_t i = 0; i < k; ++i)
+                for (int32_t j = i; j < n; ++j) r[static_cast<size_t>(i) * n + j] = b[static_cast<size_t>(j) * m + i];
+        }
+    }
+    if (s == 0 && wantQ) {
+        s = Orgqr<T>(m, qCols, k, b, m, tau.get());
+        if (s == 0) s = TransposeMatrix<T>(b, qCols, m, q);
     }
     return MergeRelease(MergeRelease(s, buffer.Release()), tau.Release());
 }
@@ -174,5 +206,7 @@ Status QrFastGivens(const double* a, int32_t m, int32_t n, double* q, double* r)
 
 template Status QrHouseholder<double>(const double*, int32_t, int32_t, int32_t, double*, double*);
 template Status QrHouseholder<cdouble>(const cdouble*, int32_t, int32_t, int32_t, cdouble*, cdouble*);
+template Status QrPivoted<double>(const double*, int32_t, int32_t, int32_t, int32_t*, double*, double*);
+template Status QrPivoted<cdouble>(const cdouble*, int32_t, int32_t, int32_t, int32_t*, cdouble*, cdouble*);
 
 }  // namespace tw

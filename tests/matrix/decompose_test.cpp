@@ -1,6 +1,8 @@
 // Stated quirks of the decomposition exports.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cmath>
 #include <complex>
 #include <vector>
 
@@ -102,6 +104,105 @@ TEST(Compact, ChecksAndUncheckedForms) {
     EXPECT_EQ(back.vec(), (std::vector<double>{1, 2, 3, 2, 4, 5, 3, 5, 6}));
     twrt::Array2D<double> none(0, 0);
     EXPECT_EQ(MatrixToCompact_H(none.h(), packed.h()), 0);
+}
+
+TEST(QrDec, OptionsPivotAndChecks) {
+    const std::vector<double> v{1, 5, 2, 4, 0, 3};
+    struct Case {
+        int32_t pivot, option, status, pSide, qRows, qCols, rRows;
+    };
+    // 2 by 3: economy keeps Q square; option 2 gives R alone.
+    for (const Case& c : {Case{1, 0, 0, 3, 2, 2, 2}, Case{1, 1, 0, 3, 2, 2, 2}, Case{1, 2, 0, 3, 0, 0, 2},
+                          Case{0, 2, 0, 0, 0, 0, 2}, Case{1, 3, InvalidSelectorErr, 0, 0, 0, 0},
+                          Case{0, -1, InvalidSelectorErr, 0, 0, 0, 0}}) {
+        twrt::Array2D<double> a(2, 3, v);
+        twrt::Array2D<int32_t> p(1, 1);
+        twrt::Array2D<double> q(1, 1), r;
+        EXPECT_EQ(QRDecH(a.h(), c.pivot, c.option, p.h(), q.h(), r.h()), c.status) << c.pivot << " " << c.option;
+        EXPECT_EQ(p.rows(), c.pSide);
+        EXPECT_EQ(q.rows(), c.qRows);
+        EXPECT_EQ(q.cols(), c.qCols);
+        EXPECT_EQ(r.rows(), c.rRows);
+        EXPECT_EQ(r.cols(), c.status == 0 ? 3 : 0);
+        if (c.pSide == 3) {
+            // The column of largest norm comes first: column 1 (5, 0).
+            EXPECT_EQ(p.at(1, 0), 1);
+            EXPECT_NEAR(std::fabs(r.at(0, 0)), 5, 1e-15);
+        }
+    }
+    twrt::Array2D<cd> empty(0, 2), p, q, r;
+    EXPECT_EQ(CxQRDecH(empty.h(), 1, 0, p.h(), q.h(), r.h()), EmptyArrayErr);
+    twrt::Array2D<cd> bad(1, 2, {cd(1, std::nan("")), 1});
+    EXPECT_EQ(CxQRDecH(bad.h(), 1, 0, p.h(), q.h(), r.h()), NanInfErr);
+}
+
+TEST(Gsvd, ValuesOnlyAndChecks) {
+    twrt::Array2D<double> a(3, 2, {1, 2, 3, 4, 5, 6}), b(2, 2, {1, 0, 0, 2}), wide(2, 3), none(0, 2);
+    std::vector<twrt::Array2D<double>> outs(5);
+    for (auto& o : outs) o = twrt::Array2D<double>(2, 2);
+    twrt::Array1D<double> s;
+    const auto call = [&](twrt::Array2D<double>& x, twrt::Array2D<double>& y, int32_t valuesOnly) {
+        return GSVD_head(x.h(), y.h(), valuesOnly, 0, s.h(), outs[0].h(), outs[1].h(), outs[2].h(), outs[3].h(),
+                         outs[4].h());
+    };
+    EXPECT_EQ(call(a, b, 1), 0);
+    ASSERT_EQ(s.size(), 2);
+    for (auto& o : outs) {
+        EXPECT_EQ(o.rows(), 0);
+        EXPECT_EQ(o.cols(), 0);
+    }
+    // The ratios are the square roots of the eigenvalues of (A^T A, B^T B), here diag(1, 4):
+    // A^T A = [[35, 44], [44, 56]], so the pencil's values solve det(A^T A - l B^T B) = 0.
+    std::vector<double> got = s.vec();
+    std::sort(got.begin(), got.end());
+    const double p = 35 * 4 + 56, q = 35 * 56 - 44 * 44;  // 4 l^2 - p l + q = 0
+    const double lo = (p - std::sqrt(p * p - 16 * q)) / 8, hi = (p + std::sqrt(p * p - 16 * q)) / 8;
+    EXPECT_NEAR(got[0], std::sqrt(lo), 1e-13);
+    EXPECT_NEAR(got[1], std::sqrt(hi), 1e-13);
+    EXPECT_EQ(call(a, wide, 0), BandStructureErr);
+    EXPECT_EQ(s.size(), 0);
+    EXPECT_EQ(call(none, b, 0), EmptyArrayErr);
+}
+
+TEST(Hessenberg, IndexChecks) {
+    struct Case {
+        int rows, cols, ilo, ihi;
+        int32_t status;
+    };
+    for (const Case& c : {Case{3, 3, 1, 0, IndexRangeErr}, Case{3, 3, -1, 2, IndexRangeErr}, Case{3, 3, 0, 3, IndexRangeErr},
+                          Case{0, 3, 0, 0, NotSquareErr}, Case{2, 3, 0, 1, NotSquareErr}, Case{0, 0, 0, 0, EmptyArrayErr},
+                          Case{3, 3, 1, 1, 0}, Case{1, 1, 0, 0, 0}, Case{3, 3, 0, 2, 0}}) {
+        twrt::Array2D<double> a(c.rows, c.cols, std::vector<double>(size_t(c.rows) * c.cols, 1.0)), q;
+        EXPECT_EQ(Hessenberg_head(a.h(), c.ilo, c.ihi, q.h()), c.status) << c.rows << " " << c.ilo << " " << c.ihi;
+        EXPECT_EQ(q.rows(), c.status == 0 ? c.rows : 0);
+        EXPECT_EQ(a.rows(), c.status == 0 ? c.rows : 0);
+    }
+}
+
+TEST(Balance, ChecksAndOneBasedPermutations) {
+    struct Case {
+        int rows, cols, job;
+        int32_t status;
+    };
+    for (const Case& c : {Case{0, 0, 0, EmptyArrayErr}, Case{2, 3, 0, NotSquareErr}, Case{0, 3, 9, EmptyArrayErr},
+                          Case{3, 3, 4, InvalidSelectorErr}, Case{3, 3, -1, InvalidSelectorErr}}) {
+        twrt::Array2D<double> a(c.rows, c.cols, std::vector<double>(size_t(c.rows) * c.cols, 1.0));
+        twrt::Array1D<double> scale(3);
+        int32_t ilo = 7, ihi = 7;
+        EXPECT_EQ(MatrixBalance_head(a.h(), c.job, &ilo, &ihi, scale.h()), c.status);
+        EXPECT_EQ(scale.size(), 0);
+        EXPECT_EQ(a.rows(), 0);
+    }
+    // Row 0 holds only its diagonal: permuting moves it to the end, and scale records the
+    // 1-based row it was exchanged with; ilo and ihi come back 0-based.
+    twrt::Array2D<double> a(3, 3, {7, 0, 0, 2, 1, 3, 5, 4, 6});
+    twrt::Array1D<double> scale;
+    int32_t ilo = 7, ihi = 7;
+    EXPECT_EQ(MatrixBalance_head(a.h(), 1, &ilo, &ihi, scale.h()), 0);
+    EXPECT_EQ(ilo, 0);
+    EXPECT_EQ(ihi, 1);
+    EXPECT_EQ(scale[2], 1.0);
+    EXPECT_EQ(a.at(2, 2), 7.0);
 }
 
 }  // namespace

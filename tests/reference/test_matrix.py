@@ -5,27 +5,7 @@ import unittest
 import numpy as np
 
 import twanlys as tw
-
-C128 = np.complex128
-
-
-def rel(got, want):
-    want = np.asarray(want)
-    scale = max(np.max(np.abs(want)), 1e-300) if want.size else 1.0
-    return np.max(np.abs(np.asarray(got) - want)) / scale if want.size else 0.0
-
-
-def rnd(rng, shape, cx):
-    a = rng.standard_normal(shape)
-    return a + 1j * rng.standard_normal(shape) if cx else a
-
-
-def ill(n, cx):
-    """Hilbert matrix, condition about 1e10 at n = 8 (complex: a unit phase per row)."""
-    i = np.arange(n)
-    h = 1.0 / (i[:, None] + i[None, :] + 1)
-    return h * np.exp(1j * i)[:, None] if cx else h
-
+from matrix_common import C128, ill, rel, rnd
 
 SHAPES = [(1, 1), (5, 5), (9, 4), (4, 9), (1, 7), (7, 1), (33, 20)]
 
