@@ -220,6 +220,19 @@ Status Histogram(const double* x, int32_t n, double low, double high, int32_t bi
     return 0;
 }
 
+Status DataHistogram(const double* x, int32_t n, int32_t bins, int32_t* counts, double* centres) {
+    if (n < 1 || bins < 1) return EmptyArrayErr;
+    // Both extremes start from x[0]; a NaN after it cannot displace them.
+    double lo = x[0], hi = x[0];
+    for (int32_t i = 1; i < n; ++i) {
+        if (lo > x[i])
+            lo = x[i];
+        else if (hi < x[i])
+            hi = x[i];
+    }
+    return Histogram(x, n, lo, hi, bins, counts, centres);
+}
+
 int64_t ModeCapacity(int32_t n, int32_t intervals) { return intervals >= 1 ? intervals : n; }
 
 Status Mode(const double* x, int32_t n, int32_t intervals, double* modes, int32_t* count) {

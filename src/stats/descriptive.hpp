@@ -19,6 +19,9 @@ Status CentralMoment(const double* x, int32_t n, int32_t order, double* moment);
 Status Histogram(const double* x, int32_t n, double low, double high, int32_t bins, int32_t* counts,
                  double* centres);
 
+// The same over [min x, max x].
+Status DataHistogram(const double* x, int32_t n, int32_t bins, int32_t* counts, double* centres);
+
 // Modes of x: binned over `intervals` bins when intervals >= 1, exact values otherwise. modes
 // must hold ModeCapacity(n, intervals) values; *count is 0 when there is no mode.
 int64_t ModeCapacity(int32_t n, int32_t intervals);

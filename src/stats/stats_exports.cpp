@@ -84,17 +84,7 @@ TW_API int32_t histgran_head(Array1DHandle x, int32_t* bins, Array1DHandle count
     Status s = (n < 1 || m < 1) ? EmptyArrayErr : f.In(x, &xs);
     if (s == 0 && (f.Resize(counts, m, &c) != 0 || f.Resize(centres, m, &centre) != 0))
         s = OutOfMemoryErr;
-    if (s == 0) {
-        // A NaN after the first element cannot displace the extremes.
-        double lo = xs[0], hi = xs[0];
-        for (int32_t i = 1; i < n; ++i) {
-            if (lo > xs[i])
-                lo = xs[i];
-            else if (hi < xs[i])
-                hi = xs[i];
-        }
-        s = Histogram(xs, n, lo, hi, m, c, centre);
-    }
+    if (s == 0) s = DataHistogram(xs, n, m, c, centre);
     return ToPointer(status, f.Finish(s));
 }
 
