@@ -39,10 +39,8 @@ struct ScalarLanes {
         re = p[0];
         im = p[1];
     }
-    static void StorePair(double* p, ptrdiff_t, V re, V im) {
-        p[0] = re;
-        p[1] = im;
-    }
+    // One 16-byte store, so that the pair loads of the next stage take it from the store buffer.
+    static void StorePair(double* p, ptrdiff_t, V re, V im) { _mm_storeu_pd(p, _mm_set_pd(im, re)); }
 };
 
 // Vector values are the compiler's vector types, whose arithmetic is element by element, so that
