@@ -1,24 +1,3 @@
 // AVX2 kernels of the radices in group A; used only where the processor has AVX2 (codelets.cpp).
-// What the kernels share with the rest of the library is included before the target switch, and
-// the kernel headers go into their own namespace.
-#include <immintrin.h>
-
-#include <cstddef>
-#include <cstdint>
-#include <utility>
-
-#include "frame/memory.hpp"
-#include "transform/fft/kernels/codelets.hpp"
-
-#pragma GCC push_options
-#pragma GCC target("avx2")
-#define TW_FFT_ISA avx2
-#include "transform/fft/kernels/codelet_forms.hpp"
-#include "transform/fft/kernels/lanes_avx2.hpp"
-
-namespace tw::fft::avx2 {
-
-void PutCodeletsA(CodeletTables& t) { CodeletForms<Avx2Lanes>::Put(t, CodeletGroupA{}); }
-
-}  // namespace tw::fft::avx2
-#pragma GCC pop_options
+#define TW_FFT_GROUP A
+#include "transform/fft/kernels/codelets_avx2.inc"
