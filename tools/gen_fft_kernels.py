@@ -233,6 +233,10 @@ def literal(c):
 
 
 class Emitter:
+    """Writes one block as straight-line code around two accessors: `in` delivers input j (loaded
+    at its first use), `out` takes output k. Outputs are handed over once every input has been
+    loaded, so that a block may write over its own input in place."""
+
     def __init__(self, g):
         self.g = g
 
@@ -240,11 +244,13 @@ class Emitter:
         op, a, _ = self.g.nodes[idx]
         return a if op == 'in' else names[idx]
 
-    def emit(self, outputs, indent):
-        """outputs: list of (target, value). Returns (lines, adds, muls)."""
+    def emit(self, outputs, inputs, indent):
+        """outputs: list of (call, values) where call is the accessor call with one %s per value;
+        inputs: {input name: (group, load line)}, where one load line defines a whole group.
+        Returns (lines, adds, muls)."""
         g = self.g
         live = set()
-        stack = [v[0] for _, v in outputs if v is not Z]
+        stack = [v[0] for _, vs in outputs for v in vs if v is not Z]
         while stack:
             i = stack.pop()
             if i in live:
@@ -255,11 +261,37 @@ class Emitter:
                 stack += [a, b]
             elif op == 'mul':
                 stack.append(b)
+        needed = {inputs[g.nodes[i][1]][0] for i in live if g.nodes[i][0] == 'in'}
+        loaded = set()
         names, lines, adds, muls = {}, [], 0, 0
+        done = set()  # nodes whose values exist
+        pending = list(range(len(outputs)))
+
+        def load(i):
+            group, line = inputs[g.nodes[i][1]]
+            if group not in loaded:
+                loaded.add(group)
+                lines.append(indent + line)
+            done.add(i)
+
+        def flush():
+            if loaded != needed:
+                return
+            for o in list(pending):
+                call, vs = outputs[o]
+                if all(v is Z or v[0] in done for v in vs):
+                    args = tuple('V(0.0)' if v is Z else ('' if v[1] > 0 else '-') + self.ref(v[0], names)
+                                 for v in vs)
+                    lines.append(indent + call % args + ';')
+                    pending.remove(o)
+
         for i in sorted(live):
             op, a, b = g.nodes[i]
             if op == 'in':
                 continue
+            for j in ((a, b) if op in ('add', 'sub') else (b,)):
+                if g.nodes[j][0] == 'in':
+                    load(j)
             names[i] = 't%d' % len(names)
             if op == 'add':
                 expr = '%s + %s' % (self.ref(a, names), self.ref(b, names))
@@ -271,39 +303,42 @@ class Emitter:
                 expr = '%s * %s' % (self.ref(b, names), literal(a))
                 muls += 1
             lines.append('%sconst V %s = %s;' % (indent, names[i], expr))
-        for target, v in outputs:
-            if v is Z:
-                lines.append('%s%s = V(0.0);' % (indent, target))
-            else:
-                r = self.ref(v[0], names)
-                lines.append('%s%s = %s%s;' % (indent, target, '' if v[1] > 0 else '-', r))
+            done.add(i)
+            flush()
+        for i in sorted(live):
+            if g.nodes[i][0] == 'in':
+                load(i)
+        flush()
+        assert not pending
         return lines, adds, muls
 
 
 def complex_block(n):
     g = Dag()
     cx = Complex(g)
-    x = [(g.inp('xr[%d]' % j), g.inp('xi[%d]' % j)) for j in range(n)]
+    x = [(g.inp('xr%d' % j), g.inp('xi%d' % j)) for j in range(n)]
+    inputs = {}
+    for j in range(n):
+        line = 'V xr%d, xi%d;\n%sin.C(%d, xr%d, xi%d);' % (j, j, ' ' * 8, j, j, j)
+        inputs['xr%d' % j] = inputs['xi%d' % j] = (j, line)
     y = dft(cx, x)
-    outs = []
-    for k in range(n):
-        outs.append(('yr[%d]' % k, y[k][0]))
-        outs.append(('yi[%d]' % k, y[k][1]))
-    return Emitter(g).emit(outs, ' ' * 8)
+    outs = [('out.C(%d, %%s, %%s)' % k, y[k]) for k in range(n)]
+    return Emitter(g).emit(outs, inputs, ' ' * 8)
 
 
 def real_block(n):
     g = Dag()
     cx = Complex(g)
-    x = [(g.inp('x[%d]' % j), Z) for j in range(n)]
+    x = [(g.inp('x%d' % j), Z) for j in range(n)]
+    inputs = {'x%d' % j: (j, 'V x%d;\n%sin.R(%d, x%d);' % (j, ' ' * 8, j, j)) for j in range(n)}
     y = dft(cx, x)
-    outs = [('y[0]', y[0][0])]
+    outs = [('out.R(0, %s)', (y[0][0],))]
     for k in range(1, (n - 1) // 2 + 1):
-        outs.append(('y[%d]' % k, y[k][0]))
-        outs.append(('y[%d]' % (n - k), y[k][1]))
+        outs.append(('out.R(%d, %%s)' % k, (y[k][0],)))
+        outs.append(('out.R(%d, %%s)' % (n - k), (y[k][1],)))
     if n % 2 == 0:
-        outs.append(('y[%d]' % (n // 2), y[n // 2][0]))
-    return Emitter(g).emit(outs, ' ' * 8)
+        outs.append(('out.R(%d, %%s)' % (n // 2), (y[n // 2][0],)))
+    return Emitter(g).emit(outs, inputs, ' ' * 8)
 
 
 def main():
@@ -314,10 +349,14 @@ def main():
     w('// Do not edit: change the generator and run that command again.')
     w('#pragma once')
     w('')
-    w('namespace tw::fft {')
+    w('#include "transform/fft/kernels/lanes.hpp"')
     w('')
-    w('// One DFT of radix R, forward sign. Complex: split input and output. Real: half-complex output')
-    w('// (y[k] = Re X[k], y[R-k] = Im X[k]). V is double or a vector of independent transforms.')
+    w('namespace tw::fft::TW_FFT_ISA {')
+    w('')
+    w('// One DFT of radix R, forward sign, on values of type V (a double, or a vector of independent')
+    w('// transforms). Complex: in.C(j, re, im) loads input j, out.C(k, re, im) takes output k. Real:')
+    w('// in.R(j, x) loads input j, out.R(k, y) takes half-complex element k (y[k] = Re X[k],')
+    w('// y[R-k] = Im X[k]). Outputs come after the last input is loaded, so the block may work in place.')
     w('template <int R>')
     w('struct DftBlock;')
     for n in RADICES:
@@ -327,19 +366,18 @@ def main():
         w('template <>')
         w('struct DftBlock<%d> {' % n)
         w('    // %d additions, %d multiplications.' % (ca, cm))
-        w('    template <class V>')
-        w('    static inline __attribute__((always_inline)) void Complex(const V* xr, const V* xi, '
-          'V* yr, V* yi) {')
+        w('    template <class V, class In, class Out>')
+        w('    static inline __attribute__((always_inline)) void Complex(const In& in, const Out& out) {')
         out.extend(cl)
         w('    }')
         w('    // %d additions, %d multiplications.' % (ra, rm))
-        w('    template <class V>')
-        w('    static inline __attribute__((always_inline)) void Real(const V* x, V* y) {')
+        w('    template <class V, class In, class Out>')
+        w('    static inline __attribute__((always_inline)) void Real(const In& in, const Out& out) {')
         out.extend(rl)
         w('    }')
         w('};')
     w('')
-    w('}  // namespace tw::fft')
+    w('}  // namespace tw::fft::TW_FFT_ISA')
     sys.stdout.write('\n'.join(out) + '\n')
 
 

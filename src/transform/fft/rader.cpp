@@ -1,6 +1,8 @@
 // Rader's algorithm for a prime stage p: the DFT at the indices other than 0 is a cyclic
 // convolution of length p-1 in the order of the powers of a primitive root, carried out by two
 // forward transforms on a shared table of length p-1.
+#include <emmintrin.h>
+
 #include "transform/fft/generic_dft.hpp"
 #include "transform/fft/table_internal.hpp"
 
@@ -28,6 +30,16 @@ inline void ConjugateProduct(double& u, double& v, double c, double d) {
     const double im = -(d * u) - c * v;
     u = re;
     v = im;
+}
+
+// Interleaved pairs are written with one 16-byte store: the transforms read them that way, and a
+// wide load of two narrow stores still in flight would stall.
+inline void PutPair(double* p, double re, double im) { _mm_storeu_pd(p, _mm_set_pd(im, re)); }
+
+inline void ConjugateProductPair(double* p, double c, double d) {
+    double u = p[0], v = p[1];
+    ConjugateProduct(u, v, c, d);
+    PutPair(p, u, v);
 }
 
 }  // namespace
@@ -76,30 +88,30 @@ void ReleaseRaderStage(FftStage* st) {
     PlainFree(st->raderKernelIm);
 }
 
+// The convolutions run on interleaved scratch (work holds 4 p f64), so that the transforms of
+// length p-1 take the kernels' pair loads; the arithmetic is that of split data.
 Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
                     double* yi, double* work) {
     const int32_t m = p - 1;
     const int32_t* gather = st->raderGather;
     const int32_t* scatter = st->raderScatter;
-    double *ar = work, *ai = ar + m;
+    double *a = work, *b = work + 2 * static_cast<ptrdiff_t>(m);
     const double x0r = xr[0], x0i = xi[0];
+    for (int32_t q = 0; q < m; ++q) PutPair(a + 2 * q, xr[gather[q + 1]], xi[gather[q + 1]]);
+    if (const Status s = FftComplexForward(st->raderTable, a, a + 1, b, b + 1, 2, 2, m)) return s;
+    for (int32_t q = 0; q < m; ++q) ConjugateProductPair(b + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
+    if (const Status s = FftComplexForward(st->raderTable, b, b + 1, a, a + 1, 2, 2, m)) return s;
+    // The sum of the inputs (output 0) in gather order: a chain of dependent additions, so it runs
+    // beside the independent scatter rather than on its own.
     double sr = x0r, si = x0i;
-    for (int32_t q = 0; q < m; ++q) {
-        ar[q] = xr[gather[q + 1]];
-        ai[q] = xi[gather[q + 1]];
-        sr += ar[q];
-        si += ai[q];
+    for (int32_t k = 1; k <= m; ++k) {
+        sr += xr[gather[k]];
+        si += xi[gather[k]];
+        yr[scatter[k]] = a[2 * (k - 1)] + x0r;
+        yi[scatter[k]] = x0i - a[2 * (k - 1) + 1];
     }
     yr[0] = sr;
     yi[0] = si;
-    if (const Status s = FftComplexForward(st->raderTable, ar, ai, yr + 1, yi + 1, 1, 1, m)) return s;
-    for (int32_t q = 0; q < m; ++q)
-        ConjugateProduct(yr[q + 1], yi[q + 1], st->raderKernelRe[q], st->raderKernelIm[q]);
-    if (const Status s = FftComplexForward(st->raderTable, yr + 1, yi + 1, ar, ai, 1, 1, m)) return s;
-    for (int32_t k = 1; k <= m; ++k) {
-        yr[scatter[k]] = ar[k - 1] + x0r;
-        yi[scatter[k]] = x0i - ai[k - 1];
-    }
     return 0;
 }
 
@@ -107,35 +119,31 @@ Status RaderReal(const FftStage* st, int32_t p, const double* x, double* y, doub
     const int32_t m = p - 1;
     const int32_t* gather = st->raderGather;
     const int32_t* scatter = st->raderScatter;
-    double *tr = work, *ti = tr + m, *er = ti + m, *ei = er + m;
+    // t (the gathered input, later the second transform) and e (the expanded spectrum).
+    double *t = work, *e = work + 2 * static_cast<ptrdiff_t>(m);
     const double x0 = x[0];
-    double sum = x0;
-    for (int32_t q = 0; q < m; ++q) {
-        tr[q] = x[gather[q + 1]];
-        sum += tr[q];
-    }
-    y[0] = sum;
-    if (const Status s = FftRealForward(st->raderTable, tr, y + 1, 1, 1, m)) return s;
+    for (int32_t q = 0; q < m; ++q) t[q] = x[gather[q + 1]];
+    if (const Status s = FftRealForward(st->raderTable, t, y + 1, 1, 1, m)) return s;
     // m = p - 1 is even: expand the half-complex result into the full spectrum.
     const double* h = y + 1;
-    er[0] = h[0];
-    ei[0] = 0;
-    er[m / 2] = h[m / 2];
-    ei[m / 2] = 0;
+    PutPair(e, h[0], 0);
+    PutPair(e + m, h[m / 2], 0);
     for (int32_t k = 1; k < m / 2; ++k) {
-        er[k] = er[m - k] = h[k];
-        ei[k] = h[m - k];
-        ei[m - k] = -h[m - k];
+        PutPair(e + 2 * k, h[k], h[m - k]);
+        PutPair(e + 2 * (m - k), h[k], -h[m - k]);
     }
-    for (int32_t q = 0; q < m; ++q) ConjugateProduct(er[q], ei[q], st->raderKernelRe[q], st->raderKernelIm[q]);
-    if (const Status s = FftComplexForward(st->raderTable, er, ei, tr, ti, 1, 1, m)) return s;
+    for (int32_t q = 0; q < m; ++q) ConjugateProductPair(e + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
+    if (const Status s = FftComplexForward(st->raderTable, e, e + 1, t, t + 1, 2, 2, m)) return s;
+    double sum = x0;
     for (int32_t k = 1; k <= m; ++k) {
+        sum += x[gather[k]];
         const int32_t j = scatter[k];
         if (j <= p / 2) {
-            y[j] = tr[k - 1] + x0;
-            y[p - j] = -ti[k - 1];
+            y[j] = t[2 * (k - 1)] + x0;
+            y[p - j] = -t[2 * (k - 1) + 1];
         }
     }
+    y[0] = sum;
     return 0;
 }
 

@@ -108,7 +108,7 @@ Status Leaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si,
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return RealLeafForm<ScalarLanes>(d, in.p, out.p, si, so, count);
+        return sse2::RealLeafForm<sse2::ScalarLanes>(d, in.p, out.p, si, so, count);
     });
 }
 
@@ -119,7 +119,7 @@ Status Leaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return ComplexLeafForm<ScalarLanes>(d, in.re, in.im, out.re, out.im, si, so, count);
+        return sse2::ComplexLeafForm<sse2::ScalarLanes>(d, in.re, in.im, out.re, out.im, si, so, count);
     });
 }
 
@@ -130,7 +130,7 @@ Status Combine(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int32_t 
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return RealCombineForm<ScalarLanes>(d, data.p, st->twiddleRe, st->twiddleIm, s, m);
+        return sse2::RealCombineForm<sse2::ScalarLanes>(d, data.p, st->twiddleRe, st->twiddleIm, s, m);
     });
 }
 
@@ -141,7 +141,7 @@ Status Combine(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return ComplexCombineForm<ScalarLanes>(d, data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
+        return sse2::ComplexCombineForm<sse2::ScalarLanes>(d, data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
     });
 }
 

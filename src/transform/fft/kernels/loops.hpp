@@ -1,158 +1,297 @@
 // The four kernel forms as loops around one DFT of the stage's radix.
 //
-// A DFT policy P gives the radix and the two block DFTs (complex on split values, real to
-// half-complex). Codelet policies have a compile-time radix and keep their columns in registers
-// or on the stack; the odd and Rader policies have a run-time radix and hand in scratch columns.
-// Lanes L decide how many independent transforms (leaf sub-transforms, combine columns) one pass
-// computes at once.
+// A DFT policy P gives the radix and the block DFTs (complex, and real to half-complex). Codelet
+// policies have a compile-time radix and run straight-line code that loads each input through an
+// accessor at its first use and stores each output through another; the odd and Rader policies
+// have a run-time radix and work on scratch columns. Lanes L decide how many independent transforms
+// (leaf sub-transforms, combine columns) one pass computes at once; what does not fill the widest
+// lanes goes to the narrower ones (L::Narrower) and at last to scalars.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
+#include <type_traits>
 
 #include "frame/memory.hpp"
+#include "transform/fft/kernels/codelets.hpp"
 #include "transform/fft/kernels/lanes.hpp"
 
-namespace tw::fft {
+namespace tw::fft::TW_FFT_ISA {
 
-// Column buffers: on the stack for a compile-time radix, else the policy's scratch (6 p f64).
-template <class V, int R>
-struct Columns {
-    template <class P>
-    explicit Columns(const P&) {}
-    V xr[R], xi[R], yr[R], yi[R];
-};
-template <class V>
-struct Columns<V, 0> {
-    template <class P>
-    explicit Columns(const P& p)
-        : xr(p.columns), xi(xr + p.radix), yr(xi + p.radix), yi(yr + p.radix) {}
-    V *xr, *xi, *yr, *yi;
-};
+#define TW_FFT_INLINE inline __attribute__((always_inline))
 
 template <class V>
-inline void Twiddle(V& re, V& im, V c, V d) {
+TW_FFT_INLINE void Twiddle(V& re, V& im, V c, V d) {
     const V a = re, b = im;
     re = a * c - b * d;
     im = a * d + b * c;
 }
 
-// Sub-transforms q0..q1-1 of a leaf: q reads in[(q + j count) inStride] and writes
-// out[(q r + k) outStride].
-template <class L, class P>
-Status ComplexLeafLoop(P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
-                       ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t q0, int32_t q1) {
+// Complex values at re/im, element j at j step; lanes at `lane`. Pair: im is re + 1.
+template <class L, bool Pair>
+struct ComplexIn {
     using V = typename L::V;
-    const int32_t r = p.radix;
-    const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(r) * os;
-    Columns<V, P::kRadix> c(p);
-    for (int32_t q = q0; q + L::kWidth <= q1; q += L::kWidth) {
-        const double* pr = inRe + q * is;
-        const double* pi = inIm + q * is;
-        for (int32_t j = 0; j < r; ++j) {
-            c.xr[j] = L::Load(pr + j * step, is);
-            c.xi[j] = L::Load(pi + j * step, is);
-        }
-        if (const Status s = p.Complex(c.xr, c.xi, c.yr, c.yi)) return s;
-        double* qr = outRe + q * ro;
-        double* qi = outIm + q * ro;
-        for (int32_t k = 0; k < r; ++k) {
-            L::Store(qr + k * os, ro, c.yr[k]);
-            L::Store(qi + k * os, ro, c.yi[k]);
-        }
-    }
-    return 0;
-}
-
-template <class L, class P>
-Status RealLeafLoop(P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
-                    int32_t q0, int32_t q1) {
-    using V = typename L::V;
-    const int32_t r = p.radix;
-    const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(r) * os;
-    Columns<V, P::kRadix> c(p);
-    for (int32_t q = q0; q + L::kWidth <= q1; q += L::kWidth) {
-        const double* pq = in + q * is;
-        for (int32_t j = 0; j < r; ++j) c.xr[j] = L::Load(pq + j * step, is);
-        if (const Status s = p.Real(c.xr, c.yr)) return s;
-        double* qo = out + q * ro;
-        for (int32_t k = 0; k < r; ++k) L::Store(qo + k * os, ro, c.yr[k]);
-    }
-    return 0;
-}
-
-// Columns j0..j1-1 of a complex combine; column 0 has no twiddles, column j >= 1 takes the
-// twiddles at (j-1)(r-1).
-template <class L, class P>
-Status ComplexCombineLoop(P& p, double* re, double* im, const double* twRe, const double* twIm,
-                          ptrdiff_t s, int32_t m, int32_t j0, int32_t j1) {
-    using V = typename L::V;
-    const int32_t r = p.radix;
-    const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    Columns<V, P::kRadix> c(p);
-    for (int32_t j = j0; j + L::kWidth <= j1; j += L::kWidth) {
-        double* pr = re + j * s;
-        double* pi = im + j * s;
-        c.xr[0] = L::Load(pr, s);
-        c.xi[0] = L::Load(pi, s);
-        if (j == 0) {
-            for (int32_t i = 1; i < r; ++i) {
-                c.xr[i] = L::Load(pr + i * ms, s);
-                c.xi[i] = L::Load(pi + i * ms, s);
-            }
+    const double* re;
+    const double* im;
+    ptrdiff_t step, lane;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        if constexpr (Pair) {
+            L::LoadPair(re + j * step, lane, r, i);
         } else {
-            const double* wr = twRe + static_cast<ptrdiff_t>(j - 1) * (r - 1) - 1;
-            const double* wi = twIm + static_cast<ptrdiff_t>(j - 1) * (r - 1) - 1;
-            for (int32_t i = 1; i < r; ++i) {
-                c.xr[i] = L::Load(pr + i * ms, s);
-                c.xi[i] = L::Load(pi + i * ms, s);
-                Twiddle(c.xr[i], c.xi[i], L::Load(wr + i, r - 1), L::Load(wi + i, r - 1));
-            }
+            r = L::Load(re + j * step, lane);
+            i = L::Load(im + j * step, lane);
         }
-        if (const Status st = p.Complex(c.xr, c.xi, c.yr, c.yi)) return st;
-        for (int32_t i = 0; i < r; ++i) {
-            L::Store(pr + i * ms, s, c.yr[i]);
-            L::Store(pi + i * ms, s, c.yi[i]);
+    }
+};
+
+template <class L, bool Pair>
+struct ComplexOut {
+    using V = typename L::V;
+    double* re;
+    double* im;
+    ptrdiff_t step, lane;
+    TW_FFT_INLINE void C(int32_t k, V r, V i) const {
+        if constexpr (Pair) {
+            L::StorePair(re + k * step, lane, r, i);
+        } else {
+            L::Store(re + k * step, lane, r);
+            L::Store(im + k * step, lane, i);
         }
+    }
+};
+
+// An input whose element j >= 1 is multiplied by the twiddle at j of its column; w points one
+// before the column's first twiddle, neighbouring columns' twiddles stand wlane apart.
+template <class L, class In>
+struct TwiddledIn {
+    using V = typename L::V;
+    In data;
+    const double* wr;
+    const double* wi;
+    ptrdiff_t wlane;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        data.C(j, r, i);
+        if (j > 0) Twiddle(r, i, L::Load(wr + j, wlane), L::Load(wi + j, wlane));
+    }
+};
+
+// Real values at p, element j at j step; lanes at `lane`, which is 1 when Unit.
+template <class L, bool Unit>
+struct RealIn {
+    using V = typename L::V;
+    const double* p;
+    ptrdiff_t step, lane;
+    TW_FFT_INLINE void R(int32_t j, V& x) const {
+        if constexpr (Unit)
+            x = L::LoadUnit(p + j * step);
+        else
+            x = L::Load(p + j * step, lane);
+    }
+};
+
+template <class L>
+struct RealOut {
+    using V = typename L::V;
+    double* p;
+    ptrdiff_t step, lane;
+    TW_FFT_INLINE void R(int32_t k, V y) const { L::Store(p + k * step, lane, y); }
+};
+
+// The column pair (k, m-k) of a real combine as one complex column; lanes run over neighbouring
+// k, so the mirrored column steps backwards. Unit: the stride s is 1.
+template <class L, bool Unit>
+struct PairColumnIn {
+    using V = typename L::V;
+    const double* front;
+    const double* back;
+    ptrdiff_t ms, s;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        if constexpr (Unit) {
+            r = L::LoadUnit(front + j * ms);
+            i = L::LoadBack(back + j * ms);
+        } else {
+            r = L::Load(front + j * ms, s);
+            i = L::Load(back + j * ms, -s);
+        }
+    }
+};
+
+// Output q is X[k + q m]; below the middle it is stored as it is, above as the conjugate of its
+// mirror (r - q) m - k. The order of the two stores does not matter: they go to different columns.
+template <class L, bool Unit>
+struct PairColumnOut {
+    using V = typename L::V;
+    double* front;
+    double* back;
+    ptrdiff_t ms, s;
+    int32_t r;
+    TW_FFT_INLINE void C(int32_t q, V re, V im) const {
+        double* a = front + q * ms;
+        double* b = back + (r - 1 - q) * ms;
+        // Below the middle: re to the front, im to the back; above: re to the back, -im to the front.
+        const bool low = 2 * q < r;
+        const V f = low ? re : -im, g = low ? im : re;
+        if constexpr (Unit) {
+            L::StoreUnit(a, f);
+            L::StoreBack(b, g);
+        } else {
+            L::Store(a, s, f);
+            L::Store(b, -s, g);
+        }
+    }
+};
+
+// The middle column m/2 of a real combine (m even): real values times the twiddles
+// exp(-i pi j / r), and only the outputs below the middle are kept.
+struct MiddleColumnIn {
+    const double* p;
+    const double* wr;
+    const double* wi;
+    ptrdiff_t ms;
+    TW_FFT_INLINE void C(int32_t j, double& re, double& im) const {
+        if (j == 0) {
+            re = p[0];
+            im = 0.0;
+        } else {
+            const double v = p[j * ms];
+            re = v * wr[j];
+            im = v * wi[j];
+        }
+    }
+};
+
+struct MiddleColumnOut {
+    double* p;
+    ptrdiff_t ms;
+    int32_t r;
+    TW_FFT_INLINE void C(int32_t q, double re, double im) const {
+        if (2 * q + 1 > r) return;
+        p[q * ms] = re;
+        if (2 * q + 1 < r) p[(r - 1 - q) * ms] = im;
+    }
+};
+
+// Scalar columns: on the stack for a compile-time radix, else the policy's scratch (4 radix f64).
+template <int R>
+struct Columns {
+    template <class P>
+    explicit Columns(const P&) {}
+    double xr[R], xi[R], yr[R], yi[R];
+};
+template <>
+struct Columns<0> {
+    template <class P>
+    explicit Columns(const P& p) : xr(p.columns), xi(xr + p.radix), yr(xi + p.radix), yi(yr + p.radix) {}
+    double *xr, *xi, *yr, *yi;
+};
+
+// One DFT of the policy through the accessors. Vector lanes run the codelet's straight-line code
+// with the accesses inlined; scalars go through columns to the policy's one scalar routine, so that
+// the many scalar edges and remainders of the forms share one copy of the code.
+template <class V, class P, class In, class Out>
+TW_FFT_INLINE Status RunComplex(const P& p, const In& in, const Out& out) {
+    if constexpr (!std::is_same_v<V, double>) {
+        p.template Complex<V>(in, out);
+        return 0;
+    } else {
+        Columns<P::kRadix> c(p);
+        const int32_t r = p.radix;
+        for (int32_t j = 0; j < r; ++j) in.C(j, c.xr[j], c.xi[j]);
+        if (const Status s = p.Complex(c.xr, c.xi, c.yr, c.yi)) return s;
+        for (int32_t k = 0; k < r; ++k) out.C(k, c.yr[k], c.yi[k]);
+        return 0;
+    }
+}
+
+template <class V, class P, class In, class Out>
+TW_FFT_INLINE Status RunReal(const P& p, const In& in, const Out& out) {
+    if constexpr (!std::is_same_v<V, double>) {
+        p.template Real<V>(in, out);
+        return 0;
+    } else {
+        Columns<P::kRadix> c(p);
+        const int32_t r = p.radix;
+        for (int32_t j = 0; j < r; ++j) in.R(j, c.xr[j]);
+        if (const Status s = p.Real(c.xr, c.yr)) return s;
+        for (int32_t k = 0; k < r; ++k) out.R(k, c.yr[k]);
+        return 0;
+    }
+}
+
+// Sub-transforms q0..q1-1 of a leaf: q reads in[(q + j count) inStride] and writes
+// out[(q r + k) outStride]. Returns the first sub-transform not done.
+template <class L, bool Pair, class P>
+Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
+                       ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t& q) {
+    const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
+    for (; q + L::kWidth <= count; q += L::kWidth) {
+        const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, step, is};
+        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro};
+        if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
+    }
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
+        if (q < count) BaselineCodelets().leafComplexFrom[P::kRadix](inRe, inIm, outRe, outIm, is, os, count, q);
+    } else if constexpr (L::kWidth > 1) {
+        return ComplexLeafLoop<typename L::Narrower, Pair>(p, inRe, inIm, outRe, outIm, is, os, count, q);
     }
     return 0;
 }
 
-// Column pairs (k, m-k) for k0 <= k < k1 of a real combine. Lanes run over neighbouring k, so the
-// mirrored column m-k steps backwards.
-template <class L, class P>
-Status RealCombinePairs(P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
-                        int32_t m, int32_t k0, int32_t k1) {
-    using V = typename L::V;
+template <class L, bool Unit, class P>
+Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
+                    int32_t& q) {
+    const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
+    for (; q + L::kWidth <= count; q += L::kWidth) {
+        const RealIn<L, Unit> x{in + q * is, step, is};
+        const RealOut<L> y{out + q * ro, os, ro};
+        if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
+    }
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
+        if (q < count) BaselineCodelets().leafRealFrom[P::kRadix](in, out, is, os, count, q);
+    } else if constexpr (L::kWidth > 1) {
+        return RealLeafLoop<typename L::Narrower, Unit>(p, in, out, is, os, count, q);
+    }
+    return 0;
+}
+
+// Columns j..m-1 (j >= 1) of a complex combine; column j takes the twiddles at (j-1)(r-1).
+template <class L, bool Pair, class P>
+Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe, const double* twIm,
+                          ptrdiff_t s, int32_t m, int32_t& j) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    Columns<V, P::kRadix> c(p);
-    for (int32_t k = k0; k + L::kWidth <= k1; k += L::kWidth) {
+    for (; j + L::kWidth <= m; j += L::kWidth) {
+        const ptrdiff_t w = static_cast<ptrdiff_t>(j - 1) * (r - 1) - 1;
+        const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, r - 1};
+        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s};
+        if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+    }
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
+        if (j < m) BaselineCodelets().combineComplexFrom[P::kRadix](re, im, twRe, twIm, s, m, j);
+    } else if constexpr (L::kWidth > 1) {
+        return ComplexCombineLoop<typename L::Narrower, Pair>(p, re, im, twRe, twIm, s, m, j);
+    }
+    return 0;
+}
+
+// Column pairs (k, m-k) for k from k up to `pairs` of a real combine.
+template <class L, bool Unit, class P>
+Status RealCombinePairs(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
+                        int32_t m, int32_t pairs, int32_t& k) {
+    const int32_t r = p.radix;
+    const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
+    for (; k + L::kWidth <= pairs + 1; k += L::kWidth) {
+        const ptrdiff_t w = static_cast<ptrdiff_t>(k - 1) * (r - 1) - 1;
         double* front = data + k * s;
         double* back = data + (m - k) * s;
-        c.xr[0] = L::Load(front, s);
-        c.xi[0] = L::Load(back, -s);
-        const double* wr = twRe + static_cast<ptrdiff_t>(k - 1) * (r - 1) - 1;
-        const double* wi = twIm + static_cast<ptrdiff_t>(k - 1) * (r - 1) - 1;
-        for (int32_t i = 1; i < r; ++i) {
-            c.xr[i] = L::Load(front + i * ms, s);
-            c.xi[i] = L::Load(back + i * ms, -s);
-            Twiddle(c.xr[i], c.xi[i], L::Load(wr + i, r - 1), L::Load(wi + i, r - 1));
-        }
-        if (const Status st = p.Complex(c.xr, c.xi, c.yr, c.yi)) return st;
-        // Output q is X[k + q m]; below the middle it is stored as it is, above as the
-        // conjugate of its mirror (r - q) m - k.
-        for (int32_t q = 0; q < r; ++q) {
-            double* a = front + q * ms;
-            double* b = back + (r - 1 - q) * ms;
-            if (2 * q < r) {
-                L::Store(a, s, c.yr[q]);
-                L::Store(b, -s, c.yi[q]);
-            } else {
-                L::Store(b, -s, c.yr[q]);
-                L::Store(a, s, -c.yi[q]);
-            }
-        }
+        const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, r - 1};
+        const PairColumnOut<L, Unit> out{front, back, ms, s, r};
+        if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+    }
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
+        if (k <= pairs) BaselineCodelets().combineRealFrom[P::kRadix](data, twRe, twIm, s, m, k);
+    } else if constexpr (L::kWidth > 1) {
+        return RealCombinePairs<typename L::Narrower, Unit>(p, data, twRe, twIm, s, m, pairs, k);
     }
     return 0;
 }
@@ -160,66 +299,77 @@ Status RealCombinePairs(P& p, double* data, const double* twRe, const double* tw
 // Column 0 (a real DFT without twiddles) and, for even m, the middle column m/2, whose real
 // values times the twiddles exp(-i pi j / r) give the half-frequency outputs.
 template <class P>
-Status RealCombineEdges(P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
+Status RealCombineEdges(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
                         int32_t m) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    Columns<double, P::kRadix> c(p);
-    for (int32_t i = 0; i < r; ++i) c.xr[i] = data[i * ms];
-    if (const Status st = p.Real(c.xr, c.yr)) return st;
-    for (int32_t i = 0; i < r; ++i) data[i * ms] = c.yr[i];
+    if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0}))
+        return st;
     if (m % 2 != 0) return 0;
+    const ptrdiff_t w = static_cast<ptrdiff_t>(m / 2 - 1) * (r - 1) - 1;
     double* mid = data + (m / 2) * s;
-    const double* wr = twRe + static_cast<ptrdiff_t>(m / 2 - 1) * (r - 1) - 1;
-    const double* wi = twIm + static_cast<ptrdiff_t>(m / 2 - 1) * (r - 1) - 1;
-    c.xr[0] = mid[0];
-    c.xi[0] = 0.0;
-    for (int32_t i = 1; i < r; ++i) {
-        const double v = mid[i * ms];
-        c.xr[i] = v * wr[i];
-        c.xi[i] = v * wi[i];
+    return RunComplex<double>(p, MiddleColumnIn{mid, twRe + w, twIm + w, ms}, MiddleColumnOut{mid, ms, r});
+}
+
+// Whole forms, and the forms from sub-transform or column `from` on. Interleaved complex data take
+// the pair loads, unit strides the unit loads; a codelet's vector lanes serve as many transforms as
+// fill them, narrower lanes and scalars the rest.
+template <class L, class P>
+Status ComplexLeafForm(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
+                       ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t from = 0) {
+    int32_t q = from;
+    if constexpr (L::kWidth > 1) {
+        if (inIm == inRe + 1 && outIm == outRe + 1)
+            return ComplexLeafLoop<L, true>(p, inRe, inIm, outRe, outIm, is, os, count, q);
     }
-    if (const Status st = p.Complex(c.xr, c.xi, c.yr, c.yi)) return st;
-    for (int32_t q = 0; 2 * q + 1 <= r; ++q) {
-        mid[q * ms] = c.yr[q];
-        if (2 * q + 1 < r) mid[(r - 1 - q) * ms] = c.yi[q];
+    return ComplexLeafLoop<L, false>(p, inRe, inIm, outRe, outIm, is, os, count, q);
+}
+
+template <class L, class P>
+Status RealLeafForm(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
+                    int32_t from = 0) {
+    int32_t q = from;
+    if constexpr (L::kWidth > 1) {
+        if (is == 1) return RealLeafLoop<L, true>(p, in, out, is, os, count, q);
     }
-    return 0;
-}
-
-// Whole forms: the vector lanes over as many transforms as fill them, scalar for the rest.
-template <class L, class P>
-Status ComplexLeafForm(P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
-                       ptrdiff_t is, ptrdiff_t os, int32_t count) {
-    const int32_t v = count - count % L::kWidth;
-    if (const Status s = ComplexLeafLoop<L>(p, inRe, inIm, outRe, outIm, is, os, count, 0, v)) return s;
-    return ComplexLeafLoop<ScalarLanes>(p, inRe, inIm, outRe, outIm, is, os, count, v, count);
+    return RealLeafLoop<L, false>(p, in, out, is, os, count, q);
 }
 
 template <class L, class P>
-Status RealLeafForm(P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count) {
-    const int32_t v = count - count % L::kWidth;
-    if (const Status s = RealLeafLoop<L>(p, in, out, is, os, count, 0, v)) return s;
-    return RealLeafLoop<ScalarLanes>(p, in, out, is, os, count, v, count);
+Status ComplexCombineColumns(const P& p, double* re, double* im, const double* twRe, const double* twIm,
+                             ptrdiff_t s, int32_t m, int32_t from) {
+    int32_t j = from;
+    if constexpr (L::kWidth > 1) {
+        if (im == re + 1) return ComplexCombineLoop<L, true>(p, re, im, twRe, twIm, s, m, j);
+    }
+    return ComplexCombineLoop<L, false>(p, re, im, twRe, twIm, s, m, j);
 }
 
 template <class L, class P>
-Status ComplexCombineForm(P& p, double* re, double* im, const double* twRe, const double* twIm,
+Status ComplexCombineForm(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                           ptrdiff_t s, int32_t m) {
-    const int32_t v = 1 + (m - 1) / L::kWidth * L::kWidth;
-    if (const Status st = ComplexCombineLoop<ScalarLanes>(p, re, im, twRe, twIm, s, m, 0, 1)) return st;
-    if (const Status st = ComplexCombineLoop<L>(p, re, im, twRe, twIm, s, m, 1, v)) return st;
-    return ComplexCombineLoop<ScalarLanes>(p, re, im, twRe, twIm, s, m, v, m);
+    const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
+    if (const Status st = RunComplex<double>(p, ComplexIn<ScalarLanes, false>{re, im, ms, 0},
+                                             ComplexOut<ScalarLanes, false>{re, im, ms, 0}))
+        return st;
+    return ComplexCombineColumns<L>(p, re, im, twRe, twIm, s, m, 1);
 }
 
 template <class L, class P>
-Status RealCombineForm(P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
-                       int32_t m) {
-    const int32_t pairs = (m - 1) / 2;
-    const int32_t v = 1 + pairs / L::kWidth * L::kWidth;
-    if (const Status st = RealCombineEdges(p, data, twRe, twIm, s, m)) return st;
-    if (const Status st = RealCombinePairs<L>(p, data, twRe, twIm, s, m, 1, v)) return st;
-    return RealCombinePairs<ScalarLanes>(p, data, twRe, twIm, s, m, v, pairs + 1);
+Status RealCombinePairsFrom(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
+                            int32_t m, int32_t from) {
+    int32_t k = from;
+    if constexpr (L::kWidth > 1) {
+        if (s == 1) return RealCombinePairs<L, true>(p, data, twRe, twIm, s, m, (m - 1) / 2, k);
+    }
+    return RealCombinePairs<L, false>(p, data, twRe, twIm, s, m, (m - 1) / 2, k);
 }
 
-}  // namespace tw::fft
+template <class L, class P>
+Status RealCombineForm(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
+                       int32_t m) {
+    if (const Status st = RealCombineEdges(p, data, twRe, twIm, s, m)) return st;
+    return RealCombinePairsFrom<L>(p, data, twRe, twIm, s, m, 1);
+}
+
+}  // namespace tw::fft::TW_FFT_ISA

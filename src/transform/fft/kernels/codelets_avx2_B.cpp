@@ -1,0 +1,3 @@
+// AVX2 kernels of the radices in group B; used only where the processor has AVX2 (codelets.cpp).
+#define TW_FFT_GROUP B
+#include "transform/fft/kernels/codelets_avx2.inc"

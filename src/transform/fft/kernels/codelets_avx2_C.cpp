@@ -1,0 +1,3 @@
+// AVX2 kernels of the radices in group C; used only where the processor has AVX2 (codelets.cpp).
+#define TW_FFT_GROUP C
+#include "transform/fft/kernels/codelets_avx2.inc"

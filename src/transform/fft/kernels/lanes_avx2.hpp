@@ -1,0 +1,49 @@
+// Four lanes of AVX2 vectors, for the kernels compiled for that instruction set only (see lanes.hpp).
+// No FMA: every product and sum rounds on its own, as in the scalar code.
+#pragma once
+
+#include <immintrin.h>
+
+#include "transform/fft/kernels/codelets.hpp"
+#include "transform/fft/kernels/lanes.hpp"
+
+namespace tw::fft::TW_FFT_ISA {
+
+using Vec4 = __m256d;
+
+struct Avx2Lanes {
+    using V = Vec4;
+    static constexpr int kWidth = 4;
+    // Remainders go to the baseline's two lanes and scalars (a copy of those here would double
+    // the compile time for the few transforms they serve).
+    using Narrower = BaselineRest;
+    static V Load(const double* p, ptrdiff_t lane) { return _mm256_set_pd(p[3 * lane], p[2 * lane], p[lane], p[0]); }
+    static void Store(double* p, ptrdiff_t lane, V v) {
+        const __m128d lo = _mm256_castpd256_pd128(v), hi = _mm256_extractf128_pd(v, 1);
+        _mm_storel_pd(p, lo);
+        _mm_storeh_pd(p + lane, lo);
+        _mm_storel_pd(p + 2 * lane, hi);
+        _mm_storeh_pd(p + 3 * lane, hi);
+    }
+    static V LoadUnit(const double* p) { return _mm256_loadu_pd(p); }
+    static void StoreUnit(double* p, V v) { _mm256_storeu_pd(p, v); }
+    static V LoadBack(const double* p) { return _mm256_permute4x64_pd(_mm256_loadu_pd(p - 3), 0x1B); }
+    static void StoreBack(double* p, V v) { _mm256_storeu_pd(p - 3, _mm256_permute4x64_pd(v, 0x1B)); }
+    // Lanes 0 and 2 share one vector, 1 and 3 the other, so that one unpack sorts them.
+    static void LoadPair(const double* p, ptrdiff_t lane, V& re, V& im) {
+        const __m256d a = _mm256_insertf128_pd(_mm256_castpd128_pd256(_mm_loadu_pd(p)), _mm_loadu_pd(p + 2 * lane), 1);
+        const __m256d b =
+            _mm256_insertf128_pd(_mm256_castpd128_pd256(_mm_loadu_pd(p + lane)), _mm_loadu_pd(p + 3 * lane), 1);
+        re = _mm256_unpacklo_pd(a, b);
+        im = _mm256_unpackhi_pd(a, b);
+    }
+    static void StorePair(double* p, ptrdiff_t lane, V re, V im) {
+        const __m256d a = _mm256_unpacklo_pd(re, im), b = _mm256_unpackhi_pd(re, im);
+        _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
+        _mm_storeu_pd(p + 2 * lane, _mm256_extractf128_pd(a, 1));
+        _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
+        _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
+    }
+};
+
+}  // namespace tw::fft::TW_FFT_ISA
