@@ -1,5 +1,5 @@
 #include "frame/frame.hpp"
-#include "transform/cached_tables.hpp"
+#include "transform/fft/cached_tables.hpp"
 #include "transform/dct.hpp"
 #include "twanlys/transforms.h"
 

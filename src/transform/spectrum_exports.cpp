@@ -1,7 +1,7 @@
 #include <type_traits>
 
 #include "frame/frame.hpp"
-#include "transform/cached_tables.hpp"
+#include "transform/fft/cached_tables.hpp"
 #include "transform/spectrum.hpp"
 #include "twanlys/transforms.h"
 

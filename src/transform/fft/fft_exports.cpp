@@ -3,7 +3,7 @@
 
 #include "frame/frame.hpp"
 #include "transform/fft/fft.hpp"
-#include "transform/fft/holder.hpp"
+#include "transform/fft/cached_tables.hpp"
 #include "twanlys/fft.h"
 
 namespace {
@@ -12,35 +12,6 @@ using tw::cdouble;
 using tw::Frame;
 using tw::Handle;
 using tw::Status;
-
-// The table of one call: from the work cell (plain exports), from slot 0 of the instance-data
-// record (_IDP), or, without any cell, created for this call alone.
-class CallTable {
-public:
-    CallTable() = default;
-    CallTable(const CallTable&) = delete;
-    CallTable& operator=(const CallTable&) = delete;
-    ~CallTable() {
-        if (own_) tw::DestroyFftTable(table);
-    }
-
-    Status Acquire(void** cell, bool instanceData, int32_t n) {
-        if (cell == nullptr) {
-            own_ = true;
-            table = tw::CreateFftTable(n);
-            return table == nullptr ? OutOfMemoryErr : 0;
-        }
-        if (!instanceData) return tw::AcquireTableHolder(cell, n, true, &table);
-        tw::InstanceRecord* record = tw::AcquireInstanceRecord(cell);
-        if (record == nullptr) return OutOfMemoryErr;
-        return tw::AcquireTableHolder(&record->slot[0], n, false, &table);
-    }
-
-    tw::FftTable* table = nullptr;
-
-private:
-    bool own_ = false;
-};
 
 double* Lanes(cdouble* p) { return reinterpret_cast<double*>(p); }
 const double* Lanes(const cdouble* p) { return reinterpret_cast<const double*>(p); }
@@ -63,8 +34,9 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
                : (start < 0 || start >= count) ? IndexRangeErr
                : size < 1                       ? FftSizeErr
                                                 : 0;
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, size);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, size, &table);
     cdouble* out = nullptr;
     if (s == 0) s = f.Resize(y, size, &out);
     const double* xs = nullptr;
@@ -76,7 +48,7 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
         if (s == 0) CopyWindow(xs, count, start, size, padded.get());
         source = padded.get();
     }
-    if (s == 0) s = tw::FftRealForward(table.table, source, Lanes(out), 1, 2, size);
+    if (s == 0) s = tw::FftRealForward(table, source, Lanes(out), 1, 2, size);
     if (s == 0) tw::FftUnpackHalfComplex(out, size, shift);
     return f.Finish(tw::MergeRelease(s, padded.Release()));
 }
@@ -87,8 +59,9 @@ Status ComplexForward(Handle x, Handle& y, void** cell, int32_t start, int32_t s
     f.Output<cdouble>(y);
     const int32_t count = tw::Count(x);
     Status s = count < 1 ? EmptyArrayErr : size < 1 ? FftSizeErr : 0;
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, size);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, size, &table);
     const cdouble* xs = nullptr;
     if (s == 0) s = f.In(x, &xs);
     // start is not validated here; a window reaching outside x reads zeros there.
@@ -105,7 +78,7 @@ Status ComplexForward(Handle x, Handle& y, void** cell, int32_t start, int32_t s
     }
     cdouble* out = nullptr;
     if (s == 0) s = f.Resize(y, size, &out);
-    if (s == 0) s = tw::FftComplexForward(table.table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, size);
+    if (s == 0) s = tw::FftComplexForward(table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, size);
     // Centred order: the upper size/2 elements go to the front, which puts DC at size/2 for both
     // parities (the same order as the real export's unpack). The inverse undoes exactly this.
     if (s == 0 && shift != 0) std::rotate(out, out + (size - size / 2), out + size);
@@ -118,8 +91,9 @@ Status ComplexInverse(Handle x, Handle& y, void** cell, int32_t shift) {
     f.Output<cdouble>(y);
     const int32_t count = tw::Count(x);
     Status s = count < 1 ? EmptyArrayErr : 0;
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, count);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, count, &table);
     cdouble* out = nullptr;
     if (s == 0) s = f.Resize(y, count, &out);
     const cdouble* xs = nullptr;
@@ -132,7 +106,7 @@ Status ComplexInverse(Handle x, Handle& y, void** cell, int32_t shift) {
         source = unrotated.get();
     }
     if (s == 0)
-        s = tw::FftComplexInverse(table.table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, count);
+        s = tw::FftComplexInverse(table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, count);
     return f.Finish(tw::MergeRelease(s, unrotated.Release()));
 }
 
@@ -144,8 +118,9 @@ Status RealInverse(Handle x, Handle& y, void** cell, int32_t shift) {
     f.Output<cdouble>(y);
     const int32_t count = tw::Count(x);
     Status s = count < 1 ? EmptyArrayErr : 0;
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, count);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, count, &table);
     tw::Scratch<double> packed;
     if (s == 0) s = packed.Allocate(static_cast<size_t>(count));
     double* out = nullptr;
@@ -154,7 +129,7 @@ Status RealInverse(Handle x, Handle& y, void** cell, int32_t shift) {
     if (s == 0) s = f.In(x, &xs);
     if (s == 0) {
         tw::FftPackHalfComplex(xs, count, shift, packed.get());
-        s = tw::FftRealInverse(table.table, packed.get(), out, 1, 1, count);
+        s = tw::FftRealInverse(table, packed.get(), out, 1, 1, count);
     }
     return f.Finish(tw::MergeRelease(s, packed.Release()));
 }
@@ -167,11 +142,12 @@ Status PackedForward(Handle x, Handle& y, void** cell) {
     Status s = count < 1 ? EmptyArrayErr : 0;
     double* out = nullptr;
     if (s == 0) s = f.Resize(y, count, &out);
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, count);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, count, &table);
     const double* xs = nullptr;
     if (s == 0) s = f.In(x, &xs);
-    if (s == 0) s = tw::FftRealForward(table.table, xs, out, 1, 1, count);
+    if (s == 0) s = tw::FftRealForward(table, xs, out, 1, 1, count);
     return f.Finish(s);
 }
 
@@ -184,11 +160,12 @@ Status PackedInverse(Handle& x, Handle& y, void** cell) {
     Status s = count < 1 ? EmptyArrayErr : 0;
     double* out = nullptr;
     if (s == 0) s = f.Resize(y, count, &out);
-    CallTable table;
-    if (s == 0) s = table.Acquire(cell, InstanceData, count);
+    tw::CachedTables tables(cell, InstanceData);
+    tw::FftTable* table = nullptr;
+    if (s == 0) s = tables.Acquire(0, count, &table);
     double* xs = nullptr;
     if (s == 0) s = f.InPlace(x, &xs);
-    if (s == 0) s = tw::FftRealInverse(table.table, xs, out, 1, 1, count);
+    if (s == 0) s = tw::FftRealInverse(table, xs, out, 1, 1, count);
     return f.Finish(s);
 }
 

@@ -1,4 +1,4 @@
-#include "transform/cached_tables.hpp"
+#include "transform/fft/cached_tables.hpp"
 
 #include "frame/frame.hpp"
 #include "transform/fft/holder.hpp"
