@@ -42,6 +42,10 @@ struct FftStage {
     double* raderKernelIm;
     int32_t* raderGather;
     int32_t* raderScatter;
+    // The twiddles once more, in the order the combine kernels read them: the pair for (j, k)
+    // at (k-1)(m-1) + (j-1), so that neighbouring columns j are neighbours in memory.
+    double* laneTwiddleRe;
+    double* laneTwiddleIm;
 };
 
 struct FftTable {

@@ -24,6 +24,8 @@ void ReleaseParts(FftTable* t) {
         PlainFree(st->oddSin);
         PlainFree(st->twiddleRe);
         PlainFree(st->twiddleIm);
+        PlainFree(st->laneTwiddleRe);
+        PlainFree(st->laneTwiddleIm);
         ReleaseRaderStage(st);
         PlainFree(st);
     }
@@ -52,10 +54,20 @@ bool BuildStages(FftTable* t) {
         const size_t count = static_cast<size_t>(r - 1) * static_cast<size_t>(m - 1);
         st->twiddleRe = AllocDoubles(count);
         st->twiddleIm = AllocDoubles(count);
-        if (st->twiddleRe == nullptr || st->twiddleIm == nullptr) return false;
+        st->laneTwiddleRe = AllocDoubles(count);
+        st->laneTwiddleIm = AllocDoubles(count);
+        if (st->twiddleRe == nullptr || st->twiddleIm == nullptr || st->laneTwiddleRe == nullptr ||
+            st->laneTwiddleIm == nullptr)
+            return false;
         for (int32_t c = 1; c < r; ++c) {
             const long double theta = static_cast<long double>(c) * static_cast<long double>(kTwoPi) / length;
             ExpRun(theta, 1, m - 1, st->twiddleRe + (c - 1), st->twiddleIm + (c - 1), r - 1);
+            for (int32_t j = 1; j < m; ++j) {
+                const size_t from = static_cast<size_t>(j - 1) * static_cast<size_t>(r - 1) + static_cast<size_t>(c - 1);
+                const size_t to = static_cast<size_t>(c - 1) * static_cast<size_t>(m - 1) + static_cast<size_t>(j - 1);
+                st->laneTwiddleRe[to] = st->twiddleRe[from];
+                st->laneTwiddleIm[to] = st->twiddleIm[from];
+            }
         }
         length = m;
     }

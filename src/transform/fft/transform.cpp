@@ -126,22 +126,22 @@ Status Leaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff
 Status Combine(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int32_t m) {
     const FftStage* st = t->stages[i];
     if (t->kinds[i] == KindCodelet) {
-        t->combineReal[i](data.p, st->twiddleRe, st->twiddleIm, s, m);
+        t->combineReal[i](data.p, st->laneTwiddleRe, st->laneTwiddleIm, s, m);
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return sse2::RealCombineForm<sse2::ScalarLanes>(d, data.p, st->twiddleRe, st->twiddleIm, s, m);
+        return sse2::RealCombineForm<sse2::ScalarLanes>(d, data.p, st->laneTwiddleRe, st->laneTwiddleIm, s, m);
     });
 }
 
 Status Combine(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32_t m) {
     const FftStage* st = t->stages[i];
     if (t->kinds[i] == KindCodelet) {
-        t->combineComplex[i](data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
+        t->combineComplex[i](data.re, data.im, st->laneTwiddleRe, st->laneTwiddleIm, s, m);
         return 0;
     }
     return WithGeneric(t, i, [&](GenericDft& d) {
-        return sse2::ComplexCombineForm<sse2::ScalarLanes>(d, data.re, data.im, st->twiddleRe, st->twiddleIm, s, m);
+        return sse2::ComplexCombineForm<sse2::ScalarLanes>(d, data.re, data.im, st->laneTwiddleRe, st->laneTwiddleIm, s, m);
     });
 }
 

@@ -60,18 +60,25 @@ struct ComplexOut {
     }
 };
 
-// An input whose element j >= 1 is multiplied by the twiddle at j of its column; w points one
-// before the column's first twiddle, neighbouring columns' twiddles stand wlane apart.
+// The twiddles of the combines come in the lane order of FftStage::laneTwiddleRe/Im: the one at
+// element j of column c stands at (j-1)(m-1) + (c-1), so neighbouring columns load as one vector.
+// Offset, within those arrays, of column c's "element 0" (one row before its first twiddle).
+inline ptrdiff_t ColumnTwiddles(int32_t c, int32_t m) {
+    return static_cast<ptrdiff_t>(c - 1) - static_cast<ptrdiff_t>(m - 1);
+}
+
+// An input whose element j >= 1 is multiplied by the twiddle at j of its column; w is the
+// column's ColumnTwiddles offset, rows of twiddles stand wstep apart.
 template <class L, class In>
 struct TwiddledIn {
     using V = typename L::V;
     In data;
     const double* wr;
     const double* wi;
-    ptrdiff_t wlane;
+    ptrdiff_t wstep;
     TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
         data.C(j, r, i);
-        if (j > 0) Twiddle(r, i, L::Load(wr + j, wlane), L::Load(wi + j, wlane));
+        if (j > 0) Twiddle(r, i, L::LoadUnit(wr + j * wstep), L::LoadUnit(wi + j * wstep));
     }
 };
 
@@ -147,15 +154,15 @@ struct MiddleColumnIn {
     const double* p;
     const double* wr;
     const double* wi;
-    ptrdiff_t ms;
+    ptrdiff_t ms, wstep;
     TW_FFT_INLINE void C(int32_t j, double& re, double& im) const {
         if (j == 0) {
             re = p[0];
             im = 0.0;
         } else {
             const double v = p[j * ms];
-            re = v * wr[j];
-            im = v * wi[j];
+            re = v * wr[j * wstep];
+            im = v * wi[j * wstep];
         }
     }
 };
@@ -254,15 +261,14 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
     return 0;
 }
 
-// Columns j..m-1 (j >= 1) of a complex combine; column j takes the twiddles at (j-1)(r-1).
+// Columns j..m-1 (j >= 1) of a complex combine.
 template <class L, bool Pair, class P>
 Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                           ptrdiff_t s, int32_t m, int32_t& j) {
-    const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
     for (; j + L::kWidth <= m; j += L::kWidth) {
-        const ptrdiff_t w = static_cast<ptrdiff_t>(j - 1) * (r - 1) - 1;
-        const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, r - 1};
+        const ptrdiff_t w = ColumnTwiddles(j, m);
+        const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, m - 1};
         const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
@@ -281,10 +287,10 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
     for (; k + L::kWidth <= pairs + 1; k += L::kWidth) {
-        const ptrdiff_t w = static_cast<ptrdiff_t>(k - 1) * (r - 1) - 1;
+        const ptrdiff_t w = ColumnTwiddles(k, m);
         double* front = data + k * s;
         double* back = data + (m - k) * s;
-        const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, r - 1};
+        const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
         const PairColumnOut<L, Unit> out{front, back, ms, s, r};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
@@ -306,9 +312,9 @@ Status RealCombineEdges(const P& p, double* data, const double* twRe, const doub
     if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0}))
         return st;
     if (m % 2 != 0) return 0;
-    const ptrdiff_t w = static_cast<ptrdiff_t>(m / 2 - 1) * (r - 1) - 1;
+    const ptrdiff_t w = ColumnTwiddles(m / 2, m);
     double* mid = data + (m / 2) * s;
-    return RunComplex<double>(p, MiddleColumnIn{mid, twRe + w, twIm + w, ms}, MiddleColumnOut{mid, ms, r});
+    return RunComplex<double>(p, MiddleColumnIn{mid, twRe + w, twIm + w, ms, m - 1}, MiddleColumnOut{mid, ms, r});
 }
 
 // Whole forms, and the forms from sub-transform or column `from` on. Interleaved complex data take
