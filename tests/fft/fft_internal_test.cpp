@@ -228,8 +228,9 @@ TEST(FftTransforms, SizeMismatchIsRefusedWithTheTwoStatuses) {
 
 TEST(FftPacking, CentredUnpackAndPackAreInverse) {
     // Half-complex of length 4: X0 = 1, X1 = 2 + 3i, X2 = 4.
-    std::complex<double> cells[4] = {{1, 9}, {2, 9}, {4, 9}, {3, 9}};
-    tw::FftUnpackHalfComplex(cells, 4, 1);
+    const double half[4] = {1, 2, 4, 3};
+    std::complex<double> cells[4];
+    tw::FftUnpackHalfComplex(half, 4, 1, cells);
     EXPECT_EQ(cells[2], std::complex<double>(1, 0));
     EXPECT_EQ(cells[0], std::complex<double>(4, 0));
     EXPECT_EQ(cells[3], std::complex<double>(2, 3));
@@ -238,8 +239,8 @@ TEST(FftPacking, CentredUnpackAndPackAreInverse) {
         for (int32_t shift : {0, 1}) {
             std::vector<std::complex<double>> c(static_cast<size_t>(n));
             std::vector<double> h(static_cast<size_t>(n)), back(h.size());
-            for (int32_t i = 0; i < n; ++i) c[i] = h[i] = 0.5 + i * i;
-            tw::FftUnpackHalfComplex(c.data(), n, shift);
+            for (int32_t i = 0; i < n; ++i) h[i] = 0.5 + i * i;
+            tw::FftUnpackHalfComplex(h.data(), n, shift, c.data());
             tw::FftPackHalfComplex(c.data(), n, shift, back.data());
             EXPECT_EQ(back, h) << n << " " << shift;
         }

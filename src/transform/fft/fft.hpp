@@ -89,9 +89,9 @@ Status FftComplexForward(const FftTable* t, const double* inRe, const double* in
 Status FftComplexInverse(const FftTable* t, const double* inRe, const double* inIm, double* outRe,
                          double* outIm, ptrdiff_t inStride, ptrdiff_t outStride, int32_t n);
 
-// n complex cells holding a half-complex sequence in their real lanes become the spectrum, in the
-// usual order (shift 0) or centred with X[0] at n/2.
-void FftUnpackHalfComplex(std::complex<double>* data, int32_t n, int32_t shift);
+// The spectrum of a half-complex sequence h of length n, in the usual order (shift 0) or centred
+// with X[0] at n/2.
+void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out);
 // The reverse: reads only the non-negative frequencies of a spectrum in either order.
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out);
 

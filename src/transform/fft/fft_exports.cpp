@@ -41,16 +41,19 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
     if (s == 0) s = f.Resize(y, size, &out);
     const double* xs = nullptr;
     if (s == 0) s = f.In(x, &xs);
-    tw::Scratch<double> padded;
+    // One block for the half-complex result (transformed at unit stride, where the kernels are
+    // fastest, then unpacked into y) and, when the window reaches past x, the zero-padded input.
+    const bool pad = size > count - start;
+    tw::Scratch<double> work;
+    if (s == 0) s = work.Allocate(static_cast<size_t>(size) * (pad ? 2 : 1));
     const double* source = xs + (s == 0 ? start : 0);
-    if (s == 0 && size > count - start) {
-        s = padded.Allocate(static_cast<size_t>(size));
-        if (s == 0) CopyWindow(xs, count, start, size, padded.get());
-        source = padded.get();
+    if (s == 0 && pad) {
+        CopyWindow(xs, count, start, size, work.get() + size);
+        source = work.get() + size;
     }
-    if (s == 0) s = tw::FftRealForward(table, source, Lanes(out), 1, 2, size);
-    if (s == 0) tw::FftUnpackHalfComplex(out, size, shift);
-    return f.Finish(tw::MergeRelease(s, padded.Release()));
+    if (s == 0) s = tw::FftRealForward(table, source, work.get(), 1, 1, size);
+    if (s == 0) tw::FftUnpackHalfComplex(work.get(), size, shift, out);
+    return f.Finish(tw::MergeRelease(s, work.Release()));
 }
 
 template <bool InstanceData>

@@ -232,16 +232,16 @@ Status FftRealInverse(const FftTable* t, double* in, double* out, ptrdiff_t inSt
     return 0;
 }
 
-void FftUnpackHalfComplex(std::complex<double>* data, int32_t n, int32_t shift) {
+void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out) {
+    // The centred order puts X[k] at (k + n/2) mod n, so X[0] is at n/2 for both parities.
+    const int32_t o = shift != 0 ? n / 2 : 0;
+    const auto at = [&](int32_t k) -> std::complex<double>& { return out[k + o < n ? k + o : k + o - n]; };
+    at(0) = {h[0], 0.0};
     for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
-        const double re = data[k].real(), im = data[n - k].real();
-        data[k] = {re, im};
-        data[n - k] = {re, -im};
+        at(k) = {h[k], h[n - k]};
+        at(n - k) = {h[k], -h[n - k]};
     }
-    data[0] = {data[0].real(), 0.0};
-    if (n % 2 == 0) data[n / 2] = {data[n / 2].real(), 0.0};
-    // The centred order puts X[0] at n/2 for both parities (the lower half goes behind the upper).
-    if (shift != 0) std::rotate(data, data + (n - n / 2), data + n);
+    if (n % 2 == 0) at(n / 2) = {h[n / 2], 0.0};
 }
 
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out) {
