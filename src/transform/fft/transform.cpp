@@ -233,15 +233,16 @@ Status FftRealInverse(const FftTable* t, double* in, double* out, ptrdiff_t inSt
 }
 
 void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out) {
-    // The centred order puts X[k] at (k + n/2) mod n, so X[0] is at n/2 for both parities.
+    // Centred, X[k] goes to (k + n/2) mod n, so X[0] is at n/2 for both parities: the frequencies
+    // up to the middle then fill the back, those above it the front. Each part is a plain run.
+    const int32_t half = (n - 1) / 2;
     const int32_t o = shift != 0 ? n / 2 : 0;
-    const auto at = [&](int32_t k) -> std::complex<double>& { return out[k + o < n ? k + o : k + o - n]; };
-    at(0) = {h[0], 0.0};
-    for (int32_t k = 1; k <= (n - 1) / 2; ++k) {
-        at(k) = {h[k], h[n - k]};
-        at(n - k) = {h[k], -h[n - k]};
-    }
-    if (n % 2 == 0) at(n / 2) = {h[n / 2], 0.0};
+    const int32_t up = shift != 0 ? o - n : 0;  // where X[k], k > n/2, goes: k + up
+    std::complex<double>* low = out + o;
+    low[0] = {h[0], 0.0};
+    for (int32_t k = 1; k <= half; ++k) low[k] = {h[k], h[n - k]};
+    for (int32_t k = n - half; k < n; ++k) out[k + up] = {h[n - k], -h[k]};
+    if (n % 2 == 0) out[(n / 2 + o) % n] = {h[n / 2], 0.0};
 }
 
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out) {
