@@ -88,88 +88,84 @@ Status ComplexForward(Handle x, Handle& y, void** cell, int32_t start, int32_t s
     return f.Finish(tw::MergeRelease(s, padded.Release()));
 }
 
+// The opening of the exports that transform the whole of x: x must not be empty, the table of
+// its length comes from the cell, and y is resized to as many elements. Its frame fails on any
+// non-zero status; y shrinks with the complex type code, f64 outputs included (the block is
+// emptied all the same).
+struct WholeLength {
+    Frame f{tw::FailOn::NonZero};
+    tw::CachedTables tables;
+    tw::FftTable* table = nullptr;
+    const int32_t count;
+    Status s;
+
+    template <class Out>
+    WholeLength(Handle x, Handle& y, void** cell, bool instanceData, Out** out)
+        : tables(cell, instanceData), count(tw::Count(x)) {
+        f.Output<cdouble>(y);
+        s = count < 1 ? EmptyArrayErr : 0;
+        if (s == 0) s = tables.Acquire(0, count, &table);
+        if (s == 0) s = f.Resize(y, count, out);
+    }
+};
+
 template <bool InstanceData>
 Status ComplexInverse(Handle x, Handle& y, void** cell, int32_t shift) {
-    Frame f(tw::FailOn::NonZero);
-    f.Output<cdouble>(y);
-    const int32_t count = tw::Count(x);
-    Status s = count < 1 ? EmptyArrayErr : 0;
-    tw::CachedTables tables(cell, InstanceData);
-    tw::FftTable* table = nullptr;
-    if (s == 0) s = tables.Acquire(0, count, &table);
     cdouble* out = nullptr;
-    if (s == 0) s = f.Resize(y, count, &out);
+    WholeLength w(x, y, cell, InstanceData, &out);
     const cdouble* xs = nullptr;
-    if (s == 0) s = f.In(x, &xs);
+    Status s = w.s;
+    if (s == 0) s = w.f.In(x, &xs);
     tw::Scratch<cdouble> unrotated;
     const cdouble* source = xs;
     if (s == 0 && shift != 0) {
-        s = unrotated.Allocate(static_cast<size_t>(count));
-        if (s == 0) std::rotate_copy(xs, xs + count / 2, xs + count, unrotated.get());
+        s = unrotated.Allocate(static_cast<size_t>(w.count));
+        if (s == 0) std::rotate_copy(xs, xs + w.count / 2, xs + w.count, unrotated.get());
         source = unrotated.get();
     }
     if (s == 0)
-        s = tw::FftComplexInverse(table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, count);
-    return f.Finish(tw::MergeRelease(s, unrotated.Release()));
+        s = tw::FftComplexInverse(w.table, Lanes(source), Lanes(source) + 1, Lanes(out), Lanes(out) + 1, 2, 2, w.count);
+    return w.f.Finish(tw::MergeRelease(s, unrotated.Release()));
 }
 
-// The real-output inverses and the packed exports shrink their f64 output with the complex type
-// code on failure; the block is emptied all the same.
 template <bool InstanceData>
 Status RealInverse(Handle x, Handle& y, void** cell, int32_t shift) {
-    Frame f(tw::FailOn::NonZero);
-    f.Output<cdouble>(y);
-    const int32_t count = tw::Count(x);
-    Status s = count < 1 ? EmptyArrayErr : 0;
-    tw::CachedTables tables(cell, InstanceData);
-    tw::FftTable* table = nullptr;
-    if (s == 0) s = tables.Acquire(0, count, &table);
-    tw::Scratch<double> packed;
-    if (s == 0) s = packed.Allocate(static_cast<size_t>(count));
     double* out = nullptr;
-    if (s == 0) s = f.Resize(y, count, &out);
+    WholeLength w(x, y, cell, InstanceData, &out);
+    tw::Scratch<double> packed;
+    Status s = w.s;
+    if (s == 0) s = packed.Allocate(static_cast<size_t>(w.count));
     const cdouble* xs = nullptr;
-    if (s == 0) s = f.In(x, &xs);
+    if (s == 0) s = w.f.In(x, &xs);
     if (s == 0) {
-        tw::FftPackHalfComplex(xs, count, shift, packed.get());
-        s = tw::FftRealInverse(table, packed.get(), out, 1, 1, count);
+        tw::FftPackHalfComplex(xs, w.count, shift, packed.get());
+        s = tw::FftRealInverse(w.table, packed.get(), out, 1, 1, w.count);
     }
-    return f.Finish(tw::MergeRelease(s, packed.Release()));
+    return w.f.Finish(tw::MergeRelease(s, packed.Release()));
 }
 
 template <bool InstanceData>
 Status PackedForward(Handle x, Handle& y, void** cell) {
-    Frame f(tw::FailOn::NonZero);
-    f.Output<cdouble>(y);
-    const int32_t count = tw::Count(x);
-    Status s = count < 1 ? EmptyArrayErr : 0;
     double* out = nullptr;
-    if (s == 0) s = f.Resize(y, count, &out);
-    tw::CachedTables tables(cell, InstanceData);
-    tw::FftTable* table = nullptr;
-    if (s == 0) s = tables.Acquire(0, count, &table);
+    WholeLength w(x, y, cell, InstanceData, &out);
     const double* xs = nullptr;
-    if (s == 0) s = f.In(x, &xs);
-    if (s == 0) s = tw::FftRealForward(table, xs, out, 1, 1, count);
-    return f.Finish(s);
+    Status s = w.s;
+    if (s == 0) s = w.f.In(x, &xs);
+    if (s == 0) s = tw::FftRealForward(w.table, xs, out, 1, 1, w.count);
+    return w.f.Finish(s);
 }
 
+// x is worked on in place, so it is an output too.
 template <bool InstanceData>
 Status PackedInverse(Handle& x, Handle& y, void** cell) {
-    Frame f(tw::FailOn::NonZero);
-    f.Output<double>(x);
-    f.Output<cdouble>(y);
-    const int32_t count = tw::Count(x);
-    Status s = count < 1 ? EmptyArrayErr : 0;
     double* out = nullptr;
-    if (s == 0) s = f.Resize(y, count, &out);
-    tw::CachedTables tables(cell, InstanceData);
-    tw::FftTable* table = nullptr;
-    if (s == 0) s = tables.Acquire(0, count, &table);
+    WholeLength w(x, y, cell, InstanceData, &out);
+    w.f.Output<double>(x);
     double* xs = nullptr;
-    if (s == 0) s = f.InPlace(x, &xs);
-    if (s == 0) s = tw::FftRealInverse(table, xs, out, 1, 1, count);
-    return f.Finish(s);
+    Status s = w.s;
+    if (s == 0) s = w.f.InPlace(x, &xs);
+    if (s == 0) s = tw::FftRealInverse(w.table, xs, out, 1, 1, w.count);
+    return w.f.Finish(s);
 }
 
 }  // namespace
