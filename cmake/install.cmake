@@ -27,3 +27,12 @@ install(FILES ${CMAKE_BINARY_DIR}/twanlys.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}
 if(TW_APPS)
   set_target_properties(twa PROPERTIES INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
 endif()
+
+# The Python package, with the prefix it was installed with, so that it finds the library there.
+option(TW_PYTHON "Install the Python package under <prefix>/lib/python3/dist-packages" ON)
+if(TW_PYTHON)
+  set(TW_PYTHON_DIR ${CMAKE_INSTALL_LIBDIR}/python3/dist-packages)
+  install(DIRECTORY python/twanlys DESTINATION ${TW_PYTHON_DIR} PATTERN __pycache__ EXCLUDE)
+  install(CODE "file(WRITE \"\$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${TW_PYTHON_DIR}/twanlys/_installed.py\"
+    \"PREFIX = '\${CMAKE_INSTALL_PREFIX}'\\n\")")
+endif()

@@ -23,4 +23,16 @@ g++ -std=c++20 "$src/tests/install/consumer/main.cpp" $(pkg-config --cflags --li
 cmake -S "$src/tests/install/consumer" -B "$work/consumer" -DCMAKE_PREFIX_PATH="$prefix" >/dev/null
 cmake --build "$work/consumer" >/dev/null
 "$work/consumer/consumer"
-echo "install: pkg-config and find_package consumers run against $prefix"
+# Python: the installed package finds the library in its own prefix; a pip-installed copy finds it
+# through TWANLYS_PREFIX and through the loader's search path (the soname).
+unset TWANLYS_LIB_DIR TWANLYS_PREFIX
+probe='import numpy as np, twanlys as tw
+x = tw.array(np.array([3.0, 1, 2, 4])); m, s = tw.f64(), tw.i32()
+tw.lib.Median_head(x, m.ref, s.ref); assert (m.value, s.value) == (2.5, 0), (m.value, s.value)'
+(cd "$work" && PYTHONPATH="$lib/python3/dist-packages" /usr/bin/python3 -c "$probe")
+/usr/bin/python3 -m venv --system-site-packages "$work/venv"
+cp -r "$src/python" "$work/python"  # pip builds in the tree it is given
+"$work/venv/bin/pip" install -q --no-build-isolation --no-index "$work/python" >/dev/null
+(cd "$work" && TWANLYS_PREFIX="$prefix" "$work/venv/bin/python" -c "$probe")
+(cd "$work" && LD_LIBRARY_PATH="$lib" "$work/venv/bin/python" -c "$probe")
+echo "install: pkg-config, find_package and Python consumers run against $prefix"
