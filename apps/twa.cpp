@@ -1,6 +1,5 @@
-// twa: runs the library on a built-in signal and prints a readable report.
-//   twa demo               statistics, histogram and window of the built-in signal
-//   twa window NAME N      a window of length N and its constants (NAME: number or name)
+// twa: the library from the command line, on a built-in signal or on a user's CSV or WAV file.
+// `twa help` lists the commands; `twa COMMAND --help` describes one.
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
@@ -15,6 +14,9 @@
 #include "twanlys/transforms.h"
 #include "twanlys/windows.h"
 #include "twrt.hpp"
+
+#include "data.hpp"
+#include "plot.hpp"
 
 namespace {
 
@@ -117,39 +119,257 @@ int Demo() {
     return 0;
 }
 
-int WindowCommand(const char* name, const char* length) {
-    int32_t number = -1;
-    char* rest = nullptr;
-    const long asNumber = std::strtol(name, &rest, 10);
-    if (rest != name && *rest == '\0') number = static_cast<int32_t>(asNumber);
-    for (const NamedWindow& w : kWindows)
-        if (std::strcmp(w.name, name) == 0) number = w.number;
-    const int32_t n = std::atoi(length);
-    Array1D<double> w(std::vector<double>(static_cast<size_t>(n > 0 ? n : 0), 1.0));
-    const int32_t status = AllWinH(w.h(), number, NAN, 0, 0);
-    if (status != 0) {
-        std::fprintf(stderr, "twa: window %s of length %s failed with status %d\n", name, length, status);
-        return 1;
+// ---- command line ----------------------------------------------------------------------------
+
+// Positional arguments and --key value options (a bare --key is "1").
+struct Args {
+    std::vector<std::string> positional;
+    std::vector<std::pair<std::string, std::string>> options;
+    std::string Get(const std::string& key, const std::string& fallback = "") const {
+        for (const auto& [k, v] : options)
+            if (k == key) return v;
+        return fallback;
     }
+    bool Has(const std::string& key) const {
+        for (const auto& o : options)
+            if (o.first == key) return true;
+        return false;
+    }
+};
+
+Args Parse(int argc, char** argv, const std::vector<std::string>& flags) {
+    Args a;
+    for (int i = 2; i < argc; ++i) {
+        const std::string s = argv[i];
+        if (s.rfind("--", 0) != 0 || s.size() == 2) {
+            a.positional.push_back(s);
+            continue;
+        }
+        const std::string key = s.substr(2);
+        bool flag = key == "help";
+        for (const std::string& f : flags) flag = flag || f == key;
+        a.options.emplace_back(key, flag || i + 1 >= argc ? std::string("1") : std::string(argv[++i]));
+    }
+    return a;
+}
+
+int Fail(const std::string& message) {
+    std::fprintf(stderr, "twa: %s\n", message.c_str());
+    return 1;
+}
+
+int UsageError(const std::string& message, const char* usage) {
+    std::fprintf(stderr, "twa: %s\nusage: %s\n", message.c_str(), usage);
+    return 2;
+}
+
+bool ToInt(const std::string& s, int32_t* v) {
+    char* end = nullptr;
+    const long n = std::strtol(s.c_str(), &end, 10);
+    if (s.empty() || *end != '\0' || n < INT32_MIN || n > INT32_MAX) return false;
+    *v = static_cast<int32_t>(n);
+    return true;
+}
+
+bool ToDouble(const std::string& s, double* v) {
+    char* end = nullptr;
+    *v = std::strtod(s.c_str(), &end);
+    return !s.empty() && *end == '\0';
+}
+
+// A window by name or number; -1 if neither.
+int32_t WindowNumber(const std::string& name) {
+    int32_t number = -1;
+    if (ToInt(name, &number)) return number;
+    for (const NamedWindow& w : kWindows)
+        if (name == w.name) return w.number;
+    return -1;
+}
+
+std::string WindowNames() {
+    std::string names;
+    for (const NamedWindow& w : kWindows) names += std::string(names.empty() ? "" : " ") + w.name;
+    return names;
+}
+
+// The columns a command works on: the one named by --column, or all.
+bool LoadColumns(const Args& a, twa::Table* table, std::vector<int>* which, std::string* error) {
+    if (!twa::ReadTable(a.positional[0], table, error)) return false;
+    which->clear();
+    if (!a.Has("column")) {
+        for (size_t c = 0; c < table->columns.size(); ++c) which->push_back(static_cast<int>(c));
+        return true;
+    }
+    const int c = twa::FindColumn(*table, a.Get("column"), error);
+    if (c < 0) return false;
+    which->push_back(c);
+    return true;
+}
+
+// ---- commands --------------------------------------------------------------------------------
+
+constexpr const char* kWindowUsage = "twa window NAME N [--plot FILE.svg|png]";
+constexpr const char* kWindowHelp =
+    "Prints a window of N samples as CSV (index,value) after a comment line with its equivalent\n"
+    "noise bandwidth (bins) and coherent gain. NAME is a window number or one of:\n  %s\n"
+    "--plot FILE   also draws the window (gnuplot) into FILE.svg or FILE.png\n";
+
+int WindowCommand(const Args& a) {
+    if (a.positional.size() != 2) return UsageError("window takes a name and a length", kWindowUsage);
+    const int32_t number = WindowNumber(a.positional[0]);
+    int32_t n = 0;
+    if (number < 0) return UsageError("unknown window \"" + a.positional[0] + "\"", kWindowUsage);
+    if (!ToInt(a.positional[1], &n) || n < 1)
+        return UsageError("the length must be a positive integer", kWindowUsage);
+    Array1D<double> w(std::vector<double>(static_cast<size_t>(n), 1.0));
+    const int32_t status = AllWinH(w.h(), number, NAN, 0, 0);
+    if (status != 0) return Fail("window " + a.positional[0] + " failed with status " + std::to_string(status));
     WindowConstants c{};
     WinConstByNameH_2016(n, number, NAN, &c);
-    std::printf("window %d, %d samples: ENBW %.6f bins, coherent gain %.6f\n", number, n, c.enbw,
-                c.coherentGain);
-    for (int32_t i = 0; i < w.size(); ++i) std::printf("%6d  % .17g\n", i, w[i]);
+    std::printf("# window %d, %d samples: ENBW %.6f bins, coherent gain %.6f\nindex,value\n", number, n,
+                c.enbw, c.coherentGain);
+    std::vector<double> index, value = w.vec();
+    for (int32_t i = 0; i < n; ++i) {
+        std::printf("%d,%.17g\n", i, value[static_cast<size_t>(i)]);
+        index.push_back(i);
+    }
+    std::string error;
+    if (a.Has("plot") && !twa::Plot(a.Get("plot"), {"window " + a.positional[0], "sample", "value", true},
+                                    index, value, &error))
+        return Fail(error);
     return 0;
 }
 
-int Usage() {
-    std::fprintf(stderr, "usage: twa demo\n       twa window NAME N   (NAME: a number or one of");
-    for (const NamedWindow& w : kWindows) std::fprintf(stderr, " %s", w.name);
-    std::fprintf(stderr, ")\n");
-    return 2;
+constexpr const char* kStatsUsage = "twa stats FILE [--column C]";
+constexpr const char* kStatsHelp =
+    "Prints, as CSV, the count, mean, rms, median, population variance, minimum and maximum of each\n"
+    "column of FILE (CSV with an optional header row, or WAV).\n"
+    "--column C   only column C (a 1-based number or a header name)\n";
+
+int StatsCommand(const Args& a) {
+    if (a.positional.size() != 1) return UsageError("stats takes one file", kStatsUsage);
+    twa::Table table;
+    std::vector<int> which;
+    std::string error;
+    if (!LoadColumns(a, &table, &which, &error)) return Fail(error);
+    std::printf("column,count,mean,rms,median,variance,min,max\n");
+    for (int c : which) {
+        const std::vector<double>& v = table.columns[static_cast<size_t>(c)];
+        const Array1D<double> x(v);
+        double mean, rms, median, variance;
+        int32_t s1, s2, s3, s4, order = 2;
+        Mean_head(x.h(), &mean, &s1);
+        RMS_head(x.h(), &rms, &s2);
+        Median_head(x.h(), &median, &s3);
+        Moment_head(x.h(), &order, &variance, &s4);
+        const auto [lo, hi] = std::minmax_element(v.begin(), v.end());
+        std::printf("%s,%zu,%.17g,%.17g,%.17g,%.17g,%.17g,%.17g\n", table.names[static_cast<size_t>(c)].c_str(),
+                    v.size(), mean, rms, median, variance, *lo, *hi);
+        // A NaN in the data makes the median fail; the other figures stand as computed.
+        if (s3 != 0) std::fprintf(stderr, "twa: column %s: median failed with status %d\n",
+                                  table.names[static_cast<size_t>(c)].c_str(), s3);
+    }
+    return 0;
+}
+
+constexpr const char* kSpectrumUsage =
+    "twa spectrum FILE [--column C] [--window NAME] [--size N] [--rate HZ] [--plot FILE.svg|png]";
+constexpr const char* kSpectrumHelp =
+    "Prints the one-sided power spectrum of a column of FILE (CSV or WAV) as CSV:\n"
+    "frequency,power,power_db. The power is corrected for the window's coherent gain, so a sine of\n"
+    "amplitude A reads A^2/2 at its frequency; dB are relative to 1 unit^2.\n"
+    "--column C     the column (default 1)\n"
+    "--window NAME  the window (default hann; see twa window --help)\n"
+    "--size N       transform the first N samples, zero-padded if the column is shorter\n"
+    "--rate HZ      samples per second (default: the WAV file's rate, else 1)\n"
+    "--plot FILE    also draws the spectrum in dB (gnuplot) into FILE.svg or FILE.png\n";
+
+int SpectrumCommand(const Args& a) {
+    if (a.positional.size() != 1) return UsageError("spectrum takes one file", kSpectrumUsage);
+    const int32_t window = WindowNumber(a.Get("window", "hann"));
+    if (window < 0) return UsageError("unknown window \"" + a.Get("window") + "\"", kSpectrumUsage);
+    int32_t size = 0;
+    if (a.Has("size") && (!ToInt(a.Get("size"), &size) || size < 1))
+        return UsageError("--size must be a positive integer", kSpectrumUsage);
+    double rate = 0;
+    if (a.Has("rate") && (!ToDouble(a.Get("rate"), &rate) || !(rate > 0)))
+        return UsageError("--rate must be a positive number", kSpectrumUsage);
+    twa::Table table;
+    std::string error;
+    if (!twa::ReadTable(a.positional[0], &table, &error)) return Fail(error);
+    const int c = twa::FindColumn(table, a.Get("column", "1"), &error);
+    if (c < 0) return Fail(error);
+    if (rate == 0) rate = table.rate > 0 ? table.rate : 1.0;
+    std::vector<double> v = table.columns[static_cast<size_t>(c)];
+    if (size > 0) v.resize(static_cast<size_t>(size), 0.0);
+    const auto n = static_cast<int32_t>(v.size());
+
+    Array1D<double> power(v);
+    int32_t status = AllWinH(power.h(), window, NAN, 0, 0);
+    WindowConstants k{};
+    WinConstByNameH_2016(n, window, NAN, &k);
+    void* cell = nullptr;
+    if (status == 0) status = SpectrumH(power.h(), &cell);
+    TWRTRunCleanups(2);  // the FFT table cached in the cell goes with this call site
+    if (status != 0) return Fail("spectrum failed with status " + std::to_string(status));
+
+    const double gain2 = k.coherentGain * k.coherentGain;
+    std::vector<double> freq, db;
+    std::printf("frequency,power,power_db\n");
+    for (int32_t i = 0; i <= n / 2; ++i) {
+        const bool single = i == 0 || 2 * i == n;  // DC and Nyquist have no mirror image
+        const double p = (single ? 1.0 : 2.0) * power[i] / gain2;
+        freq.push_back(i * rate / n);
+        db.push_back(10 * std::log10(p));
+        std::printf("%.17g,%.17g,%.6f\n", freq.back(), p, db.back());
+    }
+    const std::string unit = table.rate > 0 || a.Has("rate") ? "frequency (Hz)" : "frequency (cycles/sample)";
+    if (a.Has("plot") && !twa::Plot(a.Get("plot"), {"power spectrum of " + table.names[static_cast<size_t>(c)],
+                                                    unit, "power (dB)", true},
+                                    freq, db, &error))
+        return Fail(error);
+    return 0;
+}
+
+struct Command {
+    const char* name;
+    int (*run)(const Args&);
+    const char* usage;
+    const char* help;
+    std::vector<std::string> flags;
+};
+
+int DemoCommand(const Args&) { return Demo(); }
+
+const Command kCommands[] = {
+    {"demo", DemoCommand, "twa demo", "Statistics, histogram and windowed spectrum of a built-in signal.\n", {}},
+    {"stats", StatsCommand, kStatsUsage, kStatsHelp, {}},
+    {"spectrum", SpectrumCommand, kSpectrumUsage, kSpectrumHelp, {}},
+    {"window", WindowCommand, kWindowUsage, kWindowHelp, {}},
+};
+
+int Help() {
+    std::printf("twa: the twanlys library from the command line\n\n");
+    for (const Command& c : kCommands) std::printf("  %s\n", c.usage);
+    std::printf("\n`twa COMMAND --help` describes a command. Exit status: 0 done, 1 failed, 2 usage error.\n");
+    return 0;
 }
 
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc == 2 && std::strcmp(argv[1], "demo") == 0) return Demo();
-    if (argc == 4 && std::strcmp(argv[1], "window") == 0) return WindowCommand(argv[2], argv[3]);
-    return Usage();
+    const std::string name = argc > 1 ? argv[1] : "";
+    if (name == "help" || name == "--help" || name == "-h") return Help();
+    for (const Command& c : kCommands) {
+        if (name != c.name) continue;
+        const Args a = Parse(argc, argv, c.flags);
+        if (a.Has("help")) {
+            std::printf("usage: %s\n\n", c.usage);
+            std::printf(c.help, WindowNames().c_str());
+            return 0;
+        }
+        return c.run(a);
+    }
+    Help();
+    return 2;
 }
