@@ -146,8 +146,11 @@ class Anova(unittest.TestCase):
         names = ["A", "B", "AB", "E"] if len(shape) == 2 else ["A", "B", "C", "AB", "AC", "BC", "ABC", "E"]
         y, x, labels = self.design(shape, repeats)
         ref = reference_ss(y)
+        subsets = [s for r in range(1, len(shape) + 1) for s in itertools.combinations(shape, r)]
+        ref_df = [np.prod(np.array(s) - 1) for s in subsets] + [y.size - np.prod(shape)]
         if repeats == 1:
             ref = np.array([ref[0], ref[1], 0.0, ref[2]])  # the interaction is the error
+            ref_df = [ref_df[0], ref_df[1], 0, ref_df[2]]
         tol = 64 * EPS * np.sum(x * x)
         for random, denominators in patterns.items():
             levels = [-s if name in random else s for s, name in zip(shape, "ABC")]
@@ -158,6 +161,7 @@ class Anova(unittest.TestCase):
             np.testing.assert_array_equal(old_p, p)
             self.assertTrue(np.all(np.abs(table[:, 0] - ref) <= tol), (table[:, 0] - ref, random))
             note("factorial SS error / (eps sum x^2)", np.max(np.abs(table[:, 0] - ref)) / (EPS * np.sum(x * x)))
+            np.testing.assert_array_equal(table[:, 1], ref_df)
             np.testing.assert_array_equal(table[-1, 3:], 0)
             row = {name: i for i, name in enumerate(names)}
             for r, den in enumerate(denominators):
