@@ -92,6 +92,10 @@ Status FisherCdf(double f, int32_t numeratorDf, int32_t denominatorDf, double* p
     return 0;
 }
 
+double FisherCdfValue(double f, int32_t numeratorDf, int32_t denominatorDf) {
+    return FCdf(f, numeratorDf, denominatorDf);
+}
+
 Status ChiSquareCdf(double x, int32_t df, double* p) {
     // 0 degrees pass here and reach the incomplete gamma function with a = 0.
     if (df < 0) return SampleCountErr;

@@ -15,6 +15,9 @@ Status NormalQuantile(double p, double* x);
 
 Status StudentTCdf(double t, int32_t df, double* p);
 Status FisherCdf(double f, int32_t numeratorDf, int32_t denominatorDf, double* p);
+// The same without the argument checks, for statistics that may come out NaN or infinite:
+// NaN gives NaN and +Infinity gives 1. Both degrees must be at least 1.
+double FisherCdfValue(double f, int32_t numeratorDf, int32_t denominatorDf);
 Status ChiSquareCdf(double x, int32_t df, double* p);
 
 // Bisections to a bracket of width 1e-4; the result is the bracket's lower end.
