@@ -35,23 +35,21 @@ TW_API int32_t unWrap85(Array1DHandle phase, int32_t units);
  * samples, writes the last sample of each row to `last`, and packs the indices of all channels
  * into the first 50 cells of an i32 array of channels * maximum cells. */
 TW_API int32_t Triggerh(Array2DHandle x, Array1DHandle level, Array1DHandle previous,
-                        Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum,
-                        Array1DHandle indices, Array1DHandle counts, Array1DHandle found,
-                        Array1DHandle last, int32_t* status);
+                        Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum, Array1DHandle indices,
+                        Array1DHandle counts, Array1DHandle found, Array1DHandle last, int32_t* status);
 TW_API int32_t Triggerh_86(Array2DHandle x, Array1DHandle level, Array1DHandle armed,
                            Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum,
                            Array2DHandle indices, Array1DHandle counts, Array1DHandle found);
 
 /* Top, base and timing of one pulse; times in samples. On failure all ten results are 0. */
-TW_API int32_t PulseParameters(Array1DHandle x, double* top, double* base, double* amplitude,
-                               double* delay, double* width, double* slew, double* fall,
-                               double* rise, double* overshoot, double* undershoot, int32_t* status);
+TW_API int32_t PulseParameters(Array1DHandle x, double* top, double* base, double* amplitude, double* delay,
+                               double* width, double* slew, double* fall, double* rise, double* overshoot,
+                               double* undershoot, int32_t* status);
 
 /* Multiply by exp(j (phase + w k)), w = 2 pi frequency / fs; the phase is carried to the next
  * block, reduced to [0, 2 pi). Frequency 0 leaves the signal (and the phase) as it is. */
 TW_API void CxComplexModulatorH(Array1DHandle x, double frequency, double fs, double* phase);
-TW_API void ReComplexModulatorH(Array1DHandle x, double frequency, double fs, double* phase,
-                                Array1DHandle y);
+TW_API void ReComplexModulatorH(Array1DHandle x, double frequency, double fs, double* phase, Array1DHandle y);
 
 /* Phase and frequency modulation of n samples at x, in place. peak and accumulator are carried
  * between calls; phase receives the final phase in degrees. */

@@ -72,52 +72,54 @@ Edges MakeEdges(const double* init, int32_t nInit, int32_t usedInit, const doubl
 void DifferentiateInPlace(double* x, int32_t n, const Edges& e, double dt, int32_t method) {
     const double h = dt;
     switch (method) {
-    case 0: {
-        const double c = 0.5 / h;
-        Replace(x, n, e, [c](const Neighbours& w) { return (w(1) - w(-1)) * c; });
-        break;
-    }
-    case 1: {
-        const double c = 1 / (12 * h);
-        Replace(x, n, e, [c](const Neighbours& w) { return (8 * w(1) - w(2) - 8 * w(-1) + w(-2)) * c; });
-        break;
-    }
-    case 2: {
-        const double c = 1 / h;
-        Replace(x, n, e, [c](const Neighbours& w) { return (w(1) - w(0)) * c; });
-        break;
-    }
-    default: {
-        const double c = 1 / h;
-        Replace(x, n, e, [c](const Neighbours& w) { return (w(0) - w(-1)) * c; });
-        break;
-    }
+        case 0: {
+            const double c = 0.5 / h;
+            Replace(x, n, e, [c](const Neighbours& w) { return (w(1) - w(-1)) * c; });
+            break;
+        }
+        case 1: {
+            const double c = 1 / (12 * h);
+            Replace(x, n, e, [c](const Neighbours& w) { return (8 * w(1) - w(2) - 8 * w(-1) + w(-2)) * c; });
+            break;
+        }
+        case 2: {
+            const double c = 1 / h;
+            Replace(x, n, e, [c](const Neighbours& w) { return (w(1) - w(0)) * c; });
+            break;
+        }
+        default: {
+            const double c = 1 / h;
+            Replace(x, n, e, [c](const Neighbours& w) { return (w(0) - w(-1)) * c; });
+            break;
+        }
     }
 }
 
 void IntegrateInPlace(double* x, int32_t n, const Edges& e, double dt, int32_t method) {
     switch (method) {
-    case 0:
-        RunningSum(x, n, e, false, [dt](const Neighbours& w) { return (w(0) + w(-1)) * dt * 0.5; });
-        break;
-    case 1:
-        RunningSum(x, n, e, false, [dt](const Neighbours& w) { return (w(1) + 4 * w(0) + w(-1)) * dt / 6; });
-        break;
-    case 2:
-        RunningSum(x, n, e, false,
-                   [dt](const Neighbours& w) { return (3 * (w(0) + w(-1)) + w(-2) + w(1)) * dt * 0.125; });
-        break;
-    case 3:
-        RunningSum(x, n, e, false, [dt](const Neighbours& w) {
-            return (12 * w(0) + 32 * (w(-1) + w(1)) + 7 * (w(-2) + w(2))) * dt / 90;
-        });
-        break;
-    case 4:
-        RunningSum(x, n, e, true, [dt](const Neighbours& w) { return w(-1) * dt; });
-        break;
-    default:
-        RunningSum(x, n, e, true, [dt](const Neighbours& w) { return w(0) * dt; });
-        break;
+        case 0:
+            RunningSum(x, n, e, false, [dt](const Neighbours& w) { return (w(0) + w(-1)) * dt * 0.5; });
+            break;
+        case 1:
+            RunningSum(x, n, e, false,
+                       [dt](const Neighbours& w) { return (w(1) + 4 * w(0) + w(-1)) * dt / 6; });
+            break;
+        case 2:
+            RunningSum(x, n, e, false, [dt](const Neighbours& w) {
+                return (3 * (w(0) + w(-1)) + w(-2) + w(1)) * dt * 0.125;
+            });
+            break;
+        case 3:
+            RunningSum(x, n, e, false, [dt](const Neighbours& w) {
+                return (12 * w(0) + 32 * (w(-1) + w(1)) + 7 * (w(-2) + w(2))) * dt / 90;
+            });
+            break;
+        case 4:
+            RunningSum(x, n, e, true, [dt](const Neighbours& w) { return w(-1) * dt; });
+            break;
+        default:
+            RunningSum(x, n, e, true, [dt](const Neighbours& w) { return w(0) * dt; });
+            break;
     }
 }
 
@@ -159,7 +161,8 @@ void IntegrateFromStart(double* x, int32_t n, double dt, int32_t method) {
         } else if (method == 2) {
             y = x[i - 3] + (was(i - 3) + 3 * was(i - 2) + 3 * was(i - 1) + xi) * dt * 3 * 0.125;
         } else {
-            y = x[i - 4] + (7 * was(i - 4) + 32 * was(i - 3) + 12 * was(i - 2) + 32 * was(i - 1) + 7 * xi) * boole;
+            y = x[i - 4] +
+                (7 * was(i - 4) + 32 * was(i - 3) + 12 * was(i - 2) + 32 * was(i - 1) + 7 * xi) * boole;
         }
         old[i & 7] = xi;
         x[i] = y;

@@ -81,7 +81,8 @@ void PhaseModulate(int32_t n, double k, double* phase, double carrier, void* x, 
     Modulate<false>(n, k, phase, carrier, x, peak, acc);
 }
 
-void FrequencyModulate(int32_t n, double k, double* phase, double carrier, void* x, double* peak, double* acc) {
+void FrequencyModulate(int32_t n, double k, double* phase, double carrier, void* x, double* peak,
+                       double* acc) {
     Modulate<true>(n, k, phase, carrier, x, peak, acc);
 }
 

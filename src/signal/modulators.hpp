@@ -14,6 +14,7 @@ void ModulateReal(const double* x, int32_t n, double w, double* phase, cdouble* 
 
 // n samples at x (any 4-byte alignment), replaced by the modulated carrier; n >= 1.
 void PhaseModulate(int32_t n, double k, double* phase, double carrier, void* x, double* peak, double* acc);
-void FrequencyModulate(int32_t n, double k, double* phase, double carrier, void* x, double* peak, double* acc);
+void FrequencyModulate(int32_t n, double k, double* phase, double carrier, void* x, double* peak,
+                       double* acc);
 
 }  // namespace tw

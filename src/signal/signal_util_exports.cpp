@@ -147,9 +147,8 @@ TW_API int32_t unWrap(Array1DHandle phase, int32_t* status) { return ToPointer(s
 TW_API int32_t unWrap85(Array1DHandle phase, int32_t units) { return Unwrap(phase, units); }
 
 TW_API int32_t Triggerh(Array2DHandle x, Array1DHandle level, Array1DHandle previous,
-                        Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum,
-                        Array1DHandle indices, Array1DHandle counts, Array1DHandle found,
-                        Array1DHandle last, int32_t* status) {
+                        Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum, Array1DHandle indices,
+                        Array1DHandle counts, Array1DHandle found, Array1DHandle last, int32_t* status) {
     Frame f;
     f.Output<int32_t>(indices);
     f.Output<int32_t>(counts);
@@ -217,9 +216,9 @@ TW_API int32_t Triggerh_86(Array2DHandle x, Array1DHandle level, Array1DHandle a
     return f.Finish(MergeRelease(s, flags.Release()));
 }
 
-TW_API int32_t PulseParameters(Array1DHandle x, double* top, double* base, double* amplitude,
-                               double* delay, double* width, double* slew, double* fall,
-                               double* rise, double* overshoot, double* undershoot, int32_t* status) {
+TW_API int32_t PulseParameters(Array1DHandle x, double* top, double* base, double* amplitude, double* delay,
+                               double* width, double* slew, double* fall, double* rise, double* overshoot,
+                               double* undershoot, int32_t* status) {
     // Failure zeroes the results rather than NaN-ing them, so they are not registered.
     Frame f;
     const int32_t n = Count(x);

@@ -1,6 +1,6 @@
-#include <cmath>
-
 #include "signal/triggers.hpp"
+
+#include <cmath>
 
 namespace tw {
 
@@ -50,8 +50,8 @@ void TriggerChannels(const double* x, int32_t rows, int32_t cols, const TriggerS
         int32_t* out = indices + static_cast<int64_t>(c) * width;
         for (int32_t k = 0; k < width; ++k) out[k] = 0;
         int32_t count = 0;
-        const bool on = Scan(x + static_cast<int64_t>(c) * cols, cols, ChannelOf(t, c), armed[c] != 0, maximum,
-                             &count, [&](int32_t j) { out[count] = j; });
+        const bool on = Scan(x + static_cast<int64_t>(c) * cols, cols, ChannelOf(t, c), armed[c] != 0,
+                             maximum, &count, [&](int32_t j) { out[count] = j; });
         armed[c] = on ? 1 : 0;
         counts[c] = count;
         found[c] = count != 0 ? 1 : 0;

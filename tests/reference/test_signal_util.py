@@ -292,18 +292,6 @@ class Modulators(unittest.TestCase):
                 self.assertTrue(np.all(np.abs(y - z.real * osc) <= 4 * EPS * np.abs(z.real)))
                 self.assertEqual(p.value, next_phase)
 
-    def test_phase_carried_across_blocks(self):
-        f, fs, z = 13.0, 100.0, self.rng.normal(size=300) + 0j
-        p = D(1.0)
-        blocks = []
-        for part in np.split(z, [100, 101, 250]):
-            h = tw.array(part, np.complex128)
-            tw.lib.CxComplexModulatorH(h, f, fs, ctypes.byref(p))
-            blocks.append(h.numpy())
-        w = 2 * math.pi * f / fs
-        ref = z * np.exp(1j * (1.0 + w * np.arange(300)))
-        np.testing.assert_allclose(np.concatenate(blocks), ref, rtol=0, atol=1e-12 * np.max(np.abs(z)))
-
     def test_frequency_zero_ignores_the_phase(self):
         z = np.array([1 + 2j, -3 + 0.5j])
         p = D(float("nan"))

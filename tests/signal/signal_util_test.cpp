@@ -27,10 +27,14 @@ protected:
 };
 
 TEST_P(SignalUtil, BoundaryOperationsCheckInTheirOwnOrder) {
-    using Call = std::function<int32_t(Array1D<double>&, const Array1D<double>&, const Array1D<double>&, double,
-                                       int32_t)>;
-    const Call d85 = [](auto& x, auto& i, auto& f, double dt, int32_t m) { return Derivative85(x.h(), i.h(), f.h(), &dt, m); };
-    const Call i90 = [](auto& x, auto& i, auto& f, double dt, int32_t m) { return Integral90(x.h(), i.h(), f.h(), dt, m); };
+    using Call = std::function<int32_t(Array1D<double>&, const Array1D<double>&, const Array1D<double>&,
+                                       double, int32_t)>;
+    const Call d85 = [](auto& x, auto& i, auto& f, double dt, int32_t m) {
+        return Derivative85(x.h(), i.h(), f.h(), &dt, m);
+    };
+    const Call i90 = [](auto& x, auto& i, auto& f, double dt, int32_t m) {
+        return Integral90(x.h(), i.h(), f.h(), dt, m);
+    };
     const Call i17 = [](auto& x, auto&, auto&, double dt, int32_t m) { return Integral_2017(x.h(), dt, m); };
     const Call d = [](auto& x, auto& i, auto& f, double dt, int32_t) {
         int32_t s = 1;
@@ -48,26 +52,27 @@ TEST_P(SignalUtil, BoundaryOperationsCheckInTheirOwnOrder) {
         double dt;
         int32_t method, status;
     };
+    // clang-format off
     const Case cases[] = {
-        {&d85, 0, 2, 2, 0, 0, EmptyArrayErr},  {&d85, 3, 2, 2, 0, 0, SampleIntervalErr},
+        {&d85, 0, 2, 2, 0, 0, EmptyArrayErr}, {&d85, 3, 2, 2, 0, 0, SampleIntervalErr},
         {&d85, 3, 2, 2, -1, 0, SampleIntervalErr}, {&d85, 3, 2, 2, kNaNIn, 0, SampleIntervalErr},
         {&d85, 3, 0, 0, 1, 4, InvalidSelectorErr}, {&d85, 3, 2, 2, 1, -1, InvalidSelectorErr},
-        {&d85, 3, 0, 1, 1, 0, EmptyArrayErr},  {&d85, 3, 1, 0, 1, 0, EmptyArrayErr},
+        {&d85, 3, 0, 1, 1, 0, EmptyArrayErr}, {&d85, 3, 1, 0, 1, 0, EmptyArrayErr},
         {&d85, 3, 0, 1, 1, 1, TooFewSamples2Err}, {&d85, 3, 2, 1, 1, 1, TooFewSamples2Err},
-        {&d85, 3, 0, 0, 1, 2, EmptyArrayErr},  {&d85, 3, 0, 1, 1, 2, 0},
-        {&d85, 3, 0, 0, 1, 3, EmptyArrayErr},  {&d85, 3, 1, 0, 1, 3, 0},
+        {&d85, 3, 0, 0, 1, 2, EmptyArrayErr}, {&d85, 3, 0, 1, 1, 2, 0},
+        {&d85, 3, 0, 0, 1, 3, EmptyArrayErr}, {&d85, 3, 1, 0, 1, 3, 0},
         {&d, 0, 1, 1, 0, 0, SampleIntervalErr}, {&d, 0, 1, 1, 1, 0, EmptyArrayErr},
-        {&d, 3, 0, 0, 1, 0, 0},
-        {&in, 0, 1, 1, 0, 0, EmptyArrayErr},   {&in, 3, 1, 1, 0, 0, SampleIntervalErr},
-        {&in, 3, 0, 1, 1, 0, EmptyArrayErr},   {&in, 3, 1, 0, 1, 0, EmptyArrayErr},
-        {&i90, 0, 2, 2, 0, 0, SampleIntervalErr}, {&i90, 0, 2, 2, 1, 0, EmptyArrayErr},
-        {&i90, 3, 0, 0, 1, 6, InvalidSelectorErr}, {&i90, 3, 0, 0, 1, 0, EmptyArrayErr},
-        {&i90, 3, 1, 0, 1, 0, 0},              {&i90, 3, 1, 0, 1, 1, EmptyArrayErr},
-        {&i90, 3, 1, 0, 1, 2, TooFewSamples2Err}, {&i90, 3, 2, 0, 1, 2, EmptyArrayErr},
-        {&i90, 3, 2, 1, 1, 3, TooFewSamples2Err}, {&i90, 3, 0, 0, 1, 4, 0},
-        {&i17, 0, 0, 0, 0, 0, SampleIntervalErr}, {&i17, 0, 0, 0, 1, 9, EmptyArrayErr},
-        {&i17, 3, 0, 0, 1, 6, InvalidSelectorErr},
+        {&d, 3, 0, 0, 1, 0, 0}, {&in, 0, 1, 1, 0, 0, EmptyArrayErr},
+        {&in, 3, 1, 1, 0, 0, SampleIntervalErr}, {&in, 3, 0, 1, 1, 0, EmptyArrayErr},
+        {&in, 3, 1, 0, 1, 0, EmptyArrayErr}, {&i90, 0, 2, 2, 0, 0, SampleIntervalErr},
+        {&i90, 0, 2, 2, 1, 0, EmptyArrayErr}, {&i90, 3, 0, 0, 1, 6, InvalidSelectorErr},
+        {&i90, 3, 0, 0, 1, 0, EmptyArrayErr}, {&i90, 3, 1, 0, 1, 0, 0},
+        {&i90, 3, 1, 0, 1, 1, EmptyArrayErr}, {&i90, 3, 1, 0, 1, 2, TooFewSamples2Err},
+        {&i90, 3, 2, 0, 1, 2, EmptyArrayErr}, {&i90, 3, 2, 1, 1, 3, TooFewSamples2Err},
+        {&i90, 3, 0, 0, 1, 4, 0}, {&i17, 0, 0, 0, 0, 0, SampleIntervalErr},
+        {&i17, 0, 0, 0, 1, 9, EmptyArrayErr}, {&i17, 3, 0, 0, 1, 6, InvalidSelectorErr},
     };
+    // clang-format on
     for (const Case& c : cases) {
         Array1D<double> x(V(static_cast<size_t>(c.nx), 1.5));
         const Array1D<double> init(V(static_cast<size_t>(c.ni), 1.0)), fin(V(static_cast<size_t>(c.nf), 2.0));
@@ -95,9 +100,9 @@ struct TriggerCase {
 TEST_P(SignalUtil, TriggersArmFireAndStopAtTheMaximum) {
     // Row 0 rises through 1 with hysteresis 0.5; row 1 falls through 0 with hysteresis -1 (taken
     // as 1); row 2 lies past the settings arrays: level 0, hysteresis 0, rising.
-    const Array2D<double> x(3, 9, {0, 2, 0.6, 2, 0.4, 1, 1.5, 0, 1,  //
-                                   0, 2, 0.5, -1, 1.5, 0, 0, 0, 0,   //
-                                   0, -1, 0, 0, -2, 3, -1, -1, -1});
+    const Array2D<double> x(3, 9, {0, 2,  0.6, 2,  0.4, 1, 1.5, 0,  1,  //
+                                   0, 2,  0.5, -1, 1.5, 0, 0,   0,  0,  //
+                                   0, -1, 0,   0,  -2,  3, -1,  -1, -1});
     const Array1D<double> level{1, 0}, hysteresis{0.5, -1};
     const Array1D<int32_t> slope{1, 0};
     const TriggerCase cases[] = {
@@ -135,8 +140,8 @@ TEST_P(SignalUtil, PackedTriggersShareOnePositionAndStoreFifty) {
         Array1D<int32_t> indices, counts, found;
         Array1D<double> last;
         int32_t s = 1;
-        Triggerh(x.h(), level.h(), previous.h(), hysteresis.h(), slope.h(), 3, indices.h(), counts.h(), found.h(),
-                 last.h(), &s);
+        Triggerh(x.h(), level.h(), previous.h(), hysteresis.h(), slope.h(), 3, indices.h(), counts.h(),
+                 found.h(), last.h(), &s);
         EXPECT_EQ(s, 0);
         EXPECT_EQ(indices.vec(), (I{0, 2, 0, 2, 0, 0, 0, 0, 0}));
         EXPECT_EQ(counts.vec(), (I{2, 0, 1}));
@@ -155,7 +160,8 @@ TEST_P(SignalUtil, PackedTriggersShareOnePositionAndStoreFifty) {
         Array1D<int32_t> indices, counts, found;
         Array1D<double> last;
         int32_t s = 1;
-        Triggerh(x.h(), none.h(), none.h(), none.h(), rising.h(), 50, indices.h(), counts.h(), found.h(), last.h(), &s);
+        Triggerh(x.h(), none.h(), none.h(), none.h(), rising.h(), 50, indices.h(), counts.h(), found.h(),
+                 last.h(), &s);
         I expected(100, 0);
         for (int p = 0; p < 49; ++p) expected[static_cast<size_t>(p)] = 2 * p + 1;
         expected[49] = 1;
@@ -171,12 +177,14 @@ TEST_P(SignalUtil, TriggersRefuseANegativeStoredCount) {
     std::memcpy(*level.h(), &minus, sizeof minus);
     Array1D<int32_t> armed{1}, slope{1}, counts{1}, found{1}, packed{1};
     Array2D<int32_t> indices(1, 1, {1});
-    EXPECT_EQ(Triggerh_86(x.h(), level.h(), armed.h(), level.h(), slope.h(), 1, indices.h(), counts.h(), found.h()),
-              NegativeSizeErr);
+    EXPECT_EQ(
+        Triggerh_86(x.h(), level.h(), armed.h(), level.h(), slope.h(), 1, indices.h(), counts.h(), found.h()),
+        NegativeSizeErr);
     EXPECT_EQ(indices.rows(), 0);
     EXPECT_EQ(counts.size(), 0);
     int32_t s = 0;
-    Triggerh(x.h(), level.h(), level.h(), level.h(), slope.h(), 1, packed.h(), counts.h(), found.h(), last.h(), &s);
+    Triggerh(x.h(), level.h(), level.h(), level.h(), slope.h(), 1, packed.h(), counts.h(), found.h(),
+             last.h(), &s);
     EXPECT_EQ(s, NegativeSizeErr);
     EXPECT_EQ(last.size(), 0);
 }
@@ -199,7 +207,9 @@ Pulse Measure(const V& v) {
 V Trapezoid(int n, bool fall) {
     V v(static_cast<size_t>(n), 0.0);
     for (int i = 10; i < n; ++i)
-        v[static_cast<size_t>(i)] = i < 20 ? (i - 10) / 10.0 : (!fall || i <= 30) ? 1.0 : std::max(0.0, 1 - (i - 30) / 5.0);
+        v[static_cast<size_t>(i)] = i < 20               ? (i - 10) / 10.0
+                                    : (!fall || i <= 30) ? 1.0
+                                                         : std::max(0.0, 1 - (i - 30) / 5.0);
     return v;
 }
 
@@ -253,8 +263,8 @@ TEST_P(SignalUtil, PulseParametersOfTrapezoids) {
     EXPECT_EQ(flat.amplitude + flat.delay + flat.width + flat.rise + flat.fall + flat.slew, 0.0);
     const Pulse none = Measure({});
     EXPECT_EQ(none.status, EmptyArrayErr);
-    for (double r : {none.top, none.base, none.amplitude, none.delay, none.width, none.slew, none.fall, none.rise,
-                     none.overshoot, none.undershoot})
+    for (double r : {none.top, none.base, none.amplitude, none.delay, none.width, none.slew, none.fall,
+                     none.rise, none.overshoot, none.undershoot})
         EXPECT_EQ(std::bit_cast<uint64_t>(r), 0u);
 }
 
