@@ -40,15 +40,9 @@ def derivative(x, init, final, dt, method):
     return h.numpy(), s
 
 
-def integral90(x, init, final, dt, method):
+def in_place(name, x, *args):
     h = tw.array(x)
-    s = tw.lib.Integral90(h, tw.array(init), tw.array(final), dt, method)
-    return h.numpy(), s
-
-
-def integral2017(x, dt, method):
-    h = tw.array(x)
-    s = tw.lib.Integral_2017(h, dt, method)
+    s = getattr(tw.lib, name)(h, *args)
     return h.numpy(), s
 
 
@@ -66,16 +60,6 @@ def integral_terms(ext, dt, method):
     t = (a(-1) if method == 4 else a(0)) * dt
     t[0] = 0.0
     return t
-
-
-def extended(x, init, final, reach):
-    before = [0.0, 0.0]
-    if reach[0] == 2:
-        before = list(init[:2])
-    elif reach[0] == 1:
-        before = [0.0, init[0]]
-    after = list(final[:reach[1]]) + [0.0] * (2 - reach[1])
-    return np.r_[before, x, after]
 
 
 class Calculus(unittest.TestCase):
@@ -122,62 +106,57 @@ class Calculus(unittest.TestCase):
             parts = [call(a, b) for a, b in zip(cuts[:-1], cuts[1:])]
             np.testing.assert_array_equal(np.concatenate(parts), call(0, len(x)), err_msg=f"method {method}")
 
-    def test_integral_trapezoid_against_scipy(self):
+    def test_integrals_against_scipy_and_a_sequential_rendering(self):
         for _ in each_placement():
             for n in (1, 2, 500):
-                x = self.rng.normal(size=n)
-                init = self.rng.normal(size=1)
-                y, s = integral90(x, init, [], 0.1, 0)
+                x, init = self.rng.normal(size=n), self.rng.normal(size=1)
+                y, s = in_place("Integral90", x, tw.array(init), tw.empty(), 0.1, 0)
                 self.assertEqual(s, 0)
                 ref = scipy.integrate.cumulative_trapezoid(np.r_[init, x], dx=0.1)
                 np.testing.assert_allclose(y, ref, rtol=0, atol=n * EPS * 0.1 * np.sum(np.abs(x)))
-
-    def test_integral_terms_against_a_sequential_rendering(self):
-        for method in range(6):
-            x = self.rng.normal(size=257)
-            init, final = self.rng.normal(size=2), self.rng.normal(size=2)
-            reach = INTEGRAL_REACH[method]
-            y, s = integral90(x, init[:reach[0]], final[:reach[1]], 0.3, method)
+        # Each term in its stated form, summed in sequence, gives the same bits.
+        x, init, final = self.rng.normal(size=257), self.rng.normal(size=2), self.rng.normal(size=2)
+        for method, (r0, r1) in enumerate(INTEGRAL_REACH):
+            y, s = in_place("Integral90", x, tw.array(init[2 - r0:]), tw.array(final[:r1]), 0.3, method)
             self.assertEqual(s, 0)
-            ref = np.cumsum(integral_terms(extended(x, init[:reach[0]], final, reach), 0.3, method))
+            ref = np.cumsum(integral_terms(np.r_[init, x, final], 0.3, method))
             np.testing.assert_array_equal(y, ref, err_msg=f"method {method}")
         # The older export is method 1.
-        x, init, final = self.rng.normal(size=50), self.rng.normal(size=1), self.rng.normal(size=1)
         h, s = tw.array(x), tw.i32()
-        tw.lib.Integral(h, tw.array(init), tw.array(final), ctypes.byref(D(0.3)), s.ref)
+        tw.lib.Integral(h, tw.array(init[1:]), tw.array(final[:1]), ctypes.byref(D(0.3)), s.ref)
         self.assertEqual(s.value, 0)
-        np.testing.assert_array_equal(h.numpy(), integral90(x, init, final, 0.3, 1)[0])
+        np.testing.assert_array_equal(h.numpy(), np.cumsum(integral_terms(np.r_[init, x, final], 0.3, 1)))
 
     def test_integral_from_start_exact_for_polynomials(self):
         dt, n = 0.5, 23
         t = dt * np.arange(n)
         for method, degree in ((1, 2), (2, 3), (3, 4)):
             p = np.polynomial.Polynomial([1.0, -2.0, 0.5, 0.25, -0.125][:degree + 1])
-            y, s = integral2017(p(t), dt, method)
+            y, s = in_place("Integral_2017", p(t), dt, method)
             self.assertEqual(s, 0)
             ref = p.integ()(t) - p.integ()(0.0)
             np.testing.assert_allclose(y, ref, rtol=0, atol=256 * EPS * np.max(np.abs(ref)),
                                        err_msg=f"method {method}")
         x = self.rng.normal(size=300)
-        y, s = integral2017(x, 0.2, 0)
+        y, s = in_place("Integral_2017", x, 0.2, 0)
         np.testing.assert_allclose(y, scipy.integrate.cumulative_trapezoid(x, dx=0.2, initial=0),
                                    rtol=0, atol=300 * EPS * 0.2 * np.sum(np.abs(x)))
-        y, _ = integral2017(x, 0.2, 4)
+        y, _ = in_place("Integral_2017", x, 0.2, 4)
         np.testing.assert_array_equal(y, np.r_[0, np.cumsum(x[:-1] * 0.2)])
-        y, _ = integral2017(x, 0.2, 5)
+        y, _ = in_place("Integral_2017", x, 0.2, 5)
         np.testing.assert_array_equal(y, np.r_[0, np.cumsum(x[1:] * 0.2)])
 
     def test_integral_from_start_at_the_shortest_lengths(self):
         x = np.array([1.0, 3.0, -2.0, 5.0, 0.5, 4.0])
         for method in range(6):
             least = method + 2 if method <= 3 else 2
-            _, s = integral2017(x[:least - 1], 1.0, method)
+            _, s = in_place("Integral_2017", x[:least - 1], 1.0, method)
             self.assertEqual(s, -20008, method)
-            y, s = integral2017(x[:least], 1.0, method)
+            y, s = in_place("Integral_2017", x[:least], 1.0, method)
             self.assertEqual(s, 0, method)
             self.assertEqual(y[0], 0.0)
         # n = 3, method 1: y[1] from its start formula, y[2] from the recursion.
-        y, _ = integral2017(x[:3], 0.5, 1)
+        y, _ = in_place("Integral_2017", x[:3], 0.5, 1)
         np.testing.assert_array_equal(y, [0.0, (5 * 1 + 8 * 3 - (-2)) * 0.5 / 12,
                                           0.0 + (1 + 4 * 3 + (-2)) * (0.5 / 3)])
 
@@ -207,7 +186,7 @@ class Unwrap(unittest.TestCase):
                 first = {1: x[0] * 360 / (2 * np.pi), 3: x[0] * (2 * np.pi) / 360}.get(units, x[0])
                 self.assertEqual(y[0], first)
 
-    def test_half_period_ties(self):
+    def test_half_period_ties_and_empty(self):
         # floor(0.5 + 0.5) = 1: a jump of +P/2 is reduced by P, a jump of -P/2 stays.
         for units, p in ((0, 2 * np.pi), (2, 360.0)):
             # The second step is 1.5 P from the unwrapped -P/2: floor(2) takes off 2 P.
@@ -217,8 +196,6 @@ class Unwrap(unittest.TestCase):
             np.testing.assert_array_equal(y, [0.0, -p / 2, -p])
             # np.unwrap keeps the +P/2 jump where the rounding here reduces it.
             self.assertEqual(np.unwrap([0.0, p / 2], period=p)[1], p / 2)
-
-    def test_empty(self):
         self.assertEqual(self.unwrap([], 0)[1], -20008)
         s = tw.i32()
         tw.lib.unWrap(tw.empty(), s.ref)
@@ -249,7 +226,7 @@ def modulate(name, n, k, carrier, x, peak, acc, offset=0):
     return out, phase.value, pk.value, ac.value
 
 
-def modulate_reference(frequency, n, k, carrier, x, peak, acc):
+def modulate_reference(frequency, k, carrier, x, peak, acc):
     limit = 2 * math.pi / k
     out = []
     for v in x:
@@ -315,7 +292,7 @@ class Modulators(unittest.TestCase):
                 for k, carrier, peak, acc in ((1.0, 0.05, 0.0, 0.3), (0.25, -0.013, 2.9, -40.0), (3.0, 1.3, -7.5, 2.0)):
                     x = self.rng.normal(0, 4, 200)
                     out, phase, pk, ac = modulate(name, len(x), k, carrier, x, peak, acc, offset)
-                    r_out, r_phase, r_peak, r_acc = modulate_reference(frequency, len(x), k, carrier, x, peak, acc)
+                    r_out, r_phase, r_peak, r_acc = modulate_reference(frequency, k, carrier, x, peak, acc)
                     np.testing.assert_array_equal(out, r_out, err_msg=name)
                     self.assertEqual((phase, pk, ac), (r_phase, r_peak, r_acc), name)
 
