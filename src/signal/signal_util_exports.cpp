@@ -260,14 +260,20 @@ TW_API void ReComplexModulatorH(Array1DHandle x, double frequency, double fs, do
     f.Output<cdouble>(y);
     const double* xs = nullptr;
     cdouble* ys = nullptr;
-    double p = *phase;
     Status s = f.In(x, &xs);
     if (s == 0) s = f.Resize(y, n, &ys);
-    if (s == 0 && frequency == 0)
-        for (int32_t k = 0; k < n; ++k) ys[k] = {xs[k], 0.0};
-    else if (s == 0)
+    if (frequency == 0) {
+        // The phase is neither read nor written.
+        for (int32_t k = 0; s == 0 && k < n; ++k) ys[k] = {xs[k], 0.0};
+        f.Finish(s);
+        return;
+    }
+    double p = 0;
+    if (s == 0) {
+        p = *phase;
         ModulateReal(xs, n, kTwoPi * (frequency / fs), &p, ys);
-    if (f.Finish(s) == 0 && frequency != 0) *phase = p;
+    }
+    if (f.Finish(s) == 0) *phase = p;
 }
 
 TW_API void PhasMod(int32_t n, double k, double* phase, double carrier, double* x, double* peak,

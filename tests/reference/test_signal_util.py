@@ -270,15 +270,14 @@ class Modulators(unittest.TestCase):
                 self.assertEqual(p.value, next_phase)
 
     def test_frequency_zero_ignores_the_phase(self):
+        # A null phase pointer: it must be neither read nor written.
         z = np.array([1 + 2j, -3 + 0.5j])
-        p = D(float("nan"))
         h = tw.array(z, np.complex128)
-        tw.lib.CxComplexModulatorH(h, 0.0, 10.0, ctypes.byref(p))
+        tw.lib.CxComplexModulatorH(h, 0.0, 10.0, None)
         np.testing.assert_array_equal(h.numpy(), z)
         out = tw.empty(np.complex128)
-        tw.lib.ReComplexModulatorH(tw.array(z.real), 0.0, 10.0, ctypes.byref(p), out)
+        tw.lib.ReComplexModulatorH(tw.array(z.real), 0.0, 10.0, None, out)
         np.testing.assert_array_equal(out.numpy(), z.real + 0j)
-        self.assertTrue(math.isnan(p.value))
         # An empty x does nothing, not even to y.
         out = tw.array([5 + 5j], np.complex128)
         p = D(2.0)
