@@ -1,0 +1,61 @@
+/* Signal operations: derivative, integral, phase unwrapping, triggers, pulse parameters and
+ * modulators. */
+#ifndef TWANLYS_SIGNAL_H
+#define TWANLYS_SIGNAL_H
+
+#include "twanlys/types.h"
+
+/* Derivative of x in place. init holds the samples before x[0] and final those after x[n-1], so
+ * that a signal cut into blocks differentiates exactly as one call. Methods: 0 second-order
+ * central (one sample each side), 1 fourth-order central (two each side), 2 forward (final
+ * only), 3 backward (init only). Derivative is method 0; a missing boundary sample reads as 0. */
+TW_API int32_t Derivative(Array1DHandle x, Array1DHandle init, Array1DHandle final_, double* dt,
+                          int32_t* status);
+TW_API int32_t Derivative85(Array1DHandle x, Array1DHandle init, Array1DHandle final_, double* dt,
+                            int32_t method);
+
+/* Running integral of x in place, with boundary samples as above. Methods: 0 trapezoid, 1
+ * Simpson, 2 Simpson 3/8, 3 Boole, 4 left rectangle, 5 right rectangle. Integral is method 1. */
+TW_API int32_t Integral(Array1DHandle x, Array1DHandle init, Array1DHandle final_, double* dt,
+                        int32_t* status);
+TW_API int32_t Integral90(Array1DHandle x, Array1DHandle init, Array1DHandle final_, double dt,
+                          int32_t method);
+/* Running integral without boundaries: y[0] = 0, starting formulas, then the method's recursion. */
+TW_API int32_t Integral_2017(Array1DHandle x, double dt, int32_t method);
+
+/* Phase unwrapping in place. units: 0 radians, 1 radians in and degrees out, 2 degrees, 3
+ * degrees in and radians out; any other value acts as 0. unWrap is units 0. */
+TW_API int32_t unWrap(Array1DHandle phase, int32_t* status);
+TW_API int32_t unWrap85(Array1DHandle phase, int32_t units);
+
+/* Level triggers on the rows (channels) of x. level and hysteresis are f64 per channel, slope i32
+ * per channel (1 rising, 0 falling); shorter arrays are extended with 0.0, 0.0 and 1. counts and
+ * found are i32 per channel. Triggerh_86 carries the i32 armed flags through `armed` and writes
+ * indices as channels x maximum (unused cells 0). Triggerh arms a channel from the previous last
+ * samples, writes the last sample of each row to `last`, and packs the indices of all channels
+ * into the first 50 cells of an i32 array of channels * maximum cells. */
+TW_API int32_t Triggerh(Array2DHandle x, Array1DHandle level, Array1DHandle previous,
+                        Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum, Array1DHandle indices,
+                        Array1DHandle counts, Array1DHandle found, Array1DHandle last, int32_t* status);
+TW_API int32_t Triggerh_86(Array2DHandle x, Array1DHandle level, Array1DHandle armed,
+                           Array1DHandle hysteresis, Array1DHandle slope, int32_t maximum,
+                           Array2DHandle indices, Array1DHandle counts, Array1DHandle found);
+
+/* Top, base and timing of one pulse; times in samples. On failure all ten results are 0. */
+TW_API int32_t PulseParameters(Array1DHandle x, double* top, double* base, double* amplitude, double* delay,
+                               double* width, double* slew, double* fall, double* rise, double* overshoot,
+                               double* undershoot, int32_t* status);
+
+/* Multiply by exp(j (phase + w k)), w = 2 pi frequency / fs; the phase is carried to the next
+ * block, reduced to [0, 2 pi). Frequency 0 leaves the signal (and the phase) as it is. */
+TW_API void CxComplexModulatorH(Array1DHandle x, double frequency, double fs, double* phase);
+TW_API void ReComplexModulatorH(Array1DHandle x, double frequency, double fs, double* phase, Array1DHandle y);
+
+/* Phase and frequency modulation of n samples at x, in place. peak and accumulator are carried
+ * between calls; phase receives the final phase in degrees. */
+TW_API void PhasMod(int32_t n, double k, double* phase, double carrier, double* x, double* peak,
+                    double* accumulator);
+TW_API void FreqMod(int32_t n, double k, double* phase, double carrier, double* x, double* peak,
+                    double* accumulator);
+
+#endif
