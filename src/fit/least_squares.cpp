@@ -18,39 +18,51 @@ size_t Cells(int32_t rows, int32_t cols) { return static_cast<size_t>(rows) * st
 // The expanded square: its rounding is part of the result.
 inline double MseTerm(double y, double f) { return (f - 2 * y) * f + y * y; }
 
-// Copies of h and y with each row scaled by sqrt|w|.
-void ScaleRows(const double* h, const double* y, const double* w, int32_t n, int32_t k, double* a, double* b) {
-    std::memcpy(a, h, Cells(n, k) * sizeof(double));
-    std::memcpy(b, y, static_cast<size_t>(n) * sizeof(double));
-    if (w == nullptr) return;
+// The scaled system [sqrt|w| h, sqrt|w| y] reduced by Householder QR to its k + 1 by k + 1
+// triangle: the leading k by k block is R and its last column holds Q^T b. Nothing of size n
+// survives, and Q is never formed.
+Status ReduceScaled(const double* h, const double* y, const double* w, int32_t n, int32_t k, double* r1) {
+    const int32_t k1 = k + 1;
+    Scratch<double> work;
+    if (work.Allocate(Cells(n, k1)) != 0) return OutOfMemoryErr;
+    double* a = work.get();
     for (int32_t i = 0; i < n; ++i) {
-        const double r = std::sqrt(std::fabs(w[i]));
-        for (int32_t j = 0; j < k; ++j) a[Cells(i, k) + j] *= r;
-        b[i] *= r;
+        const double* hi = h + Cells(i, k);
+        double* ai = a + Cells(i, k1);
+        const double g = w != nullptr ? std::sqrt(std::fabs(w[i])) : 1.0;
+        for (int32_t j = 0; j < k; ++j) ai[j] = w != nullptr ? hi[j] * g : hi[j];
+        ai[k] = w != nullptr ? y[i] * g : y[i];
     }
+    // The scaled design is screened; y is not.
+    for (int32_t i = 0; i < n; ++i)
+        if (HasNonFinite(a + Cells(i, k1), k)) return MergeRelease(NanInfErr, work.Release());
+    const Status st = QrHouseholder<double>(a, n, k1, 2, nullptr, r1);
+    return MergeRelease(st, work.Release());
 }
 
-// Methods 0 and 6: coefficients from the singular triplets above the cut-off, covariance V S^-2 V^T.
+// Methods 0 and 6: the SVD of the scaled design through that of its triangle, R = U S V^T, so that
+// u_i . b is (U^T Q^T b)_i; coefficients from the triplets above the cut-off, covariance
+// V S^-2 V^T.
 Status SvdLeastSquares(const double* h, int32_t n, int32_t k, const double* y, const double* w, bool cutOff,
                        double* coef, double* covariance) {
+    const int32_t k1 = k + 1;
     Scratch<double> work;
-    if (work.Allocate(Cells(n, k) * 2 + static_cast<size_t>(n) + Cells(k, k) + 2 * static_cast<size_t>(k)) != 0)
-        return OutOfMemoryErr;
-    double* a = work.get();
-    double* b = a + Cells(n, k);
-    double* u = b + n;
-    double* v = u + Cells(n, k);
+    if (work.Allocate(Cells(k1, k1) + 3 * Cells(k, k) + 2 * static_cast<size_t>(k)) != 0) return OutOfMemoryErr;
+    double* r1 = work.get();
+    double* r = r1 + Cells(k1, k1);
+    double* u = r + Cells(k, k);
+    double* v = u + Cells(k, k);
     double* s = v + Cells(k, k);
     double* proj = s + k;
-    ScaleRows(h, y, w, n, k, a, b);
-    // FullSvd screens the scaled matrix for NaN and Infinity.
-    Status st = FullSvd<double>(a, n, k, u, s, v);
+    Status st = ReduceScaled(h, y, w, n, k, r1);
+    for (int32_t i = 0; i < k; ++i) std::memcpy(r + Cells(i, k), r1 + Cells(i, k1), Cells(1, k) * sizeof(double));
+    if (st == 0) st = FullSvd<double>(r, k, k, u, s, v);
     if (st != 0) return MergeRelease(st, work.Release());
     const double t = cutOff ? n * s[0] * 2.220446049250313e-16 : 0.0;
     std::fill(proj, proj + k, 0.0);
-    for (int32_t r = 0; r < n; ++r) {
-        const double* ur = u + Cells(r, k);
-        for (int32_t i = 0; i < k; ++i) proj[i] += ur[i] * b[r];
+    for (int32_t j = 0; j < k; ++j) {
+        const double qtb = r1[Cells(j, k1) + k];
+        for (int32_t i = 0; i < k; ++i) proj[i] += u[Cells(j, k) + i] * qtb;
     }
     std::fill(coef, coef + k, 0.0);
     for (int32_t i = 0; i < k; ++i) {
@@ -73,25 +85,19 @@ Status SvdLeastSquares(const double* h, int32_t n, int32_t k, const double* y, c
     return work.Release();
 }
 
-// Methods 1 to 3: economy QR, R c = Q^T b; covariance the pseudo-inverse of R^T R.
+// Methods 1 to 3: back substitution of R c = Q^T b; covariance the pseudo-inverse of R^T R.
 Status QrLeastSquares(const double* h, int32_t n, int32_t k, const double* y, const double* w, double* coef,
                       double* covariance) {
+    const int32_t k1 = k + 1;
     Scratch<double> work;
-    if (work.Allocate(Cells(n, k) * 2 + static_cast<size_t>(n) + Cells(k, k) * 2) != 0) return OutOfMemoryErr;
-    double* a = work.get();
-    double* b = a + Cells(n, k);
-    double* q = b + n;
-    double* r = q + Cells(n, k);
-    double* rtr = r + Cells(k, k);
-    ScaleRows(h, y, w, n, k, a, b);
-    if (HasNonFinite(a, static_cast<int32_t>(Cells(n, k)))) return MergeRelease(NanInfErr, work.Release());
-    Status st = QrHouseholder<double>(a, n, k, 1, q, r);
+    if (work.Allocate(Cells(k1, k1) + Cells(k, k)) != 0) return OutOfMemoryErr;
+    double* r = work.get();
+    double* rtr = r + Cells(k1, k1);
+    Status st = ReduceScaled(h, y, w, n, k, r);
     if (st != 0) return MergeRelease(st, work.Release());
-    std::fill(coef, coef + k, 0.0);
-    for (int32_t row = 0; row < n; ++row)
-        for (int32_t i = 0; i < k; ++i) coef[i] += q[Cells(row, k) + i] * b[row];
+    for (int32_t i = 0; i < k; ++i) coef[i] = r[Cells(i, k1) + k];
     for (int32_t i = k - 1; i >= 0; --i) {
-        const double* ri = r + Cells(i, k);
+        const double* ri = r + Cells(i, k1);
         if (ri[i] == 0) return MergeRelease(SingularMatrixErr, work.Release());
         double sum = coef[i];
         for (int32_t j = i + 1; j < k; ++j) sum -= ri[j] * coef[j];
@@ -101,7 +107,7 @@ Status QrLeastSquares(const double* h, int32_t n, int32_t k, const double* y, co
         for (int32_t i = 0; i < k; ++i)
             for (int32_t j = 0; j < k; ++j) {
                 double sum = 0;
-                for (int32_t c = 0; c <= std::min(i, j); ++c) sum += r[Cells(c, k) + i] * r[Cells(c, k) + j];
+                for (int32_t c = 0; c <= std::min(i, j); ++c) sum += r[Cells(c, k1) + i] * r[Cells(c, k1) + j];
                 rtr[Cells(i, k) + j] = sum;
             }
         st = PseudoInverse<double>(rtr, k, k, -1.0, covariance);
