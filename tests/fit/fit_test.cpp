@@ -279,6 +279,8 @@ TEST_P(Fit, ExponentialMethodsGuessesAndFailures) {
         EXPECT_EQ(r.b, std::isnan(c.b) ? estimate.b : c.b);
     }
 
+    EXPECT_EQ(Exp(y, x, {3, -0.5}, 1, 0).iterations, 1);  // a limit of L runs up to L + 1 steps
+
     const ModelResult other = Exp(y, x, {}, 5, 3);
     EXPECT_EQ(other.status, 0);
     EXPECT_TRUE(twtest::IsFailureNaN(other.a) && twtest::IsFailureNaN(other.b) && twtest::IsFailureNaN(other.mse));
