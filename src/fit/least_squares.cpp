@@ -19,24 +19,33 @@ size_t Cells(int32_t rows, int32_t cols) { return static_cast<size_t>(rows) * st
 inline double MseTerm(double y, double f) { return (f - 2 * y) * f + y * y; }
 
 // The scaled system [sqrt|w| h, sqrt|w| y] reduced by Householder QR to its k + 1 by k + 1
-// triangle: the leading k by k block is R and its last column holds Q^T b. Nothing of size n
-// survives, and Q is never formed.
+// triangle: the leading k by k block is R and its last column holds Q^T b. Q is never formed.
+// Tall systems go through in blocks of rows that stay in cache, each block stacked under the
+// triangle so far and reduced with it.
 Status ReduceScaled(const double* h, const double* y, const double* w, int32_t n, int32_t k, double* r1) {
     const int32_t k1 = k + 1;
+    const int32_t block = std::min(n, std::max(k1, 32768 / k1));
     Scratch<double> work;
-    if (work.Allocate(Cells(n, k1)) != 0) return OutOfMemoryErr;
-    double* a = work.get();
-    for (int32_t i = 0; i < n; ++i) {
-        const double* hi = h + Cells(i, k);
-        double* ai = a + Cells(i, k1);
-        const double g = w != nullptr ? std::sqrt(std::fabs(w[i])) : 1.0;
-        for (int32_t j = 0; j < k; ++j) ai[j] = w != nullptr ? hi[j] * g : hi[j];
-        ai[k] = w != nullptr ? y[i] * g : y[i];
+    if (work.Allocate(Cells(block + k1, k1)) != 0) return OutOfMemoryErr;
+    double* stack = work.get();
+    std::fill(r1, r1 + Cells(k1, k1), 0.0);
+    Status st = 0;
+    int32_t carried = 0;
+    for (int32_t first = 0; first < n && st == 0; first += block) {
+        const int32_t rows = std::min(block, n - first);
+        for (int32_t i = 0; i < rows; ++i) {
+            const double* hi = h + Cells(first + i, k);
+            double* ai = stack + Cells(carried + i, k1);
+            const double g = w != nullptr ? std::sqrt(std::fabs(w[first + i])) : 1.0;
+            for (int32_t j = 0; j < k; ++j) ai[j] = w != nullptr ? hi[j] * g : hi[j];
+            ai[k] = w != nullptr ? y[first + i] * g : y[first + i];
+            // The scaled design is screened; y is not.
+            if (HasNonFinite(ai, k)) st = NanInfErr;
+        }
+        if (st == 0) st = QrHouseholder<double>(stack, carried + rows, k1, 2, nullptr, r1);
+        carried = std::min(carried + rows, k1);
+        std::memcpy(stack, r1, Cells(carried, k1) * sizeof(double));
     }
-    // The scaled design is screened; y is not.
-    for (int32_t i = 0; i < n; ++i)
-        if (HasNonFinite(a + Cells(i, k1), k)) return MergeRelease(NanInfErr, work.Release());
-    const Status st = QrHouseholder<double>(a, n, k1, 2, nullptr, r1);
     return MergeRelease(st, work.Release());
 }
 

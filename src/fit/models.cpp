@@ -18,10 +18,15 @@ enum class TwoParam { Exp, Power };
 double Basis(TwoParam m, double b, double x) { return m == TwoParam::Exp ? std::exp(b * x) : std::pow(x, b); }
 double Abscissa(TwoParam m, double x) { return m == TwoParam::Exp ? x : std::log(x); }
 
-// Model values into f and their mse against y.
+// Model values into f and their mse against y; with a design given, the basis values go into its
+// first column for the next step.
 double TwoParamMse(TwoParam m, const double* x, const double* y, const double* w, int32_t n, double a, double b,
-                   double* f) {
-    for (int32_t i = 0; i < n; ++i) f[i] = a * Basis(m, b, x[i]);
+                   double* f, double* design = nullptr) {
+    for (int32_t i = 0; i < n; ++i) {
+        const double e = Basis(m, b, x[i]);
+        f[i] = a * e;
+        if (design != nullptr) design[2 * static_cast<size_t>(i)] = e;
+    }
     return FitMse(y, f, w, n, MseWalk::Model);
 }
 
@@ -52,22 +57,25 @@ Status LogLinearEstimate(TwoParam m, const double* x, const double* y, const dou
 }
 
 // Undamped Gauss-Newton from (a, b), keeping the best record. Returns the count through *steps.
+// block holds 5n values: model values, right-hand side, the n by 2 design, the abscissae.
 Status GaussNewton(TwoParam m, const double* x, const double* y, const double* w, int32_t n, IterationInputs it,
                    int32_t limit, double* block, double* a, double* b, int32_t* steps) {
     double* f = block;
     double* r = block + n;
     double* h = block + 2 * static_cast<size_t>(n);
+    double* t = block + 4 * static_cast<size_t>(n);
+    for (int32_t i = 0; i < n; ++i) t[i] = Abscissa(m, x[i]);
     const double tol = IterationTolerance(it.tolerance), floor = MseFloor(it.floor);
-    double mse = TwoParamMse(m, x, y, w, n, *a, *b, f);
+    double mse = TwoParamMse(m, x, y, w, n, *a, *b, f, h);
     double bestA = *a, bestB = *b, bestMse = mse, prev = 2 * mse;
     int32_t count = 0;
     if (limit >= 0) {
         while (std::fabs(prev - mse) > prev * tol && mse > floor) {
             prev = mse;
+            // The first column already holds the basis at the current b.
             for (int32_t i = 0; i < n; ++i) {
-                const double e = Basis(m, *b, x[i]);
-                h[2 * i] = e;
-                h[2 * i + 1] = *a * e * Abscissa(m, x[i]);
+                const double e = h[2 * i];
+                h[2 * i + 1] = *a * e * t[i];
                 r[i] = y[i] - *a * e;
             }
             double d[2];
@@ -75,7 +83,7 @@ Status GaussNewton(TwoParam m, const double* x, const double* y, const double* w
             if (st < 0) return st;
             *a += d[0];
             *b += d[1];
-            mse = TwoParamMse(m, x, y, w, n, *a, *b, f);
+            mse = TwoParamMse(m, x, y, w, n, *a, *b, f, h);
             ++count;
             if (!std::isfinite(mse)) break;
             if (count > limit / 10 && mse > prev && mse > bestMse) break;  // diverging
@@ -109,7 +117,7 @@ Status TwoParamFit(TwoParam m, const double* x, const double* y, const double* w
     const double sign = DominantSign(y, n);
     const bool badGuess = guess != nullptr && HasNonFinite(guess, 2) != 0;
     Scratch<double> block;
-    if (block.Allocate(4 * static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    if (block.Allocate(5 * static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
     double c[2] = {0, 0};
     if (method == 0 || guess == nullptr || badGuess) {
         const Status st = LogLinearEstimate(m, x, y, vw, n, sign, block.get(), c);
