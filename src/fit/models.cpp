@@ -98,7 +98,7 @@ Status GaussNewton(TwoParam m, const double* x, const double* y, const double* w
 }
 
 // Fitted values and mse of the final parameters; fit may be y.
-void Finish(TwoParam m, const double* x, const double* y, const double* w, int32_t n, double a, double b,
+void WriteFit(TwoParam m, const double* x, const double* y, const double* w, int32_t n, double a, double b,
             double* block, double* fit, double* mse) {
     if (fit == nullptr && mse == nullptr) return;
     const double e = TwoParamMse(m, x, y, w, n, a, b, block);
@@ -142,7 +142,7 @@ Status TwoParamFit(TwoParam m, const double* x, const double* y, const double* w
     }
     *a = pa;
     *b = pb;
-    Finish(m, x, y, vw, n, pa, pb, block.get(), fit, mse);
+    WriteFit(m, x, y, vw, n, pa, pb, block.get(), fit, mse);
     return block.Release();
 }
 
