@@ -1,4 +1,4 @@
-// Fitting exports: status order, failure contract and the stated special cases, with values
+// Fitting exports: status order, failure contract and the special cases, with values
 // derived by hand (the numerics against NumPy/SciPy live in tests/reference/test_fit.py).
 #include <gtest/gtest.h>
 

@@ -1,5 +1,5 @@
 """Least-squares fits and fit models against NumPy/SciPy, and against plain-loop replicas of the
-stated forms where those round differently from the oracles."""
+documented forms where those round differently from the oracles."""
 import ctypes
 import math
 import sys
@@ -110,7 +110,7 @@ class LeastSquares(unittest.TestCase):
                 self.assertLessEqual(abs(mse - mse_of(y, fit, w)), 8 * EPS * np.mean(np.abs(w) * y * y))
 
     def test_line_sums_bit_for_bit(self):
-        # Far from the origin the stated sums and formulas decide the last digits.
+        # Far from the origin the uncentred sums and formulas decide the last digits.
         n = 2000
         x = 1e4 + 0.01 * np.arange(n)
         y = 3.0 * x + 7.0 + np.sin(np.arange(n))
@@ -125,7 +125,7 @@ class LeastSquares(unittest.TestCase):
         s, (m, c, _), fit = lin_fit(y, x)
         self.assertEqual((s, m, c), (0, slope, icept))
         ref = scipy.stats.linregress(x, y)
-        self.assertGreater(abs(c - ref.intercept), 0)  # the stated form is not the centred one
+        self.assertGreater(abs(c - ref.intercept), 0)  # the uncentred form is not linregress
 
     def test_poly_against_numpy(self):
         for _ in placements():
@@ -222,7 +222,7 @@ class LeastSquares(unittest.TestCase):
 
 
 def gauss_replica(x, y, a, c, s, tol, floor, limit):
-    """The stated steepest descent, loop for loop in plain floats (unweighted)."""
+    """The documented steepest descent, loop for loop in plain floats (unweighted)."""
     x, y = x.tolist(), y.tolist()
     n = len(x)
 
@@ -322,7 +322,7 @@ class Models(unittest.TestCase):
                 np.testing.assert_allclose([a, b], [c[1], bb], rtol=1e-12)
                 np.testing.assert_allclose(fit, a * log(sign * x * b), rtol=1e-13)
 
-    def test_gaussian_follows_the_stated_descent(self):
+    def test_gaussian_follows_the_documented_descent(self):
         x = np.linspace(-4, 6, 121)
         for amp, centre, sd in ((3.0, 1.0, 1.3), (-2.0, 0.4, 0.8)):
             y = amp * np.exp(-0.5 * ((x - centre) / sd) ** 2) + self.rng.normal(0, 0.05, x.size)
