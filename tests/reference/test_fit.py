@@ -156,15 +156,16 @@ class LeastSquares(unittest.TestCase):
         np.testing.assert_allclose(coef, [1.0, ref[0], 0.0, ref[1]], rtol=1e-12, atol=1e-14)
 
     def test_general_methods_against_lstsq(self):
-        n, k = 200, 5
-        h = self.rng.normal(size=(n, k))
-        y = h @ np.arange(1.0, k + 1) + self.rng.normal(0, 0.1, n)
-        w = self.rng.uniform(0.2, 4, n)
-        w[3] = -w[3]  # weights enter as |w|
-        sw = np.sqrt(np.abs(w))
-        ref = np.linalg.lstsq(h * sw[:, None], y * sw, rcond=0)[0]
-        cov = np.linalg.inv(h.T @ (np.abs(w)[:, None] * h))
-        for _ in placements():
+        # 20000 by 4 is reduced in several blocks of rows, the last one short; one size per placement.
+        for aligned, (n, k) in enumerate(((200, 5), (20000, 4))):
+            tw.placement(aligned)
+            h = self.rng.normal(size=(n, k))
+            y = h @ np.arange(1.0, k + 1) + self.rng.normal(0, 0.1, n)
+            w = self.rng.uniform(0.2, 4, n)
+            w[3] = -w[3]  # weights enter as |w|
+            sw = np.sqrt(np.abs(w))
+            ref = np.linalg.lstsq(h * sw[:, None], y * sw, rcond=0)[0]
+            cov = np.linalg.inv(h.T @ (np.abs(w)[:, None] * h))
             results = {}
             for method in range(7):
                 s, coef, fit, c, mse = gen_ls(h, y, w, method)
@@ -178,6 +179,7 @@ class LeastSquares(unittest.TestCase):
                 results[method] = (coef.tobytes(), c.tobytes(), fit.tobytes())
             self.assertEqual(results[1], results[2])
             self.assertEqual(results[1], results[3])
+        tw.placement(0)
 
     def test_deviations_and_rank_deficiency(self):
         n = 30
