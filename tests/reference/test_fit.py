@@ -223,17 +223,19 @@ class LeastSquares(unittest.TestCase):
                 self.assertAlmostEqual(rmse.value, np.sqrt(ref_sse / (dof if dof > 0 else n - 2)), delta=1e-12)
 
 
-def gauss_replica(x, y, a, c, s, tol, floor, limit):
-    """The documented steepest descent, loop for loop in plain floats (unweighted)."""
+def gauss_replica(x, y, w, a, c, s, tol, floor, limit):
+    """The documented steepest descent, loop for loop in plain floats."""
     x, y = x.tolist(), y.tolist()
+    q = [1.0] * len(x) if w is None else [abs(v) for v in w]
     n = len(x)
 
     def mse(a, c, s):
         total = 0.0
-        for i in range(n - 1, -1, -1):
+        for i in (range(n - 1, -1, -1) if w is None else range(n)):
             u = (x[i] - c) / s
             f = a * math.exp(-0.5 * (u * u))
-            total += (f - 2 * y[i]) * f + y[i] * y[i]
+            term = (f - 2 * y[i]) * f + y[i] * y[i]
+            total += term if w is None else abs(term * w[i])
         return total / n
 
     cur = mse(a, c, s)
@@ -252,8 +254,8 @@ def gauss_replica(x, y, a, c, s, tol, floor, limit):
                 u = v / s
                 e = math.exp(-0.5 * (u * u))
                 r = y[i] - a * e
-                t = 1.0 * r * a * v * e / ss
-                g[0] += 1.0 * r * e
+                t = q[i] * r * a * v * e / ss
+                g[0] += q[i] * r * e
                 g[1] += t
                 g[2] += t * v / s
         ta, tc, ts = a + g[0] * step, c + g[1] * step, s + g[2] * step
@@ -328,11 +330,12 @@ class Models(unittest.TestCase):
         x = np.linspace(-4, 6, 121)
         for amp, centre, sd in ((3.0, 1.0, 1.3), (-2.0, 0.4, 0.8)):
             y = amp * np.exp(-0.5 * ((x - centre) / sd) ** 2) + self.rng.normal(0, 0.05, x.size)
-            for tol, limit in ((1e-4, 1000), (1e-8, 300)):
+            for tol, limit, w in ((1e-4, 1000, None), (1e-8, 300, None), (1e-6, 500, self.rng.uniform(-2, 2, x.size))):
                 for aligned in placements():
-                    s, (a, c, sdev), fit, mse, it = model("GaussianPeakFit_head", y, x, [], tol, 1e-12,
-                                                          guess=[amp * 0.8, centre + 0.3, sd * 1.3], limit=limit)
-                    ra, rc, rs, rmse, rit = gauss_replica(x, y, amp * 0.8, centre + 0.3, sd * 1.3, tol, 1e-12, limit)
+                    start = [amp * 0.8, centre + 0.3, sd * 1.3]
+                    s, (a, c, sdev), fit, mse, it = model("GaussianPeakFit_head", y, x, [] if w is None else w, tol,
+                                                          1e-12, guess=start, limit=limit)
+                    ra, rc, rs, rmse, rit = gauss_replica(x, y, w, *start, tol, 1e-12, limit)
                     self.assertEqual((s, it), (0, rit))
                     note("gaussian vs replica", rel([a, c, sdev, mse], [ra, rc, rs, rmse]))
                     np.testing.assert_allclose([a, c, sdev, mse], [ra, rc, rs, rmse], rtol=1e-12)
