@@ -50,11 +50,19 @@ struct PolyTerms {
     int32_t count;
 };
 
+// Tuning of the robust kinds: two tolerances and a flag (the plain exports pass -1, -1 and 0).
+struct RobustTuning {
+    double tolerance1;
+    double tolerance2;
+    int32_t flag;
+};
+inline constexpr RobustTuning kPlainTuning{-1.0, -1.0, 0};
+
 // Polynomial of the given order in ascending coefficients (order + 1 of them), weights vetted
 // here. fit and mse may be null; the fit and mse always come from Horner's rule over all
 // coefficients. Orders above 25 fit at most 26 free columns, +20031.
 Status PolyFitCore(const double* x, const double* y, const double* w, int32_t n, int32_t order, int32_t method,
-                   PolyTerms fixed, int32_t kind, double* coef, double* fit, double* mse);
+                   PolyTerms fixed, int32_t kind, RobustTuning tuning, double* coef, double* fit, double* mse);
 
 // sse, R squared and rmse of fitted values f against y; weights (or null) as given, signed.
 Status GoodnessOfFitCore(const double* y, const double* f, const double* w, int32_t n, int32_t dof, double* sse,

@@ -86,7 +86,8 @@ Status PolyFrame(Handle x, Handle y, int32_t order, Handle w, int32_t method, Ha
     if (s == 0 && fixed > 0) s = f.In(powers, &ps);
     if (s == 0 && fixed > 0) s = f.In(values, &vs);
     if (s == 0 && (f.Resize(bestFit, n, &fit) != 0 || f.Resize(coef, order + 1, &c) != 0)) s = OutOfMemoryErr;
-    if (s == 0) s = PolyFitCore(xs, ys, ws, n, order, method, {ps, vs, fixed}, PolyLeastSquares, c, fit, mse);
+    if (s == 0)
+        s = PolyFitCore(xs, ys, ws, n, order, method, {ps, vs, fixed}, PolyLeastSquares, kPlainTuning, c, fit, mse);
     return f.Finish(s);
 }
 

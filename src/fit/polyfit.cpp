@@ -14,9 +14,11 @@ constexpr int32_t kTopPower = 25;
 
 size_t Cells(int32_t rows, int32_t cols) { return static_cast<size_t>(rows) * static_cast<size_t>(cols); }
 
-// The fit kinds on a design: plain least squares here; the robust kinds have their own module.
-Status SolveKind(int32_t kind, const double* h, int32_t n, int32_t k, const double* y, const double* w,
-                 int32_t method, double* coef) {
+// The fit kinds on a design. Only plain least squares is served so far; the robust kinds and
+// their tuning join with their own module.
+Status SolveKind(int32_t kind, RobustTuning tuning, const double* h, int32_t n, int32_t k, const double* y,
+                 const double* w, int32_t method, double* coef) {
+    static_cast<void>(tuning);
     if (kind != PolyLeastSquares) return InvalidSelectorErr;
     return GeneralLeastSquares(h, n, k, y, w, static_cast<uint32_t>(method), coef, nullptr, nullptr, nullptr);
 }
@@ -24,7 +26,7 @@ Status SolveKind(int32_t kind, const double* h, int32_t n, int32_t k, const doub
 }  // namespace
 
 Status PolyFitCore(const double* x, const double* y, const double* w, int32_t n, int32_t order, int32_t method,
-                   PolyTerms fixed, int32_t kind, double* coef, double* fit, double* mse) {
+                   PolyTerms fixed, int32_t kind, RobustTuning tuning, double* coef, double* fit, double* mse) {
     if (fixed.count < 0 || order < 0) return NegativeOrderErr;
     if (n <= order - fixed.count) return PolyOrderErr;
     const double* vw = nullptr;
@@ -42,7 +44,7 @@ Status PolyFitCore(const double* x, const double* y, const double* w, int32_t n,
             row[0] = 1.0;
             for (int32_t j = 1; j < k; ++j) row[j] = row[j - 1] * x[i];
         }
-        st = SolveKind(kind, h, n, k, y, vw, method, coef);
+        st = SolveKind(kind, tuning, h, n, k, y, vw, method, coef);
         std::fill(coef + k, coef + order + 1, 0.0);
         if (order > kTopPower && st == 0) st = OrderClampedWarn;
     } else {
@@ -85,7 +87,7 @@ Status PolyFitCore(const double* x, const double* y, const double* w, int32_t n,
                 }
                 target[i] = t;
             }
-            st = SolveKind(kind, h, n, k, target, vw, method, solved);
+            st = SolveKind(kind, tuning, h, n, k, target, vw, method, solved);
             int32_t col = 0;
             for (int32_t p = 0; p <= order; ++p)
                 coef[p] = index[p] >= 0 ? fixed.values[index[p]] : p <= top ? solved[col++] : 0.0;
