@@ -1,0 +1,74 @@
+/* Curve fitting: least squares (line, polynomial, general design matrix), goodness of fit and the
+ * nonlinear models. x, y and weights are 1-D f64 handles of equal length n; weights of length 0
+ * mean unweighted. Exports marked "y in, fit out" overwrite y with the fitted values and shrink it
+ * on failure. The mse is always sum(((f - 2y) f + y y) |w|) / n. Polynomial coefficients ascend. */
+#ifndef TWANLYS_FIT_H
+#define TWANLYS_FIT_H
+
+#include "twanlys/types.h"
+
+/* Straight line y = slope x + intercept; y in, fit out. */
+TW_API int32_t LinFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double* slope,
+                           double* intercept, double* mse);
+TW_API int32_t LinFitCoef_head(Array1DHandle y, Array1DHandle x, double* slope, double* intercept,
+                               int32_t* status);
+TW_API int32_t LinFitCoef80_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double* slope,
+                                 double* intercept, int32_t* status);
+
+/* method is that of GenLSFit_head. Fixed terms: powers (i32) and their values (f64). Orders above
+ * 25 fit at most 26 terms and return +20031 with the coefficients above 0. */
+TW_API int32_t PolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, int32_t method, Array1DHandle bestFit,
+                            Array1DHandle coefficients, double* mse);
+TW_API int32_t PolyFit80_head(Array1DHandle x, Array1DHandle y, int32_t order, int32_t method,
+                              Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
+                              Array1DHandle coefficients, double* mse);
+TW_API int32_t PolyFit81_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights,
+                              int32_t method, Array1DHandle fixedPowers, Array1DHandle fixedValues,
+                              Array1DHandle bestFit, Array1DHandle coefficients, double* mse);
+
+/* h is n by k (2-D f64). method: 0 SVD, 1-3 QR, 4 normal equations by LU, 5 by Cholesky, 6 SVD
+ * with cut-off n s0 eps. GenLSFit_head takes standard deviations s (weight 1 / s^2, s = 0 is
+ * weight 1), GenLSFit80_head weights. The covariance is k by k when wanted, else 0 by 0. */
+TW_API int32_t GenLSFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle deviations, int32_t method,
+                             int32_t covarianceWanted, Array1DHandle coefficients, Array1DHandle bestFit,
+                             Array2DHandle covariance, double* mse);
+TW_API int32_t GenLSFit80_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                               int32_t covarianceWanted, Array1DHandle coefficients, Array1DHandle bestFit,
+                               Array2DHandle covariance, double* mse);
+
+/* dof below 1 means n - 2. */
+TW_API int32_t GoodnessOfFit_head(Array1DHandle y, Array1DHandle fitted, Array1DHandle weights, int32_t dof,
+                                  double* sse, double* rSquared, double* rmse);
+
+/* Models a exp(b x), a x^b, a log_base(b x) and a exp(-0.5 ((x - c) / s)^2). tolerance is the
+ * relative mse change that ends an iteration (not above 0: 1e-4), floor the mse that ends it (not
+ * above 0: 1e-12), iterations the limit in and the steps taken out. A guess of length 0 is
+ * estimated; another length than the parameter count returns +20010. Exponential method: 0
+ * log-linear estimate, 1 Gauss-Newton refinement. */
+TW_API int32_t ExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle deviations, double* a, double* b,
+                           double* mse);
+TW_API int32_t ExpFitCoef_head(Array1DHandle y, Array1DHandle x, double* a, double* b);
+TW_API int32_t ExpFit80_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                             Array1DHandle guess, uint16_t method, double* a, double* b, double* mse,
+                             int32_t* iterations, double floor);
+TW_API int32_t ExpFitCoef80_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, int32_t method,
+                                 double tolerance, Array1DHandle guess, double* a, double* b, int32_t* iterations,
+                                 double floor);
+TW_API int32_t PowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                             Array1DHandle guess, double* a, double* b, double* mse, int32_t* iterations,
+                             double floor);
+TW_API int32_t PowerFitCoef_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                 Array1DHandle guess, double* a, double* b, int32_t* iterations, double floor);
+/* base 2.71828 exactly means ln, 10 log10. */
+TW_API int32_t LogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double* a,
+                           double* b, double* mse);
+TW_API int32_t LogFitCoef_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double* a,
+                               double* b);
+TW_API int32_t GaussianPeakFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                    Array1DHandle guess, double* amplitude, double* centre, double* deviation,
+                                    double* mse, int32_t* iterations, double floor);
+TW_API int32_t GaussianPeakFitCoef_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                        Array1DHandle guess, double* amplitude, double* centre, double* deviation,
+                                        int32_t* iterations, double floor);
+
+#endif
