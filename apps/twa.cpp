@@ -9,6 +9,7 @@
 
 #include <algorithm>
 
+#include "twanlys/fit.h"
 #include "twanlys/generate.h"
 #include "twanlys/stats.h"
 #include "twanlys/transforms.h"
@@ -109,6 +110,34 @@ void Spectrum(const Array1D<double>& x) {
     std::printf("\n");
 }
 
+// A line and a Gaussian peak fitted to data made from known parameters plus a small deterministic
+// ripple; R squared from the goodness-of-fit export.
+void Fits() {
+    const int32_t n = 200;
+    Array1D<double> x(n), line(n), peak(n);
+    for (int32_t i = 0; i < n; ++i) {
+        const double t = i * 0.05, ripple = 0.05 * std::sin(2.3 * i) * std::cos(0.7 * i);
+        const double u = (t - 4.2) / 0.8;
+        x.set(i, t);
+        line.set(i, 0.75 * t - 1.5 + ripple);
+        peak.set(i, 2.5 * std::exp(-0.5 * u * u) + ripple);
+    }
+    const Array1D<double> none, lineData(line.vec()), peakData(peak.vec());
+    double slope, intercept, mse, sse, r2, rmse;
+    int32_t status = LinFit_head(line.h(), x.h(), none.h(), &slope, &intercept, &mse);  // line now holds the fit
+    GoodnessOfFit_head(lineData.h(), line.h(), none.h(), 0, &sse, &r2, &rmse);
+    std::printf("Fits to %d samples with a ripple of 0.05\n", n);
+    std::printf("  line 0.75 t - 1.5:        slope %.6f, intercept %.6f, R^2 %.6f (status %d)\n", slope,
+                intercept, r2, status);
+    double amplitude, centre, deviation;
+    int32_t steps = 500;
+    status = GaussianPeakFit_head(peak.h(), x.h(), none.h(), 1e-8, none.h(), &amplitude, &centre, &deviation,
+                                  &mse, &steps, 0);
+    GoodnessOfFit_head(peakData.h(), peak.h(), none.h(), 0, &sse, &r2, &rmse);
+    std::printf("  Gaussian 2.5, 4.2, 0.8:   amplitude %.6f, centre %.6f, sd %.6f, R^2 %.6f (%d steps)\n",
+                amplitude, centre, deviation, r2, steps);
+}
+
 int Demo() {
     const Array1D<double> x = DemoSignal();
     std::printf("twa demo: %d samples at %.0f Hz of a 50 Hz sine, a 120 Hz square wave and a\n"
@@ -116,6 +145,7 @@ int Demo() {
     Statistics(x);
     Histogram(x);
     Spectrum(x);
+    Fits();
     return 0;
 }
 
