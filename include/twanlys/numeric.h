@@ -1,8 +1,24 @@
-/* Numerical utilities: scaling and vector norms. */
+/* Numerical utilities: integration of sampled data, scaling and vector norms. */
 #ifndef TWANLYS_NUMERIC_H
 #define TWANLYS_NUMERIC_H
 
 #include "twanlys/types.h"
+
+/* Integration of uniformly sampled data. method: 0 trapezoid, 1 Simpson, 2 Simpson 3/8, 3 Bode;
+ * the 1-D _2017 export adds 4 left and 5 right rectangle. Steps are taken by magnitude. The result
+ * is NaN on failure. 2-D spacing: the step along a row, then between rows. A 3-D block holds
+ * i32 d0, d1, d2, then d2 slabs of d0 rows by d1 columns; its spacing has three steps. */
+TW_API int32_t NumerIntegration_head(Array1DHandle x, double* dt, int32_t* method, double* result,
+                                     int32_t* status);
+TW_API int32_t NumerIntegration_2017_head(Array1DHandle x, double* dt, int32_t* method, double* result);
+TW_API int32_t NumerIntegration2D_head(Array2DHandle data, Array1DHandle spacing, uint16_t method,
+                                       double* result);
+TW_API int32_t NumerIntegration2D_2017_head(Array2DHandle data, Array1DHandle spacing, uint16_t method,
+                                            double* result);
+TW_API int32_t NumerIntegration3D_head(NumericHandle data, Array1DHandle spacing, uint16_t method,
+                                       double* result);
+TW_API int32_t NumerIntegration3D_2017_head(NumericHandle data, Array1DHandle spacing, uint16_t method,
+                                            double* result);
 
 /* In-place scaling of whole arrays; 2-D exports treat rows * columns elements as one run. On
  * failure the data are emptied and the scalar results are NaN. Status through the last pointer. */

@@ -5,6 +5,7 @@ import math
 import unittest
 
 import numpy as np
+import scipy.integrate
 
 import twanlys as tw
 
@@ -147,6 +148,147 @@ class Scaling(unittest.TestCase):
                 tw.lib.unitVector_head(h, norm.ref, st.ref)
                 self.assertEqual(norm.value, np.sqrt(seqsum(v * v)))
                 np.testing.assert_array_equal(h.numpy(), v * (1 / norm.value))
+
+
+# Leftover rules, in units of h: at the end (older), at the start (later) by method and leftover.
+END_RULES = {1: [0.5, 0.5], 2: [1 / 3, 4 / 3, 1 / 3], 3: [3 / 8, 9 / 8, 9 / 8, 3 / 8]}
+START_RULES = {(1, 1): [5 / 12, 8 / 12, -1 / 12], (2, 1): [9 / 24, 19 / 24, -5 / 24, 1 / 24],
+               (2, 2): [1 / 3, 4 / 3, 1 / 3], (3, 1): np.array([251, 646, -264, 106, -19]) / 720,
+               (3, 2): np.array([29, 124, 24, 4, -1]) / 90, (3, 3): np.array([27, 102, 72, 42, -3]) / 80}
+
+
+def weights(n, method, later):
+    """Integration weights in units of h: whole panels of newton_cotes, then the leftover."""
+    w = np.zeros(n)
+    if method == 0:
+        w[:] = 1
+        w[[0, -1]] = 0.5
+        return w
+    if method in (4, 5):
+        w[:-1] = 1 if method == 4 else 0
+        w[1:] += 0 if method == 4 else 1
+        return w
+    width = method + 1
+    panel = scipy.integrate.newton_cotes(width, 1)[0]
+    r = (n - 1) % width
+    start = r if later else 0
+    for p in range((n - 1) // width):
+        w[start + p * width:start + (p + 1) * width + 1] += panel
+    if r and later:
+        rule = START_RULES[(method, r)]
+        w[:len(rule)] += rule
+    elif r:
+        w[n - r - 1:] += END_RULES[r]
+    return w
+
+
+def integrate(x, dt, method, later):
+    w = weights(len(x), method, later)
+    return abs(dt) * np.dot(w, x), abs(dt) * np.dot(np.abs(w), np.abs(x))
+
+
+def block3d(a):
+    """A host block of three i32 dimensions and the elements of a (d2 slabs of d0 x d1)."""
+    d2, d0, d1 = a.shape
+    tw.twrt.HostNewHandle.restype = P
+    tw.twrt.HostNewHandle.argtypes = [ctypes.c_size_t]
+    h = tw.twrt.HostNewHandle(12 + a.nbytes)
+    block = ctypes.cast(h, ctypes.POINTER(P))[0]
+    ctypes.memmove(block, np.array([d0, d1, d2], np.int32).ctypes.data, 12)
+    ctypes.memmove(block + 12, np.ascontiguousarray(a, np.float64).ctypes.data, a.nbytes)
+    return h
+
+
+class Integration(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(1222)
+        for name in ("NumerIntegration2D_head", "NumerIntegration2D_2017_head",
+                     "NumerIntegration3D_head", "NumerIntegration3D_2017_head"):
+            getattr(tw.lib, name).argtypes = [P, P, ctypes.c_uint16, P]
+
+    def one_d(self, x, dt, method, later):
+        out, st = tw.f64(), tw.i32(-1)
+        d, m = ctypes.byref(D(dt)), ctypes.byref(ctypes.c_int32(method))
+        if later:
+            st.c.value = tw.lib.NumerIntegration_2017_head(tw.array(x), d, m, out.ref)
+        else:
+            tw.lib.NumerIntegration_head(tw.array(x), d, m, out.ref, st.ref)
+        return out.value, st.value
+
+    def test_one_dimension_against_weights_and_scipy(self):
+        worst = 0.0
+        for _ in placements():
+            for later in (False, True):
+                for method in (0, 1, 2, 3, 4, 5) if later else (0, 1, 2, 3):
+                    low = 2 if method in (0, 4, 5) else method + 2
+                    for n in list(range(low, 14)) + [100, 1001, 4096]:
+                        x = self.rng.normal(size=n)
+                        for dt in (0.37, -0.37):
+                            got, st = self.one_d(x, dt, method, later)
+                            self.assertEqual(st, 0)
+                            ref, scale = integrate(x, dt, method, later)
+                            err = abs(got - ref) / scale
+                            worst = max(worst, err)
+                            self.assertLess(err, 1e-14, (method, n, later))
+                            if method == 0:
+                                self.assertLess(abs(got - np.trapz(x, dx=0.37)), 1e-14 * scale)
+                            if method == 1 and n % 2 == 1:
+                                simpson = scipy.integrate.simpson(x, dx=0.37)
+                                self.assertLess(abs(got - simpson), 1e-14 * scale)
+        print(f"\n1-D worst relative error against the weights: {worst:.2e}")
+
+    def test_exact_on_polynomials(self):
+        # The later generation is exact on polynomials of the degree of its start terms, for
+        # every leftover; the older one closes with lower rules and is not.
+        t0, h = 0.25, 0.5
+        for method, degree in ((1, 2), (2, 3), (3, 4)):
+            for n in range(method + 2, 14):
+                c = self.rng.normal(size=degree + 1)
+                t = t0 + h * np.arange(n)
+                x = np.polynomial.polynomial.polyval(t, c)
+                antiderivative = np.polynomial.polynomial.polyint(c)
+                exact = np.diff(np.polynomial.polynomial.polyval([t0, t[-1]], antiderivative))[0]
+                got, _ = self.one_d(x, h, method, True)
+                self.assertLess(abs(got - exact), 1e-13 * np.sum(np.abs(x)) * h, (method, n))
+        t = np.arange(6.0)
+        got_old, _ = self.one_d(t * t, 1.0, 1, False)
+        got_new, _ = self.one_d(t * t, 1.0, 1, True)
+        self.assertEqual(got_new, 125 / 3)
+        self.assertNotEqual(got_old, 125 / 3)
+
+    def test_two_and_three_dimensions(self):
+        for _ in placements():
+            for later in (False, True):
+                for method in range(4):
+                    m = 5 if later and method == 3 else max(3, method + 2)
+                    for d0, d1, d2 in ((m, m + 2, m + 1), (m + 4, m, m + 2)):
+                        a = self.rng.normal(size=(d2, d0, d1))
+                        steps = np.array([0.3, -0.7, 1.9])
+
+                        def nested2(plane):
+                            rows = [integrate(r, steps[0], method, later)[0] for r in plane]
+                            return integrate(np.array(rows), steps[1], method, later)[0]
+
+                        scale = np.prod(np.abs(steps)) * np.sum(np.abs(a)) * 4
+                        out = tw.f64()
+                        name2 = "NumerIntegration2D_2017_head" if later else "NumerIntegration2D_head"
+                        st = getattr(tw.lib, name2)(tw.matrix(a[0]), tw.array(steps[:2]), method, out.ref)
+                        self.assertEqual(st, 0)
+                        self.assertLess(abs(out.value - nested2(a[0])), 1e-14 * scale)
+                        if method == 0:
+                            self.assertLess(abs(out.value - np.trapz(np.trapz(a[0], dx=0.3, axis=1), dx=0.7)),
+                                            1e-14 * scale)
+                        h = block3d(a)
+                        name3 = "NumerIntegration3D_2017_head" if later else "NumerIntegration3D_head"
+                        st = getattr(tw.lib, name3)(h, tw.array(steps), method, out.ref)
+                        tw.twrt.HostDisposeHandle(h)
+                        self.assertEqual(st, 0)
+                        ref = integrate(np.array([nested2(p) for p in a]), steps[2], method, later)[0]
+                        self.assertLess(abs(out.value - ref), 1e-14 * scale, (method, d0, d1, d2))
+                        if method == 1 and d0 % 2 and d1 % 2 and d2 % 2:
+                            simpson = scipy.integrate.simpson
+                            nested = simpson(simpson(simpson(a, dx=0.3, axis=2), dx=0.7, axis=1), dx=1.9)
+                            self.assertLess(abs(out.value - nested), 1e-14 * scale)
 
 
 if __name__ == "__main__":
