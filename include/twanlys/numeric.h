@@ -1,4 +1,4 @@
-/* Numerical utilities: integration of sampled data, scaling and vector norms. */
+/* Numerical utilities: integration of sampled data, coordinates, scaling and vector norms. */
 #ifndef TWANLYS_NUMERIC_H
 #define TWANLYS_NUMERIC_H
 
@@ -19,6 +19,38 @@ TW_API int32_t NumerIntegration3D_head(NumericHandle data, Array1DHandle spacing
                                        double* result);
 TW_API int32_t NumerIntegration3D_2017_head(NumericHandle data, Array1DHandle spacing, uint16_t method,
                                             double* result);
+
+/* Coordinates: inputs of equal length n in, outputs resized to n, status as result. Angles in
+ * radians. Euler sequence 0..11: XYZ XZY YXZ YZX ZXY ZYX XYX XZX YXY YZY ZXZ ZYZ, the axes of the
+ * first, second and third angle; exports without a sequence use 10 (ZXZ). Rotations turn the frame
+ * (passive); the 3 x 3 direction matrix is M = R3 R2 R1 and a point maps as new = M old. */
+TW_API int32_t CartesianShift2D_head(Array1DHandle x, Array1DHandle y, double dx, double dy, Array1DHandle newX,
+                                     Array1DHandle newY);
+TW_API int32_t CartesianShift3D_head(Array1DHandle x, Array1DHandle y, Array1DHandle z, double dx, double dy,
+                                     double dz, Array1DHandle newX, Array1DHandle newY, Array1DHandle newZ);
+TW_API int32_t CoordRotation2D_head(Array1DHandle x, Array1DHandle y, double angle, Array1DHandle newX,
+                                    Array1DHandle newY);
+TW_API int32_t CoordRotationEuler_head(Array1DHandle x, Array1DHandle y, Array1DHandle z, double alpha,
+                                       double beta, double gamma, Array1DHandle newX, Array1DHandle newY,
+                                       Array1DHandle newZ);
+TW_API int32_t CoordRotationEuler2011_head(Array1DHandle x, Array1DHandle y, Array1DHandle z, double alpha,
+                                           double beta, double gamma, int32_t sequence, Array1DHandle newX,
+                                           Array1DHandle newY, Array1DHandle newZ);
+/* kind 1: the matrix holds direction cosines; 0: the angles between the axes. */
+TW_API int32_t CoordRotationDirect_head(Array1DHandle x, Array1DHandle y, Array1DHandle z, Array2DHandle matrix,
+                                        uint16_t kind, Array1DHandle newX, Array1DHandle newY,
+                                        Array1DHandle newZ);
+TW_API int32_t Euler2Direction_head(double alpha, double beta, double gamma, Array2DHandle matrix);
+TW_API int32_t Euler2Direction2011_head(double alpha, double beta, double gamma, int32_t sequence,
+                                        Array2DHandle matrix);
+TW_API int32_t Direction2Euler_head(Array2DHandle matrix, double* alpha, double* beta, double* gamma);
+TW_API int32_t Direction2Euler2011_head(Array2DHandle matrix, int32_t sequence, double* alpha, double* beta,
+                                        double* gamma);
+/* conversion 0: (x, y, z) to (r, theta, phi), phi from the z axis; 1: back; 2: (x, y, z) to
+ * (rho, theta, z); 3: back. unit 0 radians, 1 degrees. */
+TW_API int32_t CoordConversion_head(Array1DHandle a, Array1DHandle b, Array1DHandle c, uint16_t conversion,
+                                    uint16_t unit, Array1DHandle first, Array1DHandle second,
+                                    Array1DHandle third);
 
 /* In-place scaling of whole arrays; 2-D exports treat rows * columns elements as one run. On
  * failure the data are emptied and the scalar results are NaN. Status through the last pointer. */

@@ -6,6 +6,7 @@ import unittest
 
 import numpy as np
 import scipy.integrate
+from scipy.spatial.transform import Rotation
 
 import twanlys as tw
 
@@ -289,6 +290,125 @@ class Integration(unittest.TestCase):
                             simpson = scipy.integrate.simpson
                             nested = simpson(simpson(simpson(a, dx=0.3, axis=2), dx=0.7, axis=1), dx=1.9)
                             self.assertLess(abs(out.value - nested), 1e-14 * scale)
+
+
+SEQUENCES = ["XYZ", "XZY", "YXZ", "YZX", "ZXY", "ZYX", "XYX", "XZX", "YXY", "YZY", "ZXZ", "ZYZ"]
+
+
+def frame_matrix(seq, angles):
+    """The direction matrix of a rotated frame: the transpose of the intrinsic rotation."""
+    return Rotation.from_euler(SEQUENCES[seq], angles).as_matrix().T
+
+
+class Coordinates(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(1233)
+        L = tw.lib
+        L.Euler2Direction2011_head.argtypes = [D, D, D, ctypes.c_int32, P]
+        L.Direction2Euler2011_head.argtypes = [P, ctypes.c_int32, P, P, P]
+        L.CoordRotationEuler2011_head.argtypes = [P, P, P, D, D, D, ctypes.c_int32, P, P, P]
+        L.CoordRotationEuler_head.argtypes = [P, P, P, D, D, D, P, P, P]
+        L.CoordRotationDirect_head.argtypes = [P, P, P, P, ctypes.c_uint16, P, P, P]
+        L.CoordRotation2D_head.argtypes = [P, P, D, P, P]
+        L.CoordConversion_head.argtypes = [P, P, P, ctypes.c_uint16, ctypes.c_uint16, P, P, P]
+        L.CartesianShift3D_head.argtypes = [P, P, P, D, D, D, P, P, P]
+
+    def direction(self, seq, angles):
+        m = tw.empty(dims=2)
+        self.assertEqual(tw.lib.Euler2Direction2011_head(*angles, seq, m), 0)
+        return m.numpy()
+
+    def euler(self, seq, m):
+        out = [tw.f64() for _ in range(3)]
+        self.assertEqual(tw.lib.Direction2Euler2011_head(tw.matrix(m), seq, *[o.ref for o in out]), 0)
+        return np.array([o.value for o in out])
+
+    def principal(self, seq):
+        a, g = self.rng.uniform(-3.1, 3.1, 2)
+        b = self.rng.uniform(-1.5, 1.5) if seq < 6 else self.rng.uniform(0.05, 3.09)
+        return np.array([a, b, g])
+
+    def test_direction_matrix_and_round_trip(self):
+        worst = 0.0
+        for seq in range(12):
+            for _ in range(50):
+                angles = self.principal(seq)
+                m = self.direction(seq, angles)
+                err = np.max(np.abs(m - frame_matrix(seq, angles)))
+                worst = max(worst, err)
+                self.assertLess(err, 1e-15, (seq, angles))
+                np.testing.assert_allclose(self.euler(seq, m), angles, rtol=0, atol=1e-13)
+            # Any rotation, not only ones built here, decomposes as SciPy's does.
+            for r in Rotation.random(20, random_state=seq):
+                m = r.as_matrix().T
+                np.testing.assert_allclose(self.euler(seq, m), r.as_euler(SEQUENCES[seq]), rtol=0, atol=1e-12)
+        print(f"\ndirection matrix worst error against SciPy: {worst:.2e}")
+
+    def test_gimbal_lock(self):
+        for seq in range(12):
+            for b in ((np.pi / 2, -np.pi / 2) if seq < 6 else (0.0, np.pi)):
+                a, g = self.rng.uniform(-3, 3, 2)
+                m = self.direction(seq, [a, b, g])
+                got = self.euler(seq, m)
+                self.assertEqual(got[1], b, seq)
+                self.assertEqual(got[2], 0.0, seq)
+                np.testing.assert_allclose(frame_matrix(seq, got), m, rtol=0, atol=1e-15)
+
+    def points(self, n=1001):
+        return [self.rng.normal(size=n) for _ in range(3)]
+
+    def call_points(self, name, inputs, *args, outs=3):
+        o = [tw.empty() for _ in range(outs)]
+        st = getattr(tw.lib, name)(*[tw.array(v) for v in inputs], *args, *o)
+        self.assertEqual(st, 0, name)
+        return [h.numpy() for h in o]
+
+    def test_rotations_and_shifts(self):
+        for _ in placements():
+            x, y, z = self.points()
+            for seq in range(12):
+                angles = self.principal(seq)
+                got = self.call_points("CoordRotationEuler2011_head", (x, y, z), *angles, seq)
+                ref = frame_matrix(seq, angles) @ np.vstack((x, y, z))
+                np.testing.assert_allclose(np.vstack(got), ref, rtol=0, atol=4 * EPS * np.max(np.abs(ref)))
+                m = self.direction(seq, angles)
+                direct = self.call_points("CoordRotationDirect_head", (x, y, z), tw.matrix(m), 1)
+                np.testing.assert_array_equal(direct, got)
+                by_angles = self.call_points("CoordRotationDirect_head", (x, y, z), tw.matrix(np.arccos(m)), 0)
+                np.testing.assert_allclose(by_angles, got, rtol=0, atol=1e-14 * np.max(np.abs(ref)))
+            angles = self.principal(10)
+            old = self.call_points("CoordRotationEuler_head", (x, y, z), *angles)
+            np.testing.assert_array_equal(old, self.call_points("CoordRotationEuler2011_head", (x, y, z), *angles, 10))
+            t = 0.7
+            got = self.call_points("CoordRotation2D_head", (x, y), t, outs=2)
+            np.testing.assert_allclose(got, [x * np.cos(t) + y * np.sin(t), y * np.cos(t) - x * np.sin(t)],
+                                       rtol=0, atol=4 * EPS * np.max(np.abs(x) + np.abs(y)))
+            got = self.call_points("CartesianShift3D_head", (x, y, z), 1.5, -2.0, 0.25)
+            np.testing.assert_array_equal(got, [x + 1.5, y - 2.0, z + 0.25])
+
+    def test_conversions(self):
+        deg = 180 / 3.141592653589793
+        x, y, z = self.points()
+        x[0] = y[0] = z[0] = 0.0
+        for _ in placements():
+            for unit in (0, 1):
+                k = deg if unit else 1.0
+                r, th, ph = self.call_points("CoordConversion_head", (x, y, z), 0, unit)
+                np.testing.assert_array_equal(r, np.sqrt(x * x + y * y + z * z))
+                np.testing.assert_allclose(th, np.arctan2(y, x) * k, rtol=4 * EPS, atol=0)
+                np.testing.assert_allclose(ph, np.arctan2(np.sqrt(x * x + y * y), z) * k, rtol=4 * EPS, atol=0)
+                self.assertEqual((r[0], th[0], ph[0]), (0.0, 0.0, 0.0))
+                back = self.call_points("CoordConversion_head", (r, th, ph), 1, unit)
+                phr, thr = ph / k, th / k
+                ref = [r * np.sin(phr) * np.cos(thr), r * np.sin(phr) * np.sin(thr), r * np.cos(phr)]
+                np.testing.assert_allclose(back, ref, rtol=0, atol=8 * EPS * np.max(r))
+                np.testing.assert_allclose(back, [x, y, z], rtol=0, atol=8 * EPS * np.max(r))
+                rho, th, zz = self.call_points("CoordConversion_head", (x, y, z), 2, unit)
+                np.testing.assert_array_equal(rho, np.sqrt(x * x + y * y))
+                np.testing.assert_allclose(th, np.arctan2(y, x) * k, rtol=4 * EPS, atol=0)
+                np.testing.assert_array_equal(zz, z)
+                back = self.call_points("CoordConversion_head", (rho, th, zz), 3, unit)
+                np.testing.assert_allclose(back, [x, y, z], rtol=0, atol=8 * EPS * np.max(rho))
 
 
 if __name__ == "__main__":
