@@ -10,7 +10,8 @@ namespace {
 
 // The frame of the point-wise exports: K inputs of equal length in, K outputs of that length.
 // The empty test comes before the length test; `prepare` runs its own checks before any output
-// is resized, `core` then fills them.
+// is resized, `core` then fills them. Outputs are resized before the inputs are viewed, so that
+// an output handle that is also an input is worked on in place rather than read after it moved.
 template <int K, class Prepare, class Core>
 Status Points(Handle const (&in)[K], Handle* const (&out)[K], Prepare prepare, Core core) {
     Frame f;
@@ -24,9 +25,9 @@ Status Points(Handle const (&in)[K], Handle* const (&out)[K], Prepare prepare, C
     const double* x[K] = {};
     double* y[K] = {};
     Status s = empty ? EmptyArrayErr : unequal ? SizeMismatchErr : prepare();
-    for (int k = 0; k < K && s == 0; ++k) s = f.In(in[k], &x[k]);
     for (int k = 0; k < K && s == 0; ++k)
         if (f.Resize(*out[k], n, &y[k]) != 0) s = OutOfMemoryErr;
+    for (int k = 0; k < K && s == 0; ++k) s = f.In(in[k], &x[k]);
     if (s == 0) s = core(x, y, n);
     return f.Finish(s);
 }

@@ -171,6 +171,11 @@ TEST_P(Numeric, CoordinateCheckOrder) {
         EXPECT_EQ(Direction2Euler_head(m->h(), &angles[0], &angles[1], &angles[2]), SizeMismatchErr);
         for (double v : angles) EXPECT_TRUE(twtest::IsFailureNaN(v));
     }
+    // Outputs that are also inputs: worked on in place, never read after the host moved them.
+    Array1D<double> x{1, 2, 3}, y{4, 5, 6}, z{7, 8, 9}, nx, ny, nz;
+    ASSERT_EQ(CoordRotationEuler2011_head(x.h(), y.h(), z.h(), 0.1, 0.2, 0.3, 4, nx.h(), ny.h(), nz.h()), 0);
+    ASSERT_EQ(CoordRotationEuler2011_head(x.h(), y.h(), z.h(), 0.1, 0.2, 0.3, 4, x.h(), y.h(), z.h()), 0);
+    EXPECT_TRUE(x.vec() == nx.vec() && y.vec() == ny.vec() && z.vec() == nz.vec());
     Array2D<double> m(1, 1, {5});
     EXPECT_EQ(Euler2Direction2011_head(0.1, 0.2, 0.3, 12, m.h()), InvalidSelectorErr);
     EXPECT_EQ(m.rows() + m.cols(), 0);
