@@ -1,21 +1,30 @@
 #include "numeric/scaling.hpp"
 
+#include <emmintrin.h>
+
 #include <cmath>
 #include <limits>
 
 namespace tw {
 
 void RangeScale(double* x, int32_t n, double* offset, double* scale) {
-    // Four independent lanes: max and min are exact, so the lane split cannot change them. The
-    // comparison form leaves a NaN element out of the running value.
+    // max and min are exact, so the lane split cannot change them. _mm_max_pd(v, m) is
+    // v > m ? v : m lane by lane, the comparison form that passes over a NaN element.
     constexpr double kInf = std::numeric_limits<double>::infinity();
-    double hi[4] = {-kInf, -kInf, -kInf, -kInf}, lo[4] = {kInf, kInf, kInf, kInf};
+    __m128d hi0 = _mm_set1_pd(-kInf), hi1 = hi0, lo0 = _mm_set1_pd(kInf), lo1 = lo0;
     int32_t i = 0;
-    for (; i + 4 <= n; i += 4)
-        for (int k = 0; k < 4; ++k) {
-            hi[k] = x[i + k] > hi[k] ? x[i + k] : hi[k];
-            lo[k] = x[i + k] < lo[k] ? x[i + k] : lo[k];
-        }
+    for (; i + 4 <= n; i += 4) {
+        const __m128d a = _mm_loadu_pd(x + i), b = _mm_loadu_pd(x + i + 2);
+        hi0 = _mm_max_pd(a, hi0);
+        hi1 = _mm_max_pd(b, hi1);
+        lo0 = _mm_min_pd(a, lo0);
+        lo1 = _mm_min_pd(b, lo1);
+    }
+    double hi[4], lo[4];
+    _mm_storeu_pd(hi, hi0);
+    _mm_storeu_pd(hi + 2, hi1);
+    _mm_storeu_pd(lo, lo0);
+    _mm_storeu_pd(lo + 2, lo1);
     for (; i < n; ++i) {
         hi[0] = x[i] > hi[0] ? x[i] : hi[0];
         lo[0] = x[i] < lo[0] ? x[i] : lo[0];

@@ -37,7 +37,7 @@ TEST_P(Numeric, InPlace) {
         double r0, r1;
     };
     const Case cases[] = {
-        {range, {kNaNIn, kNaNIn}, 0, {kNaNIn, kNaNIn}, kNaNIn, kNaNIn},  // all NaN: data stay
+        {range, V(5, kNaNIn), 0, V(5, kNaNIn), kNaNIn, kNaNIn},  // all NaN: data stay
         {range, {}, EmptyArrayErr, {}, kNaNIn, kNaNIn},
         {unit(2), {0, -0.0}, 0, {0, -0.0}, 0, 5},                          // norm 0: data stay
         {unit(0), {3, -1}, DegenerateDataErr, {}, kNaNIn, 5},
