@@ -63,9 +63,19 @@ double StartTerm(const double* x, int32_t method, int32_t r, double h) {
 
 }  // namespace
 
+double IntegrateSamples(const double* x, int32_t n, double dt, int32_t method, IntegrationRules rules) {
+    const double h = std::fabs(dt);
+    if (method == 0) return Trapezoid(x, n, h);
+    if (method == 4) return h * Sum(x, n - 1);
+    if (method == 5) return h * Sum(x + 1, n - 1);
+    const int32_t w = kWidth[method];
+    const int32_t panels = (n - 1) / w, r = (n - 1) % w;
+    if (rules == IntegrationRules::Older) return Panels(x, panels, method, h) + EndTerm(x, n, r, h);
+    return Panels(x + r, panels, method, h) + StartTerm(x, method, r, h);
+}
+
 Status Integrate1D(const double* x, int32_t n, double dt, int32_t method, IntegrationRules rules,
                    double* result) {
-    const double h = std::fabs(dt);
     if (rules == IntegrationRules::Older) {
         if (method < 0 || method > 3) return InvalidSelectorErr;
         if (n < method + 2) return SizeMismatchErr;
@@ -74,49 +84,28 @@ Status Integrate1D(const double* x, int32_t n, double dt, int32_t method, Integr
         const int64_t minimum = (method == 4 || method == 5) ? 2 : int64_t{method} + 2;
         if (n < minimum) return SizeMismatchErr;
         if (method < 0 || method > 5) return InvalidSelectorErr;
-        if (method == 4) {
-            *result = h * Sum(x, n - 1);
-            return 0;
-        }
-        if (method == 5) {
-            *result = h * Sum(x + 1, n - 1);
-            return 0;
-        }
     }
-    if (method == 0) {
-        *result = Trapezoid(x, n, h);
-        return 0;
-    }
-    const int32_t w = kWidth[method];
-    const int32_t panels = (n - 1) / w, r = (n - 1) % w;
-    if (rules == IntegrationRules::Older)
-        *result = Panels(x, panels, method, h) + EndTerm(x, n, r, h);
-    else
-        *result = Panels(x + r, panels, method, h) + StartTerm(x, method, r, h);
+    *result = IntegrateSamples(x, n, dt, method, rules);
     return 0;
 }
 
-Status Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
-                   IntegrationRules rules, double* result) {
-    Scratch<double> rowResults;
-    if (rowResults.Allocate(static_cast<size_t>(rows)) != 0) return OutOfMemoryErr;
-    Status s = 0;
-    for (int32_t i = 0; i < rows && s == 0; ++i)
-        s = Integrate1D(x + static_cast<size_t>(i) * cols, cols, spacing[0], method, rules, &rowResults[i]);
-    if (s == 0) s = Integrate1D(rowResults.get(), rows, spacing[1], method, rules, result);
-    return MergeRelease(s, rowResults.Release());
+double Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
+                   IntegrationRules rules, double* rowResults) {
+    for (int32_t i = 0; i < rows; ++i)
+        rowResults[i] = IntegrateSamples(x + static_cast<size_t>(i) * cols, cols, spacing[0], method, rules);
+    return IntegrateSamples(rowResults, rows, spacing[1], method, rules);
 }
 
-Status Integrate3D(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing,
-                   int32_t method, IntegrationRules rules, double* result) {
-    Scratch<double> slabResults;
-    if (slabResults.Allocate(static_cast<size_t>(d2)) != 0) return OutOfMemoryErr;
+Status IntegrateGrid(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing, int32_t method,
+                     IntegrationRules rules, double* result) {
+    Scratch<double> work;
+    if (work.Allocate(static_cast<size_t>(d0) + static_cast<size_t>(d2)) != 0) return OutOfMemoryErr;
+    double* slabResults = work.get() + d0;
     const size_t slab = static_cast<size_t>(d0) * static_cast<size_t>(d1);
-    Status s = 0;
-    for (int32_t k = 0; k < d2 && s == 0; ++k)
-        s = Integrate2D(x + k * slab, d0, d1, spacing, method, rules, &slabResults[k]);
-    if (s == 0) s = Integrate1D(slabResults.get(), d2, spacing[2], method, rules, result);
-    return MergeRelease(s, slabResults.Release());
+    for (int32_t k = 0; k < d2; ++k)
+        slabResults[k] = Integrate2D(x + k * slab, d0, d1, spacing, method, rules, work.get());
+    *result = d2 == 1 ? slabResults[0] : IntegrateSamples(slabResults, d2, spacing[2], method, rules);
+    return work.Release();
 }
 
 }  // namespace tw

@@ -14,20 +14,23 @@ namespace tw {
 
 enum class IntegrationRules { Older, LeftoverAtStart };
 
-// n >= 1; h = |dt|. Checks the method and the minimum length in the order of its generation
-// (older: method then size; later: size then method).
+// The rule of `method` (0..5) over n samples, h = |dt|. n is at least 3, or at least 2 for the
+// trapezoid, the rectangles and the older rules; the later Bode rule needs 5.
+double IntegrateSamples(const double* x, int32_t n, double dt, int32_t method, IntegrationRules rules);
+
+// The 1-D entry: the method and the minimum length checked in the order of the generation
+// (older: method, then size; later: size, then method), then IntegrateSamples.
 Status Integrate1D(const double* x, int32_t n, double dt, int32_t method, IntegrationRules rules,
                    double* result);
 
-// Each row (cols samples, step spacing[0]) integrated, then the row results (step spacing[1]).
-// Dimensions and method are checked by the caller; a row too short for the method's rule is the
-// 1-D status.
-Status Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
-                   IntegrationRules rules, double* result);
+// Rows of cols samples integrated with step spacing[0], then the row results with spacing[1];
+// rowResults holds rows values.
+double Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
+                   IntegrationRules rules, double* rowResults);
 
-// d2 slabs of d0 by d1, each as in 2-D with spacing[0] and spacing[1], then the slab results with
-// spacing[2].
-Status Integrate3D(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing,
-                   int32_t method, IntegrationRules rules, double* result);
+// d2 slabs of d0 by d1, each as in 2-D, then the slab results with spacing[2]; d2 = 1 is the
+// plain 2-D integral. Dimensions and method are checked by the caller.
+Status IntegrateGrid(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing, int32_t method,
+                     IntegrationRules rules, double* result);
 
 }  // namespace tw

@@ -18,8 +18,8 @@ Status OneD(Handle x, double dt, int32_t method, IntegrationRules rules, double*
     return f.Finish(s);
 }
 
-// The later core reads five samples in Bode's start terms; the older one three at most in the
-// rules a 3-sample dimension can take.
+// Every rule works from 3 samples on (the older ones close a short run with lower rules), except
+// the later Bode rule, whose start terms read five samples.
 int32_t MinimumDimension(uint16_t method, IntegrationRules rules) {
     return rules == IntegrationRules::LeftoverAtStart && method == 3 ? 5 : 3;
 }
@@ -36,7 +36,7 @@ Status TwoD(Handle data, Handle spacing, uint16_t method, IntegrationRules rules
                : method > 3                                  ? InvalidSelectorErr
                                                              : f.In2D(data, &x);
     if (s == 0) s = f.In(spacing, &step);
-    if (s == 0) s = Integrate2D(x, d.rows, d.cols, step, method, rules, result);
+    if (s == 0) s = IntegrateGrid(x, d.rows, d.cols, 1, step, method, rules, result);
     return f.Finish(s);
 }
 
@@ -65,7 +65,7 @@ Status ThreeD(Handle data, Handle spacing, uint16_t method, IntegrationRules rul
             x = copy.get();
         }
     }
-    if (s == 0) s = Integrate3D(x, d0, d1, d2, step, method, rules, result);
+    if (s == 0) s = IntegrateGrid(x, d0, d1, d2, step, method, rules, result);
     return f.Finish(MergeRelease(s, copy.Release()));
 }
 
