@@ -89,12 +89,17 @@ Status Integrate1D(const double* x, int32_t n, double dt, int32_t method, Integr
     return 0;
 }
 
+namespace {
+
+// Rows of cols samples with step spacing[0], then the row results with spacing[1].
 double Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
                    IntegrationRules rules, double* rowResults) {
     for (int32_t i = 0; i < rows; ++i)
         rowResults[i] = IntegrateSamples(x + static_cast<size_t>(i) * cols, cols, spacing[0], method, rules);
     return IntegrateSamples(rowResults, rows, spacing[1], method, rules);
 }
+
+}  // namespace
 
 Status IntegrateGrid(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing, int32_t method,
                      IntegrationRules rules, double* result) {

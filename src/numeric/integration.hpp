@@ -23,13 +23,9 @@ double IntegrateSamples(const double* x, int32_t n, double dt, int32_t method, I
 Status Integrate1D(const double* x, int32_t n, double dt, int32_t method, IntegrationRules rules,
                    double* result);
 
-// Rows of cols samples integrated with step spacing[0], then the row results with spacing[1];
-// rowResults holds rows values.
-double Integrate2D(const double* x, int32_t rows, int32_t cols, const double* spacing, int32_t method,
-                   IntegrationRules rules, double* rowResults);
-
-// d2 slabs of d0 by d1, each as in 2-D, then the slab results with spacing[2]; d2 = 1 is the
-// plain 2-D integral. Dimensions and method are checked by the caller.
+// d2 slabs of d0 rows by d1 columns: each row with step spacing[0], the row results with
+// spacing[1], then the slab results with spacing[2]; d2 = 1 is the plain 2-D integral.
+// Dimensions and method are checked by the caller.
 Status IntegrateGrid(const double* x, int32_t d0, int32_t d1, int32_t d2, const double* spacing, int32_t method,
                      IntegrationRules rules, double* result);
 
