@@ -127,15 +127,15 @@ class Scaling(unittest.TestCase):
             self.assertLessEqual(abs(norm.value - np.linalg.norm(a, y)), 4 * n * EPS * ref)
 
 
-# Leftover rules in units of h: at the end (older), at the start (later) by method and leftover.
-END_RULES = {1: [1 / 2, 1 / 2], 2: [1 / 3, 4 / 3, 1 / 3], 3: [3 / 8, 9 / 8, 9 / 8, 3 / 8]}
+# Start rules of the later generation by (method, leftover): coefficients, then the divisor.
 START_RULES = {(1, 1): [5, 8, -1, 12], (2, 1): [9, 19, -5, 1, 24], (2, 2): [1, 4, 1, 3],
                (3, 1): [251, 646, -264, 106, -19, 720], (3, 2): [29, 124, 24, 4, -1, 90],
                (3, 3): [27, 102, 72, 42, -3, 80]}
 
 
 def weights(n, method, later):
-    """Weights in units of h: whole panels of newton_cotes, then the leftover rule."""
+    """Weights in units of h: whole panels of newton_cotes, and the leftover at the end (older:
+    the newton_cotes rule of the leftover's width) or at the start (later: START_RULES)."""
     w = np.zeros(n)
     if method in (0, 4, 5):
         w[:-1] += method in (0, 4)
@@ -147,7 +147,7 @@ def weights(n, method, later):
         w[:len(rule) - 1] = np.array(rule[:-1]) / rule[-1]
         start = r
     elif r:
-        w[n - r - 1:] = END_RULES[r]
+        w[n - r - 1:] = scipy.integrate.newton_cotes(r, 1)[0]
     for p in range(start, n - method - 1, method + 1):
         w[p:p + method + 2] += scipy.integrate.newton_cotes(method + 1, 1)[0]
     return w
