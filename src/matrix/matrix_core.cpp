@@ -224,21 +224,6 @@ Status ConditionNumber(const T* a, int32_t m, int32_t n, int32_t type, double* c
     return MergeRelease(MergeRelease(s, lu.Release()), perm.Release());
 }
 
-// Sum of term(x[i]) in eight running sums over the whole blocks of eight, combined pairwise, then
-// the tail in order: independent sums run at the machine's throughput instead of its addition
-// latency, in a fixed order, so the result does not depend on the build. Below eight elements it
-// is the plain running sum.
-template <class T, class Term>
-double LaneSum(const T* x, int32_t n, Term term) {
-    double s[8] = {0, 0, 0, 0, 0, 0, 0, 0};
-    int32_t i = 0;
-    for (; i + 8 <= n; i += 8)
-        for (int k = 0; k < 8; ++k) s[k] += term(x[i + k]);
-    double sum = ((s[0] + s[1]) + (s[2] + s[3])) + ((s[4] + s[5]) + (s[6] + s[7]));
-    for (; i < n; ++i) sum += term(x[i]);
-    return sum;
-}
-
 template <class T>
 Status VectorNorm(T* x, int32_t n, double p, int32_t normalise, double* result) {
     *result = kNaN;
@@ -250,9 +235,10 @@ Status VectorNorm(T* x, int32_t n, double p, int32_t normalise, double* result) 
         for (int32_t i = 1; i < n; ++i)
             norm = p > 0 ? std::max(norm, Magnitude(x[i])) : std::min(norm, Magnitude(x[i]));
     } else if (p == 1) {
-        norm = LaneSum(x, n, [](const T& v) { return Magnitude(v); });
+        for (int32_t i = 0; i < n; ++i) norm += Magnitude(x[i]);
     } else if (p == 2) {
-        norm = std::sqrt(LaneSum(x, n, [](const T& v) { return Abs2(v); }));
+        for (int32_t i = 0; i < n; ++i) norm += Abs2(x[i]);
+        norm = std::sqrt(norm);
     } else {
         // |z|^p of a complex element is (re^2 + im^2)^(p/2); of a real one |x|^p.
         for (int32_t i = 0; i < n; ++i)

