@@ -24,6 +24,10 @@ TW_API void TW_Beta_85(double a, double b, double x, double* out, int32_t select
 TW_API void TW_Erf(double x, double* out);
 TW_API void TW_ErfC(double x, double* out);
 
+/* Bessel functions of real order v: J_v(x), Y_v(x) and the modified I_v(x). */
+TW_API void TW_BesselJr(double v, double x, double* out);
+TW_API void TW_BesselYr(double v, double x, double* out);
+TW_API void TW_BesselIr(double v, double x, double* out);
 /* Modified Bessel function of the second kind K_n(x), integer order (|n| is used). */
 TW_API void TW_BesselKn(int32_t n, double x, double* out);
 

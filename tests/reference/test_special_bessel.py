@@ -37,6 +37,9 @@ def export(name, *argtypes, results=1):
 
 
 kn_c = export("TW_BesselKn", I32, D)
+jv_c = export("TW_BesselJr", D, D)
+yv_c = export("TW_BesselYr", D, D)
+iv_c = export("TW_BesselIr", D, D)
 
 
 def ulps(lib, ref):
@@ -94,6 +97,167 @@ class ModifiedK(unittest.TestCase):
         self.assertEqual(list(kn_c([0, 3], [0.0, 0.0])), [np.inf, np.inf])
         self.assertEqual(list(kn_c([0, 5], [np.inf, np.inf])), [0.0, 0.0])
         self.assertTrue(np.all(np.isnan(kn_c([0, 2, 2], [-1.0, -np.inf, np.nan]))))
+
+
+def modulus(v, x):
+    """sqrt(J^2 + Y^2): the envelope an oscillating J or Y is measured against."""
+    return np.hypot(sc.jv(v, x), sc.yv(v, x))
+
+
+def j_model(v, x):
+    """Error model of J: rounding of the phase (grows with x), of the logarithmic route for huge or
+    tiny values (grows with |ln M|), and the series' loss of eps I_0(x) where it runs to x ~ 14."""
+    m = modulus(v, x)
+    return EPS * (m * (1 + x + np.abs(np.log(m))) + np.where((x > 8) & (x < 15), sc.i0(x), 0.0))
+
+
+def order_grid(vlo, vhi, xlo, xhi, n=1500, integer=False):
+    v = uniform(vlo, vhi, n)
+    v = np.round(v) if integer else v[np.abs(v - np.round(v)) > 1e-3]  # SciPy's jv errs just off an integer
+    return v, uniform(xlo, xhi, v.size)
+
+
+J_REGIONS = {
+    "recurrence, small x": (0, 17, 0.01, 8),
+    "recurrence, series to 14": (-17, 17, 8, 14),
+    "recurrence, Hankel": (-17, 17, 14, 300),
+    "ascending series": (17, 200, 0.05, 40),
+    "orders to 200": (17, 200, 40, 3000),
+    "negative orders": (-200, -17, 0.05, 100),
+}
+
+
+class BesselJY(unittest.TestCase):
+    def test_orders_0_and_1_are_the_published_rational_forms(self):
+        # Same routine as SciPy's: a few ulp of the envelope (near a zero the value's own ulp shrinks).
+        x = np.concatenate([uniform(0, 5), uniform(5, 200), logspace(1e-300, 1e-4), [5.0, 1e-5]])
+        for name, lib, ref, order in [("J0", jv_c(0.0, x), sc.j0(x), 0), ("J1", jv_c(1.0, x), sc.j1(x), 1),
+                                      ("J1 at -x, order -1", jv_c(-1.0, -x), sc.j1(x), 1),
+                                      ("Y0", yv_c(0.0, x), sc.y0(x), 0), ("Y1", yv_c(1.0, x), sc.y1(x), 1)]:
+            env = np.maximum(np.abs(ref), modulus(order, x))
+            err = np.abs(lib - ref) / (EPS * env)
+            self.assertLessEqual(record(name + " (ulp of the envelope)", err.max()), 4, name)
+
+    def test_j_every_region_within_its_error_model(self):
+        for name, box in J_REGIONS.items():
+            for integer in (False, True):
+                with self.subTest(region=name, integer=integer):
+                    v, x = order_grid(*box, integer=integer)
+                    ref = sc.jv(v, x)
+                    fin = np.isfinite(ref)
+                    lib = jv_c(v, x)
+                    self.assertTrue(np.all(np.isinf(lib[~fin])))
+                    err = np.abs(lib - ref)[fin] / j_model(v, x)[fin]
+                    self.assertLessEqual(record("J (model units)", np.max(err)), 128, name)
+
+    def test_y_divides_both_j_errors_by_sin(self):
+        for name, box in J_REGIONS.items():
+            with self.subTest(region=name):
+                v, x = order_grid(*box)
+                ref = sc.yv(v, x)
+                lib = yv_c(v, x)
+                # The reflection needs J(-v), which overflows to NaN where Y is beyond ~1e300.
+                fin = np.abs(ref) < 1e290
+                model = (j_model(v, x) + j_model(-v, x)) / np.abs(np.sin(np.pi * v))
+                err = np.abs(lib - ref)[fin] / model[fin]
+                self.assertLessEqual(record("Y (model units)", np.max(err)), 128, name)
+
+    def test_integer_y_is_the_upward_recurrence(self):
+        n = RNG.integers(-40, 40, 2000)
+        x = logspace(0.05, 500, 2000)
+        ref = sc.yn(n, x)
+        fin = np.abs(ref) < 1e300
+        err = np.abs(yv_c(n.astype(float), x) - ref)[fin] / (EPS * modulus(n, x)[fin] * (np.abs(n[fin]) + 1))
+        self.assertLessEqual(record("Yn (model units: eps M per order)", err.max()), 16)
+
+    def test_large_orders_by_the_uniform_expansions(self):
+        v = uniform(250, 420, 1500)
+        x = v * uniform(0.2, 3.0, 1500)  # both sides of the turning point, and through it
+        x = np.concatenate([x, v + uniform(-0.7, 0.7, 1500) * np.cbrt(v)])
+        v = np.concatenate([v, v])
+        ref, m = sc.jv(v, x), modulus(v, x)
+        # jnt stops after the n^-8/3 term of the transitional expansion.
+        model = j_model(v, x) + 1e-3 * m * v ** (-10 / 3)
+        err = np.abs(jv_c(v, x) - ref) / model
+        self.assertLessEqual(record("J orders 250-420 (model units)", np.max(err)), 16)
+
+    def test_parity_and_screens(self):
+        v = np.array([2.0, 3.0, 10.0, 11.0, 250.0, 251.0])
+        x = np.array([1.0, 1.0, 7.5, 30.0, 260.0, 240.0])
+        parity = np.where(v % 2 == 1, -1.0, 1.0)
+        np.testing.assert_array_equal(jv_c(v, -x), parity * jv_c(v, x))
+        np.testing.assert_array_equal(jv_c(-v, x), parity * jv_c(v, x))
+        nan = [(0.5, -1.0), (np.nan, 1.0), (np.inf, 1.0), (-np.inf, 1.0), (2.0, np.inf), (2.0, np.nan),
+               (-200.5, 10.0)]
+        self.assertTrue(all(np.isnan(jv_c(a, b)) for a, b in nan))
+        self.assertTrue(all(np.isnan(yv_c(a, b)) for a, b in nan + [(0.5, 0.0), (2.0, 0.0), (0.0, -1.0),
+                                                                    (200.5, 10.0), (-200.5, 10.0),
+                                                                    (150.5, 0.5)]))
+        self.assertEqual(list(jv_c([2.5, -2.5, 3.0], [1e-17, 1e-17, -1e-17])), [0.0, 0.0, 0.0])
+
+
+class BesselI(unittest.TestCase):
+    def test_real_orders_through_kummers_function(self):
+        v, x = order_grid(-200, 200, 0.01, 60, n=3000)
+        v2, x2 = order_grid(-20, 20, 60, 300, n=1000)  # beyond, M(2x) may overflow (ruled: +Infinity)
+        v, x = np.concatenate([v, v2]), np.concatenate([x, x2])
+        ref = sc.iv(v, x)
+        keep = np.isfinite(ref) & (np.abs(ref) > 1e-290) & (np.abs(ref) < 1e290)
+        keep &= np.abs(v + 1) < 170  # beyond, Gamma(v + 1) over- or underflows in the stated form
+        # Summing n ~ 2x + |v| terms of 1F1, and the factor exp(v ln(x/2) - x) (its argument's
+        # rounding is relative in the result). For b = 2v + 1 < 0 the series divides by b + n, whose
+        # rounding of b is relative to its distance from an integer.
+        lg = np.abs(v * np.log(x / 2) - x)
+        b = 2 * v + 1
+        near = np.where(b < 0, np.abs(b) / np.abs(b - np.round(b)), 0.0)
+        model = EPS * (2 * x + np.abs(v) + lg + near + 50) * np.abs(ref)
+        err = np.abs(iv_c(v, x) - ref)[keep] / model[keep]
+        self.assertLessEqual(record("I (model units)", err.max()), 4)
+
+    def test_integer_orders_by_miller_recurrence(self):
+        n = RNG.integers(-60, 60, 3000)
+        x = np.concatenate([logspace(1e-6, 700, 2500), -logspace(1e-3, 50, 500)])
+        ref = sc.iv(n, x)
+        keep = np.isfinite(ref) & (np.abs(ref) > 1e-290)
+        # I0 times a ratio of recurrence values: each step from the start index rounds.
+        a = np.abs(n[keep])
+        steps = np.maximum(2 * (a + np.floor(np.sqrt(100 * a))), np.sqrt(a * a + 78 * np.abs(x[keep])))
+        err = ulps(iv_c(n.astype(float), x)[keep], ref[keep]) / (steps + 4)
+        self.assertLessEqual(record("In (ulp per recurrence step)", err.max()), 8)
+        self.assertLessEqual(worst_ulp("I0", iv_c(0.0, x), sc.i0(x)), 4)
+        self.assertLessEqual(worst_ulp("I1", iv_c(1.0, x), sc.i1(x)), 4)
+
+    def test_rulings(self):
+        cases = [  # (v, x, reference, ulp)
+            (2.7, 80.0, sc.iv(2.7, 80.0), 300),   # no term cap in 1F1
+            (20.5, 40.0, sc.iv(20.5, 40.0), 300),
+            (3.0, 600.0, sc.iv(3, 600.0), 1e4),   # Miller start past the turning point
+            (5.0, 2e-8, sc.iv(5, 2e-8), 4),        # leading term, where the recurrence overflows
+            (-4.0, -1e-9, sc.iv(4, 1e-9), 4),
+            (-0.5, 1.0, 1.2312002145929677, 8),   # b = 2v + 1 <= 0: downward recurrence
+        ]
+        for v, x, ref, tol in cases:
+            with self.subTest(v=v, x=x):
+                self.assertLessEqual(worst_ulp("I rulings", iv_c(v, x), ref), tol)
+        # The same recurrence at other half-integers. Its K part grows downward, so the rounding of
+        # the start values, eps I_1/2(x), is carried up with it; each step rounds too.
+        v = -0.5 - RNG.integers(0, 60, 800)
+        x = logspace(0.01, 40, 800)
+        ref = sc.iv(v, x)
+        carried = sc.iv(0.5, x) * sc.kv(-v, x) / sc.kv(0.5, x)
+        err = np.abs(iv_c(v, x) - ref) / (EPS * (np.abs(v) + 1) * (np.abs(ref) + carried))
+        self.assertLessEqual(record("I negative half-integer (model units)", err.max()), 16)
+        # 1F1(2x) overflows: +Infinity, never NaN.
+        np.testing.assert_array_equal(iv_c([2.5, 30.5, 0.5], [400.0, 600.0, 1000.0]), np.inf)
+
+    def test_edges(self):
+        v = [-0.5, -1.5, -2.5, 2.5, 0.0, -3.0, np.inf, np.inf, 2.5]
+        x = [0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 3.0, np.inf]
+        np.testing.assert_array_equal(iv_c(v, x), [np.inf, -np.inf, np.inf, 0.0, 1.0, 0.0, 0.0, 0.0, np.inf])
+        nan = [(np.nan, 1.0), (1.0, np.nan), (-np.inf, 1.0), (1.0, -np.inf), (np.inf, np.inf), (-200.5, 1.0),
+               (0.5, -1.0)]
+        self.assertTrue(all(np.isnan(iv_c(a, b)) for a, b in nan))
+        self.assertEqual(iv_c(3.0, -2.0), -iv_c(3.0, 2.0))
 
 
 def print_report(title, figures):
