@@ -389,3 +389,23 @@ double BesselY(double v, double x) {
 }
 
 }  // namespace tw
+
+namespace tw {
+
+double SphericalBesselJ(int32_t n, double x) {
+    double r;
+    if (Screened(x, 0.0, kNaN, &r)) return r;
+    if (x < 0.0) return kNaN;
+    if (x == 0.0) return n == 0 ? 1.0 : 0.0;
+    return BesselJ(n + 0.5, x) * std::sqrt(kPi / (2.0 * x));
+}
+
+double SphericalBesselY(int32_t n, double x) {
+    double r;
+    if (Screened(x, 0.0, kNaN, &r)) return r;
+    if (x < 0.0) return kNaN;
+    if (x == 0.0) return -kInf;
+    return BesselY(n + 0.5, x) * std::sqrt(kPi / (2.0 * x));
+}
+
+}  // namespace tw

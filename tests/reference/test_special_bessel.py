@@ -40,6 +40,11 @@ kn_c = export("TW_BesselKn", I32, D)
 jv_c = export("TW_BesselJr", D, D)
 yv_c = export("TW_BesselYr", D, D)
 iv_c = export("TW_BesselIr", D, D)
+js_c = export("TW_BesselJs", I32, D)
+ys_c = export("TW_BesselYs", I32, D)
+airy_c = export("TW_Airy", D, results=4)
+keli_c = export("TW_KelvinI", D, I32, results=2)
+kelk_c = export("TW_KelvinK", D, I32, results=2)
 
 
 def ulps(lib, ref):
@@ -258,6 +263,103 @@ class BesselI(unittest.TestCase):
                (0.5, -1.0)]
         self.assertTrue(all(np.isnan(iv_c(a, b)) for a, b in nan))
         self.assertEqual(iv_c(3.0, -2.0), -iv_c(3.0, 2.0))
+
+
+class Spherical(unittest.TestCase):
+    def test_half_integer_orders_scaled(self):
+        n = RNG.integers(-30, 30, 3000)
+        x = np.concatenate([logspace(1e-3, 1e3, 2500), uniform(8, 14, 500)])
+        f = np.sqrt(np.pi / (2 * x))
+        v = n + 0.5
+        jref, yref = f * sc.jv(v, x), f * sc.yv(v, x)
+        err = np.abs(js_c(n, x) - jref) / (f * j_model(v, x))
+        self.assertLessEqual(record("spherical j (model units)", err.max()), 128)
+        fin = np.abs(yref) < 1e290
+        model = f * (j_model(v, x) + j_model(-v, x))  # |sin (n + 1/2) pi| = 1
+        err = np.abs(ys_c(n, x) - yref)[fin] / model[fin]
+        self.assertLessEqual(record("spherical y (model units)", err.max()), 128)
+
+    def test_edges(self):
+        np.testing.assert_array_equal(js_c([0, 3, 0, -2], [0.0, 0.0, np.inf, np.inf]), [1.0, 0.0, 0.0, 0.0])
+        np.testing.assert_array_equal(ys_c([0, 3, 1], [0.0, 0.0, np.inf]), [-np.inf, -np.inf, 0.0])
+        self.assertTrue(np.all(np.isnan(js_c([0, 1, 2], [-1.0, np.nan, -np.inf]))))
+        self.assertTrue(np.all(np.isnan(ys_c([0, 1, 2], [-1.0, np.nan, -np.inf]))))
+
+
+class Airy(unittest.TestCase):
+    def test_against_scipy(self):
+        # |x| <= 10: the same published routine, a few ulp of the envelope sqrt(Ai^2 + Bi^2);
+        # beyond, SciPy uses AMOS.
+        for lo, hi, tol in [(-10, 10, 4), (-300, -10, 16), (10, 103.892, 16)]:
+            x = uniform(lo, hi, 3000)
+            lib, ref = airy_c(x), sc.airy(x)
+            env_f = np.hypot(ref[0], ref[2])
+            env_d = np.hypot(ref[1], ref[3])
+            # zeta = 2/3 |x|^(3/2) is rounded: it is a phase for x < 0 and the argument of exp for x > 0.
+            phase = 1 + np.abs(x) ** 1.5
+            # Ai, Ai' against the envelope of (Ai, Bi), (Ai', Bi'); Bi, Bi' likewise (they dominate
+            # where Ai decays, and are then measured in their own ulp).
+            for name, k, r, env in [("Ai", 0, 0, env_f), ("Bi", 1, 2, env_f), ("Ai'", 2, 1, env_d),
+                                    ("Bi'", 3, 3, env_d)]:
+                keep = (env > 1e-300) & np.isfinite(ref[r])
+                err = np.abs(lib[k] - ref[r])[keep] / (EPS * env[keep] * phase[keep])
+                self.assertLessEqual(record("%s (ulp of envelope x phase)" % name, err.max()), tol, name)
+
+    def test_limits_and_pointers(self):
+        big = 1.7976931348623157e308
+        self.assertEqual(airy_c(200.0), (0.0, np.inf, big, big))
+        self.assertEqual(airy_c(-np.inf), (0.0, 0.0, big, big))
+        self.assertTrue(all(np.isnan(airy_c(np.nan))))
+        fn = tw.lib.TW_Airy
+        ai, bi, aip, bip = D(-7.0), D(-7.0), D(-7.0), D(-7.0)
+        fn(D(1.5), ctypes.byref(ai), ctypes.byref(bi), None, ctypes.byref(bip))
+        self.assertEqual((bip.value, ai.value), (-7.0, float(sc.airy(1.5)[0])))  # no Ai': no derivatives
+        fn(D(1.5), None, ctypes.byref(bi), ctypes.byref(aip), None)
+        self.assertEqual((bi.value, aip.value), tuple(float(v) for v in np.array(sc.airy(1.5))[[2, 1]]))
+
+
+def kelvin_refs(n, x):
+    """ber + i bei = J_n(x e^(3 pi i/4)); ker + i kei = e^(-n pi i/2) K_n(x e^(pi i/4))."""
+    i = sc.jv(n, x * np.exp(3j * np.pi / 4))
+    k = np.exp(-1j * n * np.pi / 2) * sc.kv(n, x * np.exp(1j * np.pi / 4))
+    return i, k
+
+
+class Kelvin(unittest.TestCase):
+    def test_series_within_eps_i_n(self):
+        n = RNG.integers(-8, 9, 3000)
+        x = np.concatenate([uniform(0, 20, 2000), uniform(20, 60, 1000)])
+        ref, kref = kelvin_refs(n, x)
+        ber, bei = keli_c(x, n)
+        scale = EPS * sc.iv(n, x)
+        for name, lib, r in [("ber", ber, ref.real), ("bei", bei, ref.imag)]:
+            self.assertLessEqual(record(name + " (eps I_n units)", np.max(np.abs(lib - r) / scale)), 32, name)
+        xs = -x
+        np.testing.assert_array_equal(keli_c(xs, n)[0], np.where(n % 2 == 1, -1, 1) * ber)
+
+    def test_k_within_its_model(self):
+        n = RNG.integers(-8, 9, 3000)
+        x = np.concatenate([logspace(1e-3, 10, 2000), uniform(10, 60, 1000)])
+        _, ref = kelvin_refs(n, x)
+        ker, kei = kelk_c(x, n)
+        scale = EPS * (3 + 3 * np.abs(np.log(x / 2))) * np.maximum(sc.iv(n, x), np.abs(ref))
+        for name, lib, r in [("ker", ker, ref.real), ("kei", kei, ref.imag)]:
+            self.assertLessEqual(record(name + " (model units)", np.max(np.abs(lib - r) / scale)), 16, name)
+        # Beyond the series, the expansion is good to rounding of its phase.
+        far = x > 20
+        err = np.abs(ker + 1j * kei - ref)[far] / (EPS * np.abs(ref[far]) * (1 + x[far]))
+        self.assertLessEqual(record("ker + i kei beyond 20 (relative, eps (1 + x) units)", err.max()), 4)
+
+    def test_edges(self):
+        self.assertEqual(keli_c(0.0, 0), (1.0, 0.0))
+        self.assertEqual(keli_c(0.0, 3), (0.0, 0.0))
+        for f, x in [(keli_c, np.nan), (keli_c, np.inf), (keli_c, -np.inf), (kelk_c, 0.0), (kelk_c, -1.0),
+                     (kelk_c, np.nan)]:
+            self.assertTrue(all(np.isnan(f(x, 2))), (f, x))
+        self.assertEqual(kelk_c(np.inf, 1), (0.0, 0.0))
+        for x in (0.7, 12.0):
+            pos, neg = kelk_c(x, 3), kelk_c(x, -3)
+            self.assertEqual(neg, (-pos[0], -pos[1]))
 
 
 def print_report(title, figures):
