@@ -303,7 +303,7 @@ double BesselJ(double v, double x) {
     bool integer = false;
     if (std::floor(an) == an) {
         const double i = an - 16384.0 * std::floor(an / 16384.0);
-        const bool odd = std::fmod(i, 2.0) != 0.0;
+        const bool odd = (static_cast<int32_t>(i) & 1) != 0;  // 0 <= i < 16384
         if (v < 0.0) {
             if (odd) sign = -sign;
             v = an;
