@@ -18,13 +18,14 @@ namespace t = cephes::jv;
 
 constexpr double kMaxGamma = 171.624376956302725;
 constexpr double kLogPi = 1.14472988584940017414;
+constexpr int kMaxRecurPasses = 22000;  // beyond any continued fraction the regions lead to
+constexpr double kIntegerRecurLimit = 10000.0;
 
 // Ratio J_n / J_n-1 by its continued fraction, then the backward recurrence down to *newn.
 // Returns J_newn / J_n with the orders as reached: for a negative n whose fraction is small, n is
 // lowered by one and the fraction redone; with cancel, a non-negative end order rises by one when
 // the last iterate but one is the larger (less cancellation in it).
 double Recur(double* n, double x, double* newn, bool cancel) {
-    constexpr int kMaxIterations = 22000;  // beyond any region that reaches here
     bool negative = *n < 0.0;
     double ans = 0.0;
     for (;;) {
@@ -49,7 +50,7 @@ double Recur(double* n, double x, double* newn, bool cancel) {
             } else {
                 change = 1.0;
             }
-            if (++count > kMaxIterations) {
+            if (++count > kMaxRecurPasses) {
                 SpecialReport(SpecialFunction::BesselJ, SpecialFault::Underflow);
                 break;
             }
@@ -335,6 +336,10 @@ double BesselJ(double v, double x) {
         return sign * Hankel(v, x);
     }
     double q;
+    // The continued fraction of an integer order needs about x - n passes before it converges;
+    // far beyond the orders (where non-integer orders take Hankel's expansion already) so does
+    // this one, rather than run out of passes.
+    if (integer && y > kIntegerRecurLimit) return sign * Hankel(v, x);
     if (integer) {
         double low = 0.0;
         q = Recur(&v, x, &low, true);

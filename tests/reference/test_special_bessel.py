@@ -186,6 +186,12 @@ class BesselJY(unittest.TestCase):
         err = np.abs(jv_c(v, x) - ref) / model
         self.assertLessEqual(record("J orders 250-420 (model units)", np.max(err)), 16)
 
+    def test_integer_orders_far_beyond_the_order(self):
+        v = np.round(uniform(-17, 17, 400))
+        x = logspace(5e3, 1e9, 400)
+        err = np.abs(jv_c(v, x) - sc.jv(v, x)) / j_model(v, x)
+        self.assertLessEqual(record("J integer order, x to 1e9 (model units)", err.max()), 128)
+
     def test_parity_and_screens(self):
         v = np.array([2.0, 3.0, 10.0, 11.0, 250.0, 251.0])
         x = np.array([1.0, 1.0, 7.5, 30.0, 260.0, 240.0])
