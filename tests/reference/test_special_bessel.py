@@ -310,17 +310,11 @@ class Airy(unittest.TestCase):
                 err = np.abs(lib[k] - ref[r])[keep] / (EPS * env[keep] * phase[keep])
                 self.assertLessEqual(record("%s (ulp of envelope x phase)" % name, err.max()), tol, name)
 
-    def test_limits_and_pointers(self):
+    def test_limits(self):
         big = 1.7976931348623157e308
         self.assertEqual(airy_c(200.0), (0.0, np.inf, big, big))
         self.assertEqual(airy_c(-np.inf), (0.0, 0.0, big, big))
         self.assertTrue(all(np.isnan(airy_c(np.nan))))
-        fn = tw.lib.TW_Airy
-        ai, bi, aip, bip = D(-7.0), D(-7.0), D(-7.0), D(-7.0)
-        fn(D(1.5), ctypes.byref(ai), ctypes.byref(bi), None, ctypes.byref(bip))
-        self.assertEqual((bip.value, ai.value), (-7.0, float(sc.airy(1.5)[0])))  # no Ai': no derivatives
-        fn(D(1.5), None, ctypes.byref(bi), ctypes.byref(aip), None)
-        self.assertEqual((bi.value, aip.value), tuple(float(v) for v in np.array(sc.airy(1.5))[[2, 1]]))
 
 
 def kelvin_refs(n, x):

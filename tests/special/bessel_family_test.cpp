@@ -31,35 +31,21 @@ struct Case {
 };
 
 TEST(BesselFamily, EdgesAndSignRules) {
+    // Closed forms at half-integer orders and the stated edges; the wider screens and parity are
+    // checked in the reference suite.
     const std::vector<Case> cases = {
-        {"J_0.5(-1)", [] { return Call(TW_BesselJr, 0.5, -1.0); }, [] { return kNaN; }},
-        {"J_2(-1) = J_2(1)", [] { return Call(TW_BesselJr, 2.0, -1.0); }, [] { return Call(TW_BesselJr, 2.0, 1.0); }},
-        {"J_3(-1) = -J_3(1)", [] { return Call(TW_BesselJr, 3.0, -1.0); }, [] { return -Call(TW_BesselJr, 3.0, 1.0); }},
-        {"J_-3(2) = -J_3(2)", [] { return Call(TW_BesselJr, -3.0, 2.0); }, [] { return -Call(TW_BesselJr, 3.0, 2.0); }},
-        {"J_0(0)", [] { return Call(TW_BesselJr, 0.0, 0.0); }, [] { return 1.0; }},
-        {"J with NaN order", [] { return Call(TW_BesselJr, kNaN, 1.0); }, [] { return kNaN; }},
-        {"J with infinite order", [] { return Call(TW_BesselJr, kInf, 1.0); }, [] { return kNaN; }},
-        {"Y_0.5(0)", [] { return Call(TW_BesselYr, 0.5, 0.0); }, [] { return kNaN; }},
-        {"Y_2(-1)", [] { return Call(TW_BesselYr, 2.0, -1.0); }, [] { return kNaN; }},
-        {"Y with infinite order", [] { return Call(TW_BesselYr, -kInf, 1.0); }, [] { return kNaN; }},
-        {"Y_200.5(10): J(-200.5) is out of range", [] { return Call(TW_BesselYr, 200.5, 10.0); }, [] { return kNaN; }},
-        {"y_0(0)", [] { return Call(TW_BesselYs, 0, 0.0); }, [] { return -kInf; }},
-        {"j_0(0)", [] { return Call(TW_BesselJs, 0, 0.0); }, [] { return 1.0; }},
-        {"j_2(0)", [] { return Call(TW_BesselJs, 2, 0.0); }, [] { return 0.0; }},
-        // j_0 = sin x / x, y_0 = -cos x / x
+        // j_0 = sin x / x, y_0 = -cos x / x, I_1/2 = sqrt(2 / pi x) sinh x, I_-1/2 with cosh
         {"j_0(2)", [] { return Call(TW_BesselJs, 0, 2.0); }, [] { return std::sin(2.0) / 2.0; }},
         {"y_0(20)", [] { return Call(TW_BesselYs, 0, 20.0); }, [] { return -std::cos(20.0) / 20.0; }},
-        {"I_-0.5(0)", [] { return Call(TW_BesselIr, -0.5, 0.0); }, [] { return kInf; }},
-        {"I_-1.5(0)", [] { return Call(TW_BesselIr, -1.5, 0.0); }, [] { return -kInf; }},
-        {"I_3(0)", [] { return Call(TW_BesselIr, 3.0, 0.0); }, [] { return 0.0; }},
-        {"I_3(-2) = -I_3(2)", [] { return Call(TW_BesselIr, 3.0, -2.0); }, [] { return -Call(TW_BesselIr, 3.0, 2.0); }},
-        // I_1/2 = sqrt(2 / pi x) sinh x, I_-1/2 = sqrt(2 / pi x) cosh x
         {"I_0.5(3)", [] { return Call(TW_BesselIr, 0.5, 3.0); }, [] { return std::sqrt(2.0 / (M_PI * 3.0)) * std::sinh(3.0); }},
         {"I_-0.5(3)", [] { return Call(TW_BesselIr, -0.5, 3.0); }, [] { return std::sqrt(2.0 / (M_PI * 3.0)) * std::cosh(3.0); }},
-        {"I_2.5(400) overflows 1F1", [] { return Call(TW_BesselIr, 2.5, 400.0); }, [] { return kInf; }},
-        {"K_4(0)", [] { return Call(TW_BesselKn, 4, 0.0); }, [] { return kInf; }},
-        {"K_4(-1)", [] { return Call(TW_BesselKn, 4, -1.0); }, [] { return kNaN; }},
-        {"K_2(inf)", [] { return Call(TW_BesselKn, 2, kInf); }, [] { return 0.0; }},
+        {"J_0(0)", [] { return Call(TW_BesselJr, 0.0, 0.0); }, [] { return 1.0; }},
+        {"J_2(-1) = J_2(1)", [] { return Call(TW_BesselJr, 2.0, -1.0); }, [] { return Call(TW_BesselJr, 2.0, 1.0); }},
+        {"J_3(-1) = -J_3(1)", [] { return Call(TW_BesselJr, 3.0, -1.0); }, [] { return -Call(TW_BesselJr, 3.0, 1.0); }},
+        {"J_0.5(-1)", [] { return Call(TW_BesselJr, 0.5, -1.0); }, [] { return kNaN; }},
+        {"Y_0.5(0)", [] { return Call(TW_BesselYr, 0.5, 0.0); }, [] { return kNaN; }},
+        {"y_0(0)", [] { return Call(TW_BesselYs, 0, 0.0); }, [] { return -kInf; }},
+        {"I_-0.5(0)", [] { return Call(TW_BesselIr, -0.5, 0.0); }, [] { return kInf; }},
     };
     for (const Case& c : cases) {
         const double got = c.call();
