@@ -203,7 +203,7 @@ class BesselJY(unittest.TestCase):
         self.assertTrue(all(np.isnan(jv_c(a, b)) for a, b in nan))
         self.assertTrue(all(np.isnan(yv_c(a, b)) for a, b in nan + [(0.5, 0.0), (2.0, 0.0), (0.0, -1.0),
                                                                     (200.5, 10.0), (-200.5, 10.0),
-                                                                    (150.5, 0.5)]))
+                                                                    (150.5, 0.5), (300.0, 1.0)]))
         self.assertEqual(list(jv_c([2.5, -2.5, 3.0], [1e-17, 1e-17, -1e-17])), [0.0, 0.0, 0.0])
 
 
