@@ -28,7 +28,11 @@ double BlockChange(double before, double after) { return std::fabs(before - afte
 template <bool Digamma>
 bool KelvinSeries(double ax, int64_t n, double* re, double* im) {
     double term = 1.0;
-    for (int64_t j = 1; j <= n; ++j) term *= 0.5 * ax / static_cast<double>(j);
+    for (int64_t j = 1; j <= n && term != 0.0; ++j) term *= 0.5 * ax / static_cast<double>(j);
+    if (term == 0.0) {  // (x/2)^n / n! underflows: so does every term
+        *re = *im = 0.0;
+        return true;
+    }
     const double q = 0.25 * ax * ax;
     const double dn = static_cast<double>(n);
     double hk = 0.0, hnk = 0.0;  // harmonic numbers H_k and H_(n+k)
@@ -96,7 +100,7 @@ std::complex<double> KelvinKLarge(double x, int64_t n) {
         std::complex<double> km, kn;
         KLargeArgument(z, 0, &km);
         KLargeArgument(z, 1, &kn);
-        for (int64_t j = 1; j < n; ++j) {
+        for (int64_t j = 1; j < n && IsFinite(std::abs(kn)); ++j) {
             const std::complex<double> kp = km + (2.0 * static_cast<double>(j) / z) * kn;
             km = kn;
             kn = kp;
@@ -145,17 +149,19 @@ void KelvinK(double x, int32_t order, double* ker, double* kei) {
                     const double q = 0.25 * x * x;
                     const int phase0 = static_cast<int>((3 * n) % 8);
                     double fr = 0.0, fi = 0.0, power = 1.0;
-                    for (int64_t k = 0; k < n; ++k) {
+                    for (int64_t k = 0; k < n && (IsFinite(fr) || IsFinite(fi)); ++k) {
                         const int p = (phase0 + 2 * static_cast<int>(k % 4)) % 8;
                         const double w = FactorialFunc(static_cast<int32_t>(n - k - 1)) /
                                          FactorialFunc(static_cast<int32_t>(k)) * power;
-                        fr += kCos8[p] * w;
-                        fi += kSin8[p] * w;
+                        // Zero phases are skipped: an overflowing factorial must not turn 0 into NaN.
+                        if (kCos8[p] != 0.0) fr += kCos8[p] * w;
+                        if (kSin8[p] != 0.0) fi += kSin8[p] * w;
                         power *= q;
                     }
+                    // For orders so large that (x/2)^-n underflows, an overflowing sum wins.
                     const double scale = 0.5 * std::pow(x / 2.0, -static_cast<double>(n));
-                    re += scale * fr;
-                    im -= scale * fi;
+                    re += (scale == 0.0 && !IsFinite(fr)) ? fr : scale * fr;
+                    im -= (scale == 0.0 && !IsFinite(fi)) ? fi : scale * fi;
                 }
             }
         }
