@@ -1,5 +1,5 @@
-// Kummer's function against closed forms, through each of its routes, and its rules for zero,
-// equal and infinite parameters.
+// Kummer's function against closed forms through each of its routes, its rules for zero, equal
+// and infinite parameters; and the integer-order J recurrences the exports do not reach.
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -49,6 +49,32 @@ TEST(Hyp1F1, ParameterRules) {
     EXPECT_TRUE(std::isnan(tw::Hyp1F1(kNaN, 2.0, 1.0)));
     EXPECT_EQ(tw::Hyp1F1(1.0, -2.0, 1.0), kInf);  // b a non-positive integer: a pole
     EXPECT_EQ(tw::Hyp1F1(1.0, 2.0, 800.0), kInf);  // overflow is the value, not a failure
+}
+
+}  // namespace
+
+namespace {
+
+// BesselJn is reached from the exports only at orders 0 and 1; its recurrences are checked here.
+// Expected values: scipy.special.jv.
+TEST(BesselJn, MillerAndUpwardRecurrences) {
+    struct {
+        int n;
+        double x, expected;
+    } const cases[] = {
+        {2, 1.5, 0.23208767214421475},    {5, 0.3, 6.304432633771069e-07},    // Miller, n > |x|
+        {20, 10.0, 1.1513369247813376e-05}, {100, 1.0, 8.431828789626748e-189},
+        {60, 59.0, 0.08817412164270735},  {3, 7.0, -0.16755558799533432},    // upward, n <= |x|
+        {12, 40.0, -0.1269779961178481},  {-3, 2.5, -0.21660039103911358},   // signs
+        {4, -3.0, 0.13203418392461216},   {-5, -8.0, 0.18577477219056332},
+    };
+    // Each recurrence step rounds: a few eps per order.
+    for (const auto& c : cases)
+        EXPECT_NEAR(tw::BesselJn(c.n, c.x), c.expected, 8 * 2.2e-16 * (std::abs(c.n) + 1) * std::fabs(c.expected))
+            << c.n << " " << c.x;
+    EXPECT_EQ(tw::BesselJn(3, 0.0), 0.0);
+    EXPECT_EQ(tw::BesselJn(3, kInf), 0.0);
+    EXPECT_TRUE(std::isnan(tw::BesselJn(3, -kInf)));
 }
 
 }  // namespace
