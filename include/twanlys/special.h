@@ -24,4 +24,21 @@ TW_API void TW_Beta_85(double a, double b, double x, double* out, int32_t select
 TW_API void TW_Erf(double x, double* out);
 TW_API void TW_ErfC(double x, double* out);
 
+/* Bessel functions of real order v: J_v(x), Y_v(x) and the modified I_v(x). */
+TW_API void TW_BesselJr(double v, double x, double* out);
+TW_API void TW_BesselYr(double v, double x, double* out);
+TW_API void TW_BesselIr(double v, double x, double* out);
+/* Modified Bessel function of the second kind K_n(x), integer order (|n| is used). */
+TW_API void TW_BesselKn(int32_t n, double x, double* out);
+/* Spherical Bessel functions j_n(x), y_n(x). */
+TW_API void TW_BesselJs(int32_t n, double x, double* out);
+TW_API void TW_BesselYs(int32_t n, double x, double* out);
+/* Airy functions Ai, Bi and, when aip is not null, Ai', Bi' (each stored only through a non-null
+ * pointer). */
+TW_API void TW_Airy(double x, double* ai, double* bi, double* aip, double* bip);
+/* Kelvin functions of integer order: ber_n + i bei_n = J_n(x e^(3 pi i/4)) and
+ * ker_n + i kei_n = e^(-n pi i/2) K_n(x e^(pi i/4)). */
+TW_API void TW_KelvinI(double x, int32_t n, double* ber, double* bei);
+TW_API void TW_KelvinK(double x, int32_t n, double* ker, double* kei);
+
 #endif

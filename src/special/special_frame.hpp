@@ -51,6 +51,13 @@ enum class SpecialFunction : int32_t {
     IncGammaC,
     Erf,
     Erfc,
+    BesselJ,
+    BesselY,
+    BesselI,
+    BesselK,
+    Airy,
+    Kelvin,
+    Hyp1F1,
 };
 enum class SpecialFault : int32_t { Domain = 0, Pole = 1, Overflow = 2, Underflow = 3, Precision = 4 };
 
