@@ -4,6 +4,7 @@
 
 #include <cstdint>
 
+#include "matrix/lapack.hpp"
 #include "matrix/matrix_core.hpp"
 
 namespace tw {
@@ -29,11 +30,9 @@ int32_t PolyFromRoots(const cdouble* r, int32_t n, cdouble* c);
 // Schur form a = Q T Q^H. order: 0 none, 1 ascending real part, 2 descending real part,
 // 3 ascending magnitude, 4 descending magnitude. q null: no Schur vectors. select may be null;
 // sdim may be null. t receives T, values the eigenvalues along its diagonal.
-using SchurSelect = int (*)(const double* re, const double* im);
-using CxSchurSelect = int (*)(const cdouble* w);
-Status SchurDecomp(const double* a, int32_t n, uint32_t order, SchurSelect select, int32_t* sdim, double* q,
+Status SchurDecomp(const double* a, int32_t n, uint32_t order, DgeesSelect select, int32_t* sdim, double* q,
                    double* t, cdouble* values);
-Status CxSchurDecomp(const cdouble* a, int32_t n, uint32_t order, CxSchurSelect select, int32_t* sdim, cdouble* q,
+Status CxSchurDecomp(const cdouble* a, int32_t n, uint32_t order, ZgeesSelect select, int32_t* sdim, cdouble* q,
                      cdouble* t, cdouble* values);
 
 // Generalised Schur form of the pencil (a, b). mode 0: the Hessenberg-triangular form goes to
