@@ -321,10 +321,15 @@ Status HermitianEigen(const cdouble* a, int32_t n, int32_t output, cdouble* valu
 
 namespace {
 
-// Balancing with radix 2: permutations isolate eigenvalues, then row and column scaling.
-// scale[i] holds the exchanged index (0-based) outside low..igh, the factor inside.
-void Balanc(double* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
-    const auto A = [&](int32_t i, int32_t j) -> double& { return a[Ix(i, j, n)]; };
+inline double Norm1(double x) { return std::fabs(x); }
+inline double Norm1(cdouble z) { return std::fabs(z.real()) + std::fabs(z.imag()); }
+
+// Balancing with radix 2: permutations isolate eigenvalues, then row and column scaling (sums of
+// |re| + |im| for complex data). scale[i] holds the exchanged index (0-based) outside low..igh,
+// the factor inside.
+template <class T>
+void Balanc(T* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
+    const auto A = [&](int32_t i, int32_t j) -> T& { return a[Ix(i, j, n)]; };
     constexpr double radix = 2, b2 = radix * radix;
     int32_t k = 0, l = n - 1;
     const auto exchange = [&](int32_t j, int32_t m) {
@@ -339,10 +344,12 @@ void Balanc(double* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
         for (int32_t j = l; j >= 0; --j) {
             bool isolated = true;
             for (int32_t i = 0; i <= l && isolated; ++i)
-                if (i != j && A(j, i) != 0) isolated = false;
+                if (i != j && A(j, i) != T(0)) isolated = false;
             if (!isolated) continue;
             exchange(j, l);
             if (l == 0) {
+                // All isolated: the one left is unscaled.
+                scale[0] = 1;
                 *low = *igh = 0;
                 return;
             }
@@ -357,7 +364,7 @@ void Balanc(double* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
         for (int32_t j = k; j <= l; ++j) {
             bool isolated = true;
             for (int32_t i = k; i <= l && isolated; ++i)
-                if (i != j && A(i, j) != 0) isolated = false;
+                if (i != j && A(i, j) != T(0)) isolated = false;
             if (!isolated) continue;
             exchange(j, k);
             ++k;
@@ -372,8 +379,8 @@ void Balanc(double* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
             double c = 0, r = 0;
             for (int32_t j = k; j <= l; ++j) {
                 if (j == i) continue;
-                c += std::fabs(A(j, i));
-                r += std::fabs(A(i, j));
+                c += Norm1(A(j, i));
+                r += Norm1(A(i, j));
             }
             if (c == 0 || r == 0) continue;
             double g = r / radix, f = 1;
@@ -726,7 +733,8 @@ Status Hqr2(double* h, int32_t n, int32_t low, int32_t igh, double* wr, double* 
 }
 
 // Undoes the scaling and the permutations of Balanc on the rows of z.
-void Balbak(double* z, int32_t n, int32_t low, int32_t igh, const double* scale) {
+template <class T>
+void Balbak(T* z, int32_t n, int32_t low, int32_t igh, const double* scale) {
     for (int32_t i = low; i <= igh; ++i) {
         const double s = scale[i];
         for (int32_t j = 0; j < n; ++j) z[Ix(i, j, n)] *= s;
@@ -798,8 +806,6 @@ Status GeneralEigen(const double* a, int32_t n, int32_t output, cdouble* values,
 }
 
 namespace {
-
-inline double Norm1(cdouble z) { return std::fabs(z.real()) + std::fabs(z.imag()); }
 
 // Single-shift complex QR on the Hessenberg h, in plane rotations. With z the full triangular
 // form is kept and the transformations are accumulated into z.
@@ -886,11 +892,16 @@ Status CxGeneralEigen(const cdouble* a, int32_t n, int32_t output, cdouble* valu
     const size_t nn = Square(n);
     Scratch<cdouble> work;
     if (work.Allocate(nn * (wantV ? 3 : 1) + 2 * static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    Scratch<double> scaleBlock;
+    if (scaleBlock.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    double* scale = scaleBlock.get();
     cdouble* h = work.get();
     cdouble* hv = h + nn;
     cdouble* z = wantV ? hv + 2 * n : nullptr;
     cdouble* y = wantV ? z + nn : nullptr;
     std::memcpy(static_cast<void*>(h), a, nn * sizeof(cdouble));
+    int32_t low = 0, igh = 0;
+    Balanc(h, n, &low, &igh, scale);
     if (z != nullptr) Identity(z, n);
     HouseholderHessenberg(h, n, z, hv);
     Status s = Comqr(h, n, z);
@@ -924,9 +935,10 @@ Status CxGeneralEigen(const cdouble* a, int32_t n, int32_t output, cdouble* valu
                 vectors[Ix(r, k, n)] = t;
             }
         }
+        Balbak(vectors, n, low, igh, scale);
         UnitColumns(vectors, n);
     }
-    return MergeRelease(s, work.Release());
+    return MergeRelease(MergeRelease(s, work.Release()), scaleBlock.Release());
 }
 
 int32_t PolyFromRoots(const cdouble* r, int32_t n, cdouble* c) {
