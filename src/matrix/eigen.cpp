@@ -382,7 +382,8 @@ void Balanc(T* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
                 c += Norm1(A(j, i));
                 r += Norm1(A(i, j));
             }
-            if (c == 0 || r == 0) continue;
+            // Sums that overflowed would keep the radix loops from ending.
+            if (c == 0 || r == 0 || !std::isfinite(c + r)) continue;
             double g = r / radix, f = 1;
             const double s = c + r;
             while (c < g) {
