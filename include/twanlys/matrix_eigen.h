@@ -47,8 +47,9 @@ TW_API int32_t QZ80_head(Array2DHandle a, Array2DHandle b, int32_t mode, SchurOr
                          Array1DHandle beta, Array2DHandle vectors);
 TW_API int32_t CxQZ80_head(Array2DHandle a, Array2DHandle b, int32_t mode, SchurOrder order, Array1DHandle alpha,
                            Array1DHandle beta, Array2DHandle vectors);
-/* The generalised Schur form: A gets S, B gets T, q the transposed left factor (S = q A z). Real
- * eigenvectors come in the real storage of pairs (real part, imaginary part in the next column). */
+/* The generalised Schur form: A gets S, B gets T, q the left factor as LAPACK stores it, read
+ * row-major its transpose (S = q A z; complex: S = conj(q) A z), z row-major. Real eigenvectors
+ * come in the real storage of pairs (real part, imaginary part in the next column). */
 TW_API int32_t TmiQZ_head(Array2DHandle a, Array2DHandle b, Array2DHandle q, Array2DHandle z, Array1DHandle alpha,
                           Array1DHandle beta, QzVectors which, Array2DHandle right, Array2DHandle left);
 TW_API int32_t CxTmiQZ_head(Array2DHandle a, Array2DHandle b, Array2DHandle q, Array2DHandle z,

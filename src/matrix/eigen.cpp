@@ -236,7 +236,7 @@ int32_t ScreenLower(const cdouble* a, int32_t n) {
 Status SymmetricEigen(const double* a, int32_t n, int32_t output, double* values, double* vectors) {
     if (n < 1) return EmptyArrayErr;
     if (ScreenLower(a, n)) return NanInfErr;
-    const bool wantV = output != 0;
+    const bool wantV = output != 0 && vectors != nullptr;
     Scratch<double> work;
     if (work.Allocate(Square(n) + static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
     double* z = wantV ? vectors : work.get();
@@ -264,7 +264,7 @@ Status SymmetricEigen(const double* a, int32_t n, int32_t output, double* values
 Status HermitianEigen(const cdouble* a, int32_t n, int32_t output, cdouble* values, cdouble* vectors) {
     if (n < 1) return EmptyArrayErr;
     if (ScreenLower(a, n)) return NanInfErr;
-    const bool wantV = output != 0;
+    const bool wantV = output != 0 && vectors != nullptr;
     const size_t nn = Square(n);
     Scratch<cdouble> cwork;
     Scratch<double> rwork;

@@ -340,69 +340,87 @@ class Companion(unittest.TestCase):
 
 class Statuses(unittest.TestCase):
     def test_table(self):
-        sq, wide, none, r3 = np.eye(3), np.ones((2, 3)), np.zeros((0, 0)), np.eye(3)[:2]
+        """Every export: its status, and all outputs (in-place matrices too) emptied on failure."""
+        sq, wide, none, nan = np.eye(3), np.ones((2, 3)), np.zeros((0, 0)), np.array([[1.0, np.nan], [0, 1]])
         i32 = tw.i32
 
-        def ev(a, output=1):
-            v, z, st = tw.array(np.ones(2), C128), tw.matrix(np.ones((2, 2)), C128), i32(-1)
-            tw.lib.EigenValueVector_head(tw.matrix(a), i32(output).ref, v, z, st.ref)
+        def m(a, cx):
+            return tw.matrix(a, C128 if cx else float)
+
+        def full(cx, dims=2):
+            return tw.matrix(np.ones((2, 2)), C128 if cx else float) if dims == 2 else tw.array(np.ones(2), C128 if cx else float)
+
+        def ev(cx, a, output=1):
+            v, z, st = full(True, 1), full(True), i32(-1)
+            tw.lib.EigenValueVector_head(m(a, cx), i32(output).ref, v, z, st.ref)
             return st.value, [v, z]
 
-        def cxev(a, herm):
-            h, v, st = tw.matrix(a, C128), tw.array(np.ones(2), C128), i32(-1)
+        def cxev(cx, a, herm):
+            h, v, st = m(a, True), full(True, 1), i32(-1)
             tw.lib.CxEigenValueVector_head(h, i32(herm).ref, i32(1).ref, v, st.ref)
             return st.value, [h, v]
 
-        def sym(a):
-            h, v, st = tw.matrix(a), tw.array(np.ones(2)), i32(-1)
+        def sym(cx, a):
+            h, v, st = m(a, False), full(False, 1), i32(-1)
             tw.lib.SymEvectorEvalue_head(h, i32(1).ref, v, st.ref)
             return st.value, [h, v]
 
-        def sch(a, order):
-            h, q, v = tw.matrix(a), tw.matrix(np.ones((2, 2))), tw.array(np.ones(2), C128)
-            return tw.lib.Schur80_head(h, 1, order, q, v), [h, q, v]
+        def sch(cx, a, order=None):
+            h, q, v = m(a, cx), full(cx), full(True, 1)
+            if order is None:
+                return (tw.lib.CxSchur_head if cx else tw.lib.Schur_head)(h, 1, q, v), [h, q, v]
+            return (tw.lib.CxSchur80_head if cx else tw.lib.Schur80_head)(h, 1, order, q, v), [h, q, v]
 
-        def qz(a, b, order=0, fn="QZ80_head"):
-            A, B, al, be, v = tw.matrix(a), tw.matrix(b), tw.array(np.ones(2), C128), tw.array(np.ones(2)), tw.matrix(np.ones((2, 2)), C128)
-            return getattr(tw.lib, fn)(A, B, 1, order, al, be, v), [A, B, al, be, v]
+        def qz(cx, a, b, order=None):
+            outs = [m(a, cx), m(b, cx), full(True, 1), full(cx, 1), full(True)]
+            if order is None:
+                return (tw.lib.CxQZ_head if cx else tw.lib.QZ_head)(*outs), outs
+            return (tw.lib.CxQZ80_head if cx else tw.lib.QZ80_head)(outs[0], outs[1], 1, order, *outs[2:]), outs
 
-        def gen(a, b, want):
-            v, x = tw.array(np.ones(2), C128), tw.matrix(np.ones((2, 2)), C128)
-            return tw.lib.GenEigenEx_head(tw.matrix(a), tw.matrix(b), want, v, x), [v, x]
+        def gen(cx, a, b, want=1):
+            v, x = full(True, 1), full(True)
+            return (tw.lib.CxGenEigenEx_head if cx else tw.lib.GenEigenEx_head)(m(a, cx), m(b, cx), want, v, x), [v, x]
 
-        def tmi(a, b, which):
-            outs = [tw.matrix(a), tw.matrix(b)] + [tw.matrix(np.ones((2, 2))) for _ in range(2)]
-            al, be, r, l = tw.array(np.ones(2), C128), tw.array(np.ones(2)), tw.matrix(np.ones((2, 2))), tw.matrix(np.ones((2, 2)))
-            return tw.lib.TmiQZ_head(*outs, al, be, which, r, l), outs + [al, be, r, l]
+        def tmi(cx, a, b, which=3):
+            outs = [m(a, cx), m(b, cx), full(cx), full(cx), full(True, 1), full(cx, 1), full(cx), full(cx)]
+            f = tw.lib.CxTmiQZ_head if cx else tw.lib.TmiQZ_head
+            return f(*outs[:6], which, *outs[6:]), outs
 
-        def back(v, job, n_scale):
-            h = tw.matrix(v)
-            return tw.lib.EigenVBack_head(h, job, 1, 0, max(v.shape[0] - 1, 0), tw.array(np.ones(n_scale))), [h]
+        def back(cx, v, job=3, n_scale=None):
+            h = m(v, cx)
+            n = v.shape[0] if n_scale is None else n_scale
+            f = tw.lib.CxEigenVBack_head if cx else tw.lib.EigenVBack_head
+            return f(h, job, 1, 0, max(v.shape[0] - 1, 0), tw.array(np.ones(n))), [h]
 
-        def comp(r):
-            m, st = tw.matrix(np.ones((2, 2))), i32(-1)
-            tw.lib.CreateMatrixFromEVs_head(tw.array(r, C128), m, st.ref)
-            return st.value, [m]
+        def comp(cx, r):
+            mm, st = full(False), i32(-1)
+            tw.lib.CreateMatrixFromEVs_head(tw.array(r, C128), mm, st.ref)
+            return st.value, [mm]
 
-        nan = np.array([[1.0, np.nan], [0, 1]])
         table = [
-            (ev(none), -20003), (ev(wide), -20040), (ev(np.zeros((0, 3))), -20040), (ev(nan), -20068),
-            (cxev(none, 0), -20003), (cxev(wide, 2), -20040), (cxev(sq, 2), -20061), (cxev(sq, -1), -20061),
-            (sym(wide), -20040), (sym(none), -20003),
-            (sch(sq, 5), -20061), (sch(wide, 1), -20040), (sch(none, 1), -20003), (sch(nan, 0), -20068),
-            (qz(sq, wide), -20040), (qz(sq, np.eye(2)), -20070), (qz(none, none), -20003), (qz(sq, sq, 5), -20061),
-            (qz(nan, np.eye(2)), -20068),
-            (gen(sq, sq, 2), -20061), (gen(sq, r3, 1), -20040),
-            (tmi(sq, sq, 4), -20061), (tmi(sq, np.eye(4), 0), -20070),
-            (back(wide, 3, 2), -20040), (back(none, 3, 0), -20003), (back(sq, 3, 2), -20002), (back(sq, 4, 3), -20061),
-            (comp(np.zeros(0)), -20003),
+            (ev, (none,), -20003), (ev, (wide,), -20040), (ev, (np.zeros((0, 3)),), -20040), (ev, (nan,), -20068),
+            (cxev, (none, 0), -20003), (cxev, (wide, 2), -20040), (cxev, (sq, 2), -20061), (cxev, (sq, -1), -20061),
+            (cxev, (nan.T, 1), -20068),  # Hermitian: the lower triangle is screened
+            (sym, (wide,), -20040), (sym, (none,), -20003), (sym, (np.array([[np.inf]]),), -20068),
+            (sch, (wide,), -20040), (sch, (none,), -20003), (sch, (nan,), -20068),
+            (sch, (sq, 5), -20061), (sch, (wide, 1), -20040), (sch, (none, 1), -20003),
+            (qz, (sq, wide), -20040), (qz, (sq, np.eye(2)), -20070), (qz, (none, none), -20003),
+            (qz, (nan, np.eye(2)), -20068), (qz, (sq, sq, 5), -20061), (qz, (wide, sq, 1), -20040),
+            (gen, (sq, sq, 2), -20061), (gen, (sq, np.eye(3)[:2]), -20040), (gen, (none, none), -20003),
+            (tmi, (sq, sq, 4), -20061), (tmi, (sq, np.eye(4)), -20070), (tmi, (nan, np.eye(2)), -20068),
+            (back, (wide,), -20040), (back, (none,), -20003), (back, (sq, 3, 2), -20002), (back, (sq, 4), -20061),
+            (comp, (np.zeros(0),), -20003),
         ]
-        for k, ((status, outputs), want) in enumerate(table):
-            self.assertEqual(status, want, k)
-            for o in outputs:
-                self.assertEqual(o.shape(), (0,) * len(o.shape()), k)
+        for cx in (False, True):
+            for k, (f, args, want) in enumerate(table):
+                if f in (ev, cxev, sym, comp) and cx:
+                    continue
+                status, outputs = f(cx, *args)
+                self.assertEqual(status, want, (cx, k))
+                for o in outputs:
+                    self.assertEqual(o.shape(), (0,) * len(o.shape()), (cx, k))
         # Values only: the vectors output stays empty; a 1 x 1 gives the vector [[1]].
-        status, (v, z) = ev(np.array([[2.0]]), output=0)
+        status, (v, z) = ev(False, np.array([[2.0]]), output=0)
         self.assertEqual((status, v.shape(), z.shape()), (0, (1,), (0, 0)))
 
 
