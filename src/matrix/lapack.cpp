@@ -217,6 +217,178 @@ Status Gttrs(char trans, int n, int nrhs, const double* dl, const double* d, con
     return 0;
 }
 
+namespace {
+
+// The two calls of a driver with the translated info of the second; a failed query is -20999.
+template <class T, class Call>
+Status Queried(Lapack routine, int n, Call call) {
+    T size = 0;
+    int info = 0;
+    call(&size, -1, &info);
+    if (info != 0) return InternalErr;
+    const int lwork = std::max(1, static_cast<int>(std::real(size)));
+    Scratch<T> work;
+    if (work.Allocate(static_cast<size_t>(lwork)) != 0) return OutOfMemoryErr;
+    call(work.get(), lwork, &info);
+    return MergeRelease(LapackStatus(routine, info, n), work.Release());
+}
+
+}  // namespace
+
+Status Gees(int n, double* a, DgeesSelect select, int* sdim, double* wr, double* wi, double* vs) {
+    const char jobvs = vs != nullptr ? 'V' : 'N', sort = select != nullptr ? 'S' : 'N';
+    const int ldvs = std::max(n, 1);
+    Scratch<int> bwork;
+    if (bwork.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    double size = 0;
+    int info = 0, query = -1;
+    dgees_(&jobvs, &sort, select, &n, a, &n, sdim, wr, wi, vs, &ldvs, &size, &query, bwork.get(), &info, 1, 1);
+    if (info != 0) return MergeRelease(InternalErr, bwork.Release());
+    const int lwork = std::max(1, static_cast<int>(size));
+    Scratch<double> work;
+    if (work.Allocate(static_cast<size_t>(lwork)) != 0) return MergeRelease(OutOfMemoryErr, bwork.Release());
+    dgees_(&jobvs, &sort, select, &n, a, &n, sdim, wr, wi, vs, &ldvs, work.get(), &lwork, bwork.get(), &info, 1, 1);
+    return MergeRelease(MergeRelease(LapackStatus(Lapack::Gees, info, n), work.Release()), bwork.Release());
+}
+
+Status Gees(int n, cdouble* a, ZgeesSelect select, int* sdim, cdouble* w, cdouble* vs) {
+    const char jobvs = vs != nullptr ? 'V' : 'N', sort = select != nullptr ? 'S' : 'N';
+    const int ldvs = std::max(n, 1);
+    Scratch<int> bwork;
+    Scratch<double> rwork;
+    if (bwork.Allocate(static_cast<size_t>(n)) != 0 || rwork.Allocate(static_cast<size_t>(n)) != 0)
+        return OutOfMemoryErr;
+    cdouble size = 0;
+    int info = 0, query = -1;
+    zgees_(&jobvs, &sort, select, &n, a, &n, sdim, w, vs, &ldvs, &size, &query, rwork.get(), bwork.get(), &info, 1, 1);
+    Status s = info != 0 ? InternalErr : 0;
+    const int lwork = std::max(1, static_cast<int>(size.real()));
+    Scratch<cdouble> work;
+    if (s == 0 && work.Allocate(static_cast<size_t>(lwork)) != 0) s = OutOfMemoryErr;
+    if (s == 0) {
+        zgees_(&jobvs, &sort, select, &n, a, &n, sdim, w, vs, &ldvs, work.get(), &lwork, rwork.get(), bwork.get(),
+               &info, 1, 1);
+        s = LapackStatus(Lapack::Gees, info, n);
+    }
+    return MergeRelease(MergeRelease(MergeRelease(s, work.Release()), bwork.Release()), rwork.Release());
+}
+
+int Trexc(int n, double* t, double* q, int ifst, int* ilst) {
+    const char compq = q != nullptr ? 'V' : 'N';
+    Scratch<double> work;
+    if (work.Allocate(static_cast<size_t>(n)) != 0) return -1;
+    int info = 0, ldq = std::max(n, 1);
+    dtrexc_(&compq, &n, t, &n, q, &ldq, &ifst, ilst, work.get(), &info, 1);
+    return info;
+}
+
+int Trexc(int n, cdouble* t, cdouble* q, int ifst, int* ilst) {
+    const char compq = q != nullptr ? 'V' : 'N';
+    int info = 0, ldq = std::max(n, 1);
+    ztrexc_(&compq, &n, t, &n, q, &ldq, &ifst, ilst, &info, 1);
+    return info;
+}
+
+Status Gges(int n, double* a, double* b, double* alphar, double* alphai, double* beta, double* q, double* z) {
+    Scratch<int> bwork;
+    if (bwork.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    int sdim = 0;
+    const Status s = Queried<double>(Lapack::Gges, n, [&](double* w, int lw, int* info) {
+        dgges_("V", "V", "N", nullptr, &n, a, &n, b, &n, &sdim, alphar, alphai, beta, q, &n, z, &n, w, &lw,
+               bwork.get(), info, 1, 1, 1);
+    });
+    return MergeRelease(s, bwork.Release());
+}
+
+Status Gges(int n, cdouble* a, cdouble* b, cdouble* alpha, cdouble* beta, cdouble* q, cdouble* z) {
+    Scratch<int> bwork;
+    Scratch<double> rwork;
+    if (bwork.Allocate(static_cast<size_t>(n)) != 0 || rwork.Allocate(8 * static_cast<size_t>(n)) != 0)
+        return OutOfMemoryErr;
+    int sdim = 0;
+    const Status s = Queried<cdouble>(Lapack::Gges, n, [&](cdouble* w, int lw, int* info) {
+        zgges_("V", "V", "N", nullptr, &n, a, &n, b, &n, &sdim, alpha, beta, q, &n, z, &n, w, &lw, rwork.get(),
+               bwork.get(), info, 1, 1, 1);
+    });
+    return MergeRelease(MergeRelease(s, bwork.Release()), rwork.Release());
+}
+
+Status Gghrd(int n, double* a, double* b, double* q, double* z) {
+    int info = 0, one = 1;
+    dgghrd_("V", "I", &n, &one, &n, a, &n, b, &n, q, &n, z, &n, &info, 1, 1);
+    return info < 0 ? InternalErr : 0;
+}
+
+Status Gghrd(int n, cdouble* a, cdouble* b, cdouble* q, cdouble* z) {
+    int info = 0, one = 1;
+    zgghrd_("V", "I", &n, &one, &n, a, &n, b, &n, q, &n, z, &n, &info, 1, 1);
+    return info < 0 ? InternalErr : 0;
+}
+
+Status Hgeqz(int n, double* h, double* t, double* alphar, double* alphai, double* beta, double* q, double* z) {
+    int one = 1;
+    return Queried<double>(Lapack::Hgeqz, n, [&](double* w, int lw, int* info) {
+        dhgeqz_("S", "V", "V", &n, &one, &n, h, &n, t, &n, alphar, alphai, beta, q, &n, z, &n, w, &lw, info, 1, 1, 1);
+    });
+}
+
+Status Hgeqz(int n, cdouble* h, cdouble* t, cdouble* alpha, cdouble* beta, cdouble* q, cdouble* z) {
+    Scratch<double> rwork;
+    if (rwork.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    int one = 1;
+    const Status s = Queried<cdouble>(Lapack::Hgeqz, n, [&](cdouble* w, int lw, int* info) {
+        zhgeqz_("S", "V", "V", &n, &one, &n, h, &n, t, &n, alpha, beta, q, &n, z, &n, w, &lw, rwork.get(), info, 1, 1,
+                1);
+    });
+    return MergeRelease(s, rwork.Release());
+}
+
+int Tgexc(int n, double* a, double* b, double* q, double* z, int* ifst, int* ilst) {
+    int yes = 1, info = 0, query = -1;
+    double size = 0;
+    dtgexc_(&yes, &yes, &n, a, &n, b, &n, q, &n, z, &n, ifst, ilst, &size, &query, &info);
+    if (info != 0) return -1;
+    const int lwork = std::max(1, static_cast<int>(size));
+    Scratch<double> work;
+    if (work.Allocate(static_cast<size_t>(lwork)) != 0) return -1;
+    dtgexc_(&yes, &yes, &n, a, &n, b, &n, q, &n, z, &n, ifst, ilst, work.get(), &lwork, &info);
+    return info;
+}
+
+int Tgexc(int n, cdouble* a, cdouble* b, cdouble* q, cdouble* z, int* ifst, int* ilst) {
+    int yes = 1, info = 0;
+    ztgexc_(&yes, &yes, &n, a, &n, b, &n, q, &n, z, &n, ifst, ilst, &info);
+    return info;
+}
+
+Status Tgevc(char side, int n, const double* s, const double* p, double* vl, double* vr) {
+    Scratch<double> work;
+    if (work.Allocate(6 * static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+    int info = 0, m = 0;
+    dtgevc_(&side, "B", nullptr, &n, s, &n, p, &n, vl, &n, vr, &n, &n, &m, work.get(), &info, 1, 1);
+    return MergeRelease(LapackStatus(Lapack::Tgevc, info, n), work.Release());
+}
+
+Status Tgevc(char side, int n, const cdouble* s, const cdouble* p, cdouble* vl, cdouble* vr) {
+    Scratch<cdouble> work;
+    Scratch<double> rwork;
+    if (work.Allocate(2 * static_cast<size_t>(n)) != 0 || rwork.Allocate(2 * static_cast<size_t>(n)) != 0)
+        return OutOfMemoryErr;
+    int info = 0, m = 0;
+    ztgevc_(&side, "B", nullptr, &n, s, &n, p, &n, vl, &n, vr, &n, &n, &m, work.get(), rwork.get(), &info, 1, 1);
+    return MergeRelease(MergeRelease(LapackStatus(Lapack::Tgevc, info, n), work.Release()), rwork.Release());
+}
+
+void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, int m, double* v, int ldv) {
+    int info = 0;
+    dgebak_(&job, &side, &n, &ilo, &ihi, scale, &m, v, &ldv, &info, 1, 1);
+}
+
+void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, int m, cdouble* v, int ldv) {
+    int info = 0;
+    zgebak_(&job, &side, &n, &ilo, &ihi, scale, &m, v, &ldv, &info, 1, 1);
+}
+
 #define TW_LAPACK(T)                                                                          \
     template Status Geqp3<T>(int, int, T*, int, int*, T*);                                    \
     template Status Orgqr<T>(int, int, int, T*, int, const T*);                               \

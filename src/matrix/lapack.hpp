@@ -2,6 +2,7 @@
 // implementation's header so that any Debian alternative links through the generic names.
 #pragma once
 
+#include <complex>
 #include <cstddef>
 #include <cstdint>
 
@@ -58,9 +59,62 @@ void zgbsv_(const int* n, const int* kl, const int* ku, const int* nrhs, void* a
 void dgttrf_(const int* n, double* dl, double* d, double* du, double* du2, int* ipiv, int* info);
 void dgttrs_(const char* trans, const int* n, const int* nrhs, const double* dl, const double* d, const double* du,
              const double* du2, const int* ipiv, double* b, const int* ldb, int* info, size_t transLength);
+// Schur forms, the generalised Schur form (QZ) and their reordering. Logical arguments are ints.
+typedef int (*DgeesSelect)(const double*, const double*);
+typedef int (*ZgeesSelect)(const void*);
+void dgees_(const char* jobvs, const char* sort, DgeesSelect select, const int* n, double* a, const int* lda, int* sdim,
+            double* wr, double* wi, double* vs, const int* ldvs, double* work, const int* lwork, int* bwork, int* info,
+            size_t, size_t);
+void zgees_(const char* jobvs, const char* sort, ZgeesSelect select, const int* n, void* a, const int* lda, int* sdim,
+            void* w, void* vs, const int* ldvs, void* work, const int* lwork, double* rwork, int* bwork, int* info,
+            size_t, size_t);
+void dgges_(const char* jobvsl, const char* jobvsr, const char* sort, void* selctg, const int* n, double* a,
+            const int* lda, double* b, const int* ldb, int* sdim, double* alphar, double* alphai, double* beta,
+            double* vsl, const int* ldvsl, double* vsr, const int* ldvsr, double* work, const int* lwork, int* bwork,
+            int* info, size_t, size_t, size_t);
+void zgges_(const char* jobvsl, const char* jobvsr, const char* sort, void* selctg, const int* n, void* a,
+            const int* lda, void* b, const int* ldb, int* sdim, void* alpha, void* beta, void* vsl, const int* ldvsl,
+            void* vsr, const int* ldvsr, void* work, const int* lwork, double* rwork, int* bwork, int* info, size_t,
+            size_t, size_t);
+void dgghrd_(const char* compq, const char* compz, const int* n, const int* ilo, const int* ihi, double* a,
+             const int* lda, double* b, const int* ldb, double* q, const int* ldq, double* z, const int* ldz, int* info,
+             size_t, size_t);
+void zgghrd_(const char* compq, const char* compz, const int* n, const int* ilo, const int* ihi, void* a,
+             const int* lda, void* b, const int* ldb, void* q, const int* ldq, void* z, const int* ldz, int* info,
+             size_t, size_t);
+void dhgeqz_(const char* job, const char* compq, const char* compz, const int* n, const int* ilo, const int* ihi,
+             double* h, const int* ldh, double* t, const int* ldt, double* alphar, double* alphai, double* beta,
+             double* q, const int* ldq, double* z, const int* ldz, double* work, const int* lwork, int* info, size_t,
+             size_t, size_t);
+void zhgeqz_(const char* job, const char* compq, const char* compz, const int* n, const int* ilo, const int* ihi,
+             void* h, const int* ldh, void* t, const int* ldt, void* alpha, void* beta, void* q, const int* ldq,
+             void* z, const int* ldz, void* work, const int* lwork, double* rwork, int* info, size_t, size_t,
+             size_t);
+void dtgevc_(const char* side, const char* howmny, const int* select, const int* n, const double* s, const int* lds,
+             const double* p, const int* ldp, double* vl, const int* ldvl, double* vr, const int* ldvr, const int* mm,
+             int* m, double* work, int* info, size_t, size_t);
+void ztgevc_(const char* side, const char* howmny, const int* select, const int* n, const void* s, const int* lds,
+             const void* p, const int* ldp, void* vl, const int* ldvl, void* vr, const int* ldvr, const int* mm,
+             int* m, void* work, double* rwork, int* info, size_t, size_t);
+void dtgexc_(const int* wantq, const int* wantz, const int* n, double* a, const int* lda, double* b, const int* ldb,
+             double* q, const int* ldq, double* z, const int* ldz, int* ifst, int* ilst, double* work,
+             const int* lwork, int* info);
+void ztgexc_(const int* wantq, const int* wantz, const int* n, void* a, const int* lda, void* b, const int* ldb,
+             void* q, const int* ldq, void* z, const int* ldz, const int* ifst, int* ilst, int* info);
+void dtrexc_(const char* compq, const int* n, double* t, const int* ldt, double* q, const int* ldq, int* ifst,
+             int* ilst, double* work, int* info, size_t);
+void ztrexc_(const char* compq, const int* n, void* t, const int* ldt, void* q, const int* ldq, const int* ifst,
+             const int* ilst, int* info, size_t);
+void dgebak_(const char* job, const char* side, const int* n, const int* ilo, const int* ihi, const double* scale,
+             const int* m, double* v, const int* ldv, int* info, size_t, size_t);
+void zgebak_(const char* job, const char* side, const int* n, const int* ilo, const int* ihi, const double* scale,
+             const int* m, void* v, const int* ldv, int* info, size_t, size_t);
+double dlapy2_(const double* x, const double* y);
 }
 
 namespace tw {
+
+using cdouble = std::complex<double>;
 
 enum CblasOrder { CblasRowMajor = 101, CblasColMajor = 102 };
 enum CblasTranspose { CblasNoTrans = 111, CblasTrans = 112, CblasConjTrans = 113 };
@@ -97,6 +151,35 @@ template <class T> Status Gbsv(int n, int kl, int ku, int nrhs, T* ab, int ldab,
 Status Gttrf(int n, double* dl, double* d, double* du, double* du2, int* ipiv);
 Status Gttrs(char trans, int n, int nrhs, const double* dl, const double* d, const double* du, const double* du2,
              const int* ipiv, double* b, int ldb);
+
+// Schur form of the column-major a (T replaces it); vs null computes no Schur vectors, select
+// null sorts nothing. Work query first; a failed query is -20999.
+Status Gees(int n, double* a, DgeesSelect select, int* sdim, double* wr, double* wi, double* vs);
+Status Gees(int n, cdouble* a, ZgeesSelect select, int* sdim, cdouble* w, cdouble* vs);
+// Moves the diagonal block at ifst to ilst (1-based); q null: no Schur vectors. The raw info.
+int Trexc(int n, double* t, double* q, int ifst, int* ilst);
+int Trexc(int n, cdouble* t, cdouble* q, int ifst, int* ilst);
+
+// The QZ steps on column-major n by n blocks, Schur vectors always updated: the one-call driver,
+// reduction to Hessenberg-triangular form (q updated, z from the identity), the QZ iteration
+// ('S'), the exchange of diagonal blocks (raw info), and the eigenvectors, side 'R', 'L' or 'B'
+// back-transformed through vl and vr.
+Status Gges(int n, double* a, double* b, double* alphar, double* alphai, double* beta, double* q, double* z);
+Status Gges(int n, cdouble* a, cdouble* b, cdouble* alpha, cdouble* beta, cdouble* q, cdouble* z);
+Status Gghrd(int n, double* a, double* b, double* q, double* z);
+Status Gghrd(int n, cdouble* a, cdouble* b, cdouble* q, cdouble* z);
+Status Hgeqz(int n, double* h, double* t, double* alphar, double* alphai, double* beta, double* q, double* z);
+Status Hgeqz(int n, cdouble* h, cdouble* t, cdouble* alpha, cdouble* beta, cdouble* q, cdouble* z);
+int Tgexc(int n, double* a, double* b, double* q, double* z, int* ifst, int* ilst);
+int Tgexc(int n, cdouble* a, cdouble* b, cdouble* q, cdouble* z, int* ifst, int* ilst);
+Status Tgevc(char side, int n, const double* s, const double* p, double* vl, double* vr);
+Status Tgevc(char side, int n, const cdouble* s, const cdouble* p, cdouble* vl, cdouble* vr);
+
+// Back-transformation after balancing of the m columns of the column-major v; info ignored.
+void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, int m, double* v, int ldv);
+void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, int m, cdouble* v, int ldv);
+
+inline double Lapy2(double x, double y) { return dlapy2_(&x, &y); }
 
 // The one translation of a driver's info into a status; n is the order of the problem.
 Status LapackStatus(Lapack routine, int info, int n);
