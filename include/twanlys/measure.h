@@ -1,0 +1,78 @@
+/* Waveform measurements: state levels, pulses, transitions and cycles. Times are t0 + index dt.
+ * Every negative status sets all f64 results to 0. */
+#ifndef TWANLYS_MEASURE_H
+#define TWANLYS_MEASURE_H
+
+#include "twanlys/types.h"
+
+/* Reference levels of a pulse or transition measurement; units non-zero: percent of the amplitude
+ * between the state levels, from the low state. */
+#pragma pack(push, 1)
+typedef struct {
+    double high;
+    double mid;
+    double low;
+    uint16_t units;
+} MeasureReferences;
+#pragma pack(pop)
+
+/* How state levels are found: method 0 histogram, 1 extreme values, 2 histogram falling back to
+ * extreme values; bins of the histogram. */
+typedef struct {
+    uint32_t method;
+    int32_t bins;
+} HistogramSettings;
+
+/* State levels of x. The bin buffer is kept in the work cell (freed by a host cleanup) or, for
+ * the _IDP twin, in the instance-data cell (freed by MeasurementUnreserveProc). strict (0 or 1)
+ * makes method 2 take histogram levels only when both are well populated. A weakly populated
+ * histogram under method 0 gives StateLevelWeakWarn with the levels in place. */
+TW_API int32_t StateLevels(Array1DHandle x, double t0, double dt, int32_t method, int32_t bins, void** cell,
+                           double* high, double* low, double* amplitude, int32_t strict);
+TW_API int32_t StateLevels_IDP(Array1DHandle x, double t0, double dt, int32_t method, int32_t bins,
+                               void** cell, double* high, double* low, double* amplitude, int32_t strict);
+
+/* Pulse number `number` (from 1) found on crossings of the mid reference with hysteresis.
+ * polarity 0xFFFF: the pulse between crossings 2N-2 and 2N-1; 1: the N-th pulse starting with a
+ * rising crossing; 0: with a falling one. unbounded: the pulse needs no following crossing, and
+ * period and duty are 0. The low, mid and high outputs are the references in absolute units. */
+TW_API int32_t PulseMeasEx(Array1DHandle x, double t0, double dt, uint16_t polarity, uint16_t unbounded,
+                           int32_t number, const MeasureReferences* references,
+                           const HistogramSettings* histogram, void** cell, double* period, double* width,
+                           double* duty, double* centre, double* low, double* mid, double* high, int32_t strict);
+TW_API int32_t PulseMeas(Array1DHandle x, double t0, double dt, uint16_t polarity, int32_t number,
+                         const MeasureReferences* references, const HistogramSettings* histogram, void** cell,
+                         double* period, double* width, double* duty, double* centre, double* low,
+                         double* mid, double* high, int32_t strict);
+TW_API int32_t PulseMeasEx_IDP(Array1DHandle x, double t0, double dt, uint16_t polarity, uint16_t unbounded,
+                               int32_t number, const MeasureReferences* references,
+                               const HistogramSettings* histogram, void** cell, double* period, double* width,
+                               double* duty, double* centre, double* low, double* mid, double* high,
+                               int32_t strict);
+
+/* Transition number `number` of the direction `polarity` (1 rising, 0 falling, 0xFFFF either),
+ * from the last crossing of the reference it leaves to the first crossing of the other.
+ * Preshoot and overshoot are in percent of the amplitude between the state levels, signed, 0
+ * (with time 0) unless the extreme lies outside the state's histogram bin. */
+TW_API int32_t TransMeas(Array1DHandle x, double t0, double dt, uint16_t polarity, int32_t number,
+                         const MeasureReferences* references, const HistogramSettings* histogram, void** cell,
+                         double* slewRate, double* duration, double* startTime, double* endTime,
+                         double* preshoot, double* preshootTime, double* overshoot, double* overshootTime,
+                         double* low, double* mid, double* high, int32_t strict);
+TW_API int32_t TransMeas_IDP(Array1DHandle x, double t0, double dt, uint16_t polarity, int32_t number,
+                             const MeasureReferences* references, const HistogramSettings* histogram,
+                             void** cell, double* slewRate, double* duration, double* startTime,
+                             double* endTime, double* preshoot, double* preshootTime, double* overshoot,
+                             double* overshootTime, double* low, double* mid, double* high, int32_t strict);
+
+/* RMS and mean of x over cycle `number`: from the start of pulse 2N-2..2N-1 over one period. */
+TW_API int32_t CycleRMSAverage(Array1DHandle x, double t0, double dt, int32_t number,
+                               const MeasureReferences* references, const HistogramSettings* histogram,
+                               void** cell, double* rms, double* mean, double* low, double* mid, double* high,
+                               int32_t strict);
+TW_API int32_t CycleRMSAverage_IDP(Array1DHandle x, double t0, double dt, int32_t number,
+                                   const MeasureReferences* references, const HistogramSettings* histogram,
+                                   void** cell, double* rms, double* mean, double* low, double* mid,
+                                   double* high, int32_t strict);
+
+#endif

@@ -1,0 +1,316 @@
+"""Waveform measurements against NumPy renderings of their rules and synthetic waves whose
+crossings are known in closed form."""
+import ctypes
+import unittest
+
+import numpy as np
+
+import twanlys as tw
+
+D, I32, U16, P = ctypes.c_double, ctypes.c_int32, ctypes.c_uint16, ctypes.c_void_p
+PD = ctypes.POINTER(D)
+WEAK = 20021
+
+
+class Refs(ctypes.Structure):
+    _pack_ = 1
+    _fields_ = [("high", D), ("mid", D), ("low", D), ("units", U16)]
+
+
+class Hist(ctypes.Structure):
+    _fields_ = [("method", ctypes.c_uint32), ("bins", I32)]
+
+
+tw.lib.StateLevels.argtypes = [P, D, D, I32, I32, P] + [PD] * 3 + [I32]
+tw.lib.PulseMeasEx.argtypes = [P, D, D, U16, U16, I32, P, P, P] + [PD] * 7 + [I32]
+tw.lib.TransMeas.argtypes = [P, D, D, U16, I32, P, P, P] + [PD] * 11 + [I32]
+tw.lib.CycleRMSAverage.argtypes = [P, D, D, I32, P, P, P] + [PD] * 5 + [I32]
+
+
+def each_placement():
+    for aligned in (0, 1):
+        tw.placement(aligned)
+        yield aligned
+    tw.placement(0)
+
+
+def hist_levels(x, bins):
+    """Bin centres of the fullest low and high bins: trunc and clamp, low ties to the lower index,
+    high ties to the higher, empty bins never chosen."""
+    mn, mx = np.min(x), np.max(x)
+    w = (mx - mn) / bins
+    idx = np.clip(np.trunc((x - mn) * (1 / w)), 0, bins - 1).astype(int)
+    c = np.bincount(idx, minlength=bins)
+    lo = c[: int(0.4 * bins) + 1]
+    li = int(np.argmax(lo)) if lo.max() > 0 else 0
+    hi = c[int(0.6 * bins):]
+    hidx = int(0.6 * bins) + len(hi) - 1 - int(np.argmax(hi[::-1])) if hi.max() > 0 else 0
+    return mn + 0.5 * w + li * w, mn + 0.5 * w + hidx * w, c[li], c[hidx]
+
+
+class Cell:
+    """A work cell; its bin buffer is released by the host's cleanups."""
+
+    def __init__(self):
+        self.p = ctypes.c_void_p()
+
+    def __del__(self):
+        tw.twrt.TWRTRunCleanups(2)
+
+
+def state_levels(x, method, bins, strict=0, cell=None, t0=0.0, dt=1.0):
+    out = [D(), D(), D()]
+    cell = cell or Cell()
+    s = tw.lib.StateLevels(tw.array(x), t0, dt, method, bins, ctypes.byref(cell.p),
+                           *[ctypes.byref(o) for o in out], strict)
+    return [o.value for o in out], s
+
+
+def trapezoid(n, edges, ramp, low=0.0, high=1.0):
+    """Samples at 0..n-1 of a wave that starts at `low` and ramps linearly over `ramp` samples,
+    alternately up and down, starting at each time in `edges`."""
+    t = np.arange(n, dtype=float)
+    y = np.full(n, low)
+    level = low
+    for k, e in enumerate(edges):
+        rising = k % 2 == 0
+        frac = np.clip((t - e) / ramp, 0, 1)
+        seg = t >= e
+        y[seg] = (low + (high - low) * frac[seg]) if rising else (high - (high - low) * frac[seg])
+        level = high if rising else low
+    del level
+    return y
+
+
+class StateLevels(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(2026112532)
+
+    def test_histogram_rule_against_numpy(self):
+        for _ in each_placement():
+            for n, bins in ((1000, 100), (4097, 37), (50, 3), (10000, 256)):
+                x = np.where(self.rng.random(n) < 0.5, 0.0, 2.5) + self.rng.normal(0, 0.05, n)
+                (high, low, amp), s = state_levels(x, 0, bins)
+                lo, hi, cl, ch = hist_levels(x, bins)
+                self.assertEqual(s, WEAK if min(cl, ch) < 0.05 * n else 0)
+                self.assertEqual((high, low), (hi, lo))
+                self.assertEqual(amp, hi - lo)
+
+    def test_square_wave_at_bin_centres(self):
+        # 4 bins over [0, 4]: centres 0.5 and 3.5; samples 0 and 4 land in the end bins.
+        x = np.tile([0.0] * 5 + [4.0] * 5, 20)
+        (high, low, amp), s = state_levels(x, 0, 4)
+        self.assertEqual((s, high, low, amp), (0, 3.5, 0.5, 3.0))
+        (high, low, amp), s = state_levels(x, 1, 4)
+        self.assertEqual((s, high, low, amp), (0, 4.0, 0.0, 4.0))
+
+    def test_ramp_warns_with_levels_in_place(self):
+        for bins in (21, 50, 100):
+            x = np.linspace(-1, 1, 1000)
+            (high, low, _), s = state_levels(x, 0, bins)
+            lo, hi, _, _ = hist_levels(x, bins)
+            self.assertEqual((s, high, low), (WEAK, hi, lo))
+        # 20 bins hold exactly 5 percent each: not weak.
+        self.assertEqual(state_levels(np.linspace(-1, 1, 1000), 0, 20)[1], 0)
+
+    def test_automatic_and_strict(self):
+        # Low state well populated, high state a few outliers only.
+        x = np.r_[np.zeros(95), 1.0, 10.0 + np.arange(4) * 0.01]
+        lo, hi, cl, ch = hist_levels(x, 10)
+        self.assertTrue(cl > 5 and ch < 5)
+        (high, low, _), s = state_levels(x, 2, 10, strict=0)
+        self.assertEqual((s, high, low), (0, x.max(), lo))
+        (high, low, _), s = state_levels(x, 2, 10, strict=1)
+        self.assertEqual((s, high, low), (0, x.max(), x.min()))
+        two = np.r_[np.zeros(50), np.ones(50)]
+        lo, hi, _, _ = hist_levels(two, 10)
+        for strict in (0, 1):
+            (high, low, _), s = state_levels(two, 2, 10, strict=strict)
+            self.assertEqual((s, high, low), (0, hi, lo))
+
+    def test_cell_reuse_across_bin_counts(self):
+        cell = Cell()
+        x = self.rng.normal(size=500)
+        before = tw.twrt.TWRTCleanupCount(2)
+        for bins in (10, 10, 300, 7, 300):
+            (high, low, _), s = state_levels(x, 0, bins, cell=cell)
+            lo, hi, _, _ = hist_levels(x, bins)
+            self.assertEqual((high, low), (hi, lo))
+        self.assertEqual(tw.twrt.TWRTCleanupCount(2) - before, 1)
+
+
+def pulse(x, refs, hist, polarity=0xFFFF, number=1, unbounded=0, t0=0.0, dt=1.0, strict=0):
+    out = [D() for _ in range(7)]
+    cell = Cell()
+    s = tw.lib.PulseMeasEx(tw.array(x), t0, dt, polarity, unbounded, number, ctypes.byref(refs),
+                           ctypes.byref(hist), ctypes.byref(cell.p), *[ctypes.byref(o) for o in out], strict)
+    return [o.value for o in out], s
+
+
+def transition(x, refs, hist, polarity, number=1, t0=0.0, dt=1.0):
+    out = [D() for _ in range(11)]
+    cell = Cell()
+    s = tw.lib.TransMeas(tw.array(x), t0, dt, polarity, number, ctypes.byref(refs), ctypes.byref(hist),
+                         ctypes.byref(cell.p), *[ctypes.byref(o) for o in out], 0)
+    return [o.value for o in out], s
+
+
+def cycle(x, refs, hist, number=1, t0=0.0, dt=1.0):
+    out = [D() for _ in range(5)]
+    cell = Cell()
+    s = tw.lib.CycleRMSAverage(tw.array(x), t0, dt, number, ctypes.byref(refs), ctypes.byref(hist),
+                               ctypes.byref(cell.p), *[ctypes.byref(o) for o in out], 0)
+    return [o.value for o in out], s
+
+
+def crossings(x, mid, h):
+    """The hysteresis crossing search, unarmed start, in plain Python."""
+    out, s, armed = [], 2, False
+    for i in range(len(x) - 1):
+        if x[i] >= mid + h and s != 0:
+            s, armed = 0, True
+        elif x[i] <= mid - h and s != 1:
+            s, armed = 1, True
+        if armed and (x[i] - mid) * (x[i + 1] - mid) <= 0:
+            d = x[i] - x[i + 1]
+            out.append((i + (x[i] - mid) / (d if d != 0 else 1), s))
+            armed = False
+    return out
+
+
+class Pulses(unittest.TestCase):
+    EDGES = [10.3, 30.55, 50.3, 70.55, 90.3, 110.55, 130.3]
+    RAMP = 4.0
+
+    def wave(self):
+        return trapezoid(160, self.EDGES, self.RAMP)
+
+    def test_pulses_on_a_trapezoid(self):
+        x = self.wave()
+        e, L = self.EDGES, self.RAMP
+        rise = [a + 0.5 * L for a in e[0::2]]
+        fall = [a + 0.5 * L for a in e[1::2]]
+        absolute = Refs(0.9, 0.5, 0.1, 0)
+        hist = Hist(0, 100)
+        for t0, dt in ((0.0, 1.0), (-3.25, 1e-3), (1e4, 0.37)):
+            tol = 1e-12 * (abs(t0) + len(x) * dt)
+            for number in (1, 2, 3):
+                # polarity -1: crossings 2N-2, 2N-1 are the N-th rise and fall.
+                (period, width, duty, centre, lo, mid, hi), s = pulse(x, absolute, hist, 0xFFFF, number, t0=t0, dt=dt)
+                self.assertEqual(s, 0)
+                r, f = rise[number - 1], fall[number - 1]
+                self.assertAlmostEqual(width, (f - r) * dt, delta=tol)
+                self.assertAlmostEqual(period, (rise[number] - r) * dt, delta=tol)
+                self.assertAlmostEqual(duty, (f - r) / (rise[number] - r), delta=1e-12)
+                self.assertAlmostEqual(centre, t0 + (r + f) / 2 * dt, delta=tol)
+                self.assertEqual((lo, mid, hi), (0.1, 0.5, 0.9))
+                # Negative pulses: from the N-th fall to the next rise.
+                (period, width, _, centre, *_), s = pulse(x, absolute, hist, 0, number, t0=t0, dt=dt)
+                self.assertEqual(s, 0)
+                self.assertAlmostEqual(width, (rise[number] - f) * dt, delta=tol)
+                self.assertAlmostEqual(centre, t0 + (rise[number] + f) / 2 * dt, delta=tol)
+        # Unbounded: the last pulse needs no crossing after it, but the list must not end on an
+        # edge of the pulse's own direction.
+        (period, width, duty, *_), s = pulse(x[:120], absolute, hist, 0xFFFF, 3, unbounded=1)
+        self.assertEqual((s, period, duty), (0, 0.0, 0.0))
+        self.assertAlmostEqual(width, fall[2] - rise[2], delta=1e-12)
+        self.assertEqual(pulse(x[:120], absolute, hist, 0xFFFF, 3)[1], -20308)
+        # Starting high: fall, rise, fall, rise.
+        self.assertEqual(pulse(x[20:100], absolute, hist, 1, 2, unbounded=1)[1], -20308)
+        (_, width, *_), s = pulse(x[20:100], absolute, hist, 0, 2, unbounded=1)
+        self.assertEqual(s, 0)
+        self.assertAlmostEqual(width, rise[2] - fall[1], delta=1e-12)
+        self.assertEqual(pulse(x[:100], absolute, hist, 0xFFFF, 4, unbounded=1)[1], -20308)
+
+    def test_percent_references_from_state_levels(self):
+        x = self.wave()
+        for method, bins in ((0, 100), (1, 100), (2, 40)):
+            lo_s, hi_s = (x.min(), x.max()) if method == 1 else hist_levels(x, bins)[:2]
+            amp = hi_s - lo_s
+            (_, width, _, _, lo, mid, hi), s = pulse(x, Refs(90, 50, 10, 1), Hist(method, bins))
+            self.assertIn(s, (0, WEAK))
+            np.testing.assert_allclose([lo, mid, hi], np.array([10, 50, 90]) * amp / 100 + lo_s, rtol=1e-15)
+            # The ramp runs 0..1: level m is crossed m ramp lengths into each edge.
+            r = self.EDGES[0] + mid * self.RAMP
+            f = self.EDGES[1] + (1 - mid) * self.RAMP
+            self.assertAlmostEqual(width, f - r, delta=1e-12)
+
+    def test_noise_within_hysteresis_makes_no_crossing(self):
+        rng = np.random.default_rng(7)
+        x = self.wave()
+        noisy = x + rng.uniform(-0.3, 0.3, x.size) * ((x > 0.2) & (x < 0.8))
+        noisy[(x > 0.2) & (x < 0.8)] = 0.5 + rng.uniform(-0.3, 0.3, np.count_nonzero((x > 0.2) & (x < 0.8)))
+        ref = crossings(noisy, 0.5, 0.4)
+        self.assertEqual(len(ref), len(self.EDGES))
+        (period, width, *_), s = pulse(noisy, Refs(0.9, 0.5, 0.1, 0), Hist(0, 100))
+        self.assertEqual(s, 0)
+        self.assertAlmostEqual(width, ref[1][0] - ref[0][0], delta=1e-12)
+        self.assertAlmostEqual(period, ref[2][0] - ref[0][0], delta=1e-12)
+        # Hysteresis 0 counts every touch of the mid level.
+        self.assertGreater(len(crossings(noisy, 0.5, 0.0)), len(self.EDGES))
+
+    def test_transitions_with_shoots(self):
+        # Edges of 8 samples: both samples around each reference crossing lie on the ramp.
+        L = 8.0
+        x = trapezoid(200, [19.6, 80.3, 140.3], L, -1.0, 3.0)
+        x[30] = 3.5   # overshoot after the first rise
+        x[17] = -1.3  # preshoot before it
+        x[91] = -1.6  # undershoot after the fall
+        for bins in (100, 64):
+            lo_s, hi_s, _, _ = hist_levels(x, bins)
+            amp = hi_s - lo_s
+            b = (x.max() - x.min()) / bins / 2
+            refs = Refs(90, 50, 10, 1)
+            rl, rh = 0.1 * amp + lo_s, 0.9 * amp + lo_s
+            for t0, dt in ((0.0, 1.0), (2.5, 1e-6)):
+                # Level v on an edge from -1 to 3 starting at e: e + (v + 1) / 4 L.
+                (slew, dur, start, end, pre, pre_t, over, over_t, lo, mid, hi), s = transition(
+                    x, refs, Hist(0, bins), 1, 1, t0, dt)
+                self.assertIn(s, (0, WEAK))
+                start_ref, end_ref = 19.6 + (rl + 1) / 4 * L, 19.6 + (rh + 1) / 4 * L
+                tol = 1e-12 * (abs(t0) + 200 * dt)
+                self.assertAlmostEqual(start, t0 + start_ref * dt, delta=tol)
+                self.assertAlmostEqual(end, t0 + end_ref * dt, delta=tol)
+                self.assertAlmostEqual(dur, (end_ref - start_ref) * dt, delta=tol)
+                self.assertAlmostEqual(slew * dt, 4 / L, delta=1e-12)
+                self.assertAlmostEqual(pre, (-1.3 - lo_s) * 100 / amp, delta=1e-12)
+                self.assertAlmostEqual(pre_t, t0 + 17 * dt, delta=tol)
+                self.assertAlmostEqual(over, (3.5 - hi_s) * 100 / amp, delta=1e-12)
+                self.assertAlmostEqual(over_t, t0 + 30 * dt, delta=tol)
+                self.assertTrue(-1.3 < lo_s - b and 3.5 > hi_s + b)
+                # The first fall: no preshoot above the high band, undershoot after it.
+                (slew, dur, start, end, pre, pre_t, over, over_t, *_), s = transition(
+                    x, refs, Hist(0, bins), 0, 1, t0, dt)
+                start_ref, end_ref = 80.3 + (3 - rh) / 4 * L, 80.3 + (3 - rl) / 4 * L
+                self.assertAlmostEqual(start, t0 + start_ref * dt, delta=tol)
+                self.assertAlmostEqual(end, t0 + end_ref * dt, delta=tol)
+                self.assertEqual((pre, pre_t), (0.0, 0.0))
+                self.assertAlmostEqual(over, (-1.6 - lo_s) * 100 / amp, delta=1e-12)
+                self.assertAlmostEqual(over_t, t0 + 91 * dt, delta=tol)
+        # The second rise is clean; a third does not exist.
+        r, s = transition(x, Refs(90, 50, 10, 1), Hist(0, 100), 1, 2)
+        self.assertEqual((s, r[4], r[6]), (0, 0.0, 0.0))
+        self.assertEqual(transition(x, Refs(90, 50, 10, 1), Hist(0, 100), 1, 3)[1], -20310)
+        # Either direction: the second transition is the fall.
+        r2, _ = transition(x, Refs(90, 50, 10, 1), Hist(0, 100), 0xFFFF, 2)
+        r1, _ = transition(x, Refs(90, 50, 10, 1), Hist(0, 100), 0, 1)
+        self.assertEqual(r1, r2)
+
+    def test_cycle_rms_and_mean(self):
+        rng = np.random.default_rng(3)
+        x = self.wave() + rng.normal(0, 0.01, 160)
+        refs = Refs(0.8, 0.5, 0.2, 0)
+        for number in (1, 2):
+            for t0, dt in ((0.0, 1.0), (-7.0, 0.25)):
+                (rms, mean, *_), s = cycle(x, refs, Hist(0, 100), number, t0, dt)
+                self.assertEqual(s, 0)
+                c = crossings(x, 0.5, 0.3)
+                first = int(c[2 * number - 2][0])
+                span = int(c[2 * number][0] - c[2 * number - 2][0])
+                seg = x[first:first + span]
+                self.assertAlmostEqual(mean, seg.mean(), delta=1e-14)
+                self.assertAlmostEqual(rms, np.sqrt(np.mean(seg * seg)), delta=1e-14)
+
+
+if __name__ == "__main__":
+    unittest.main()
