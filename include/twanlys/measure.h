@@ -75,4 +75,49 @@ TW_API int32_t CycleRMSAverage_IDP(Array1DHandle x, double t0, double dt, int32_
                                    void** cell, double* rms, double* mean, double* low, double* mid,
                                    double* high, int32_t strict);
 
+/* Runs of at least *width samples at or above *threshold: the index of each run's first sample.
+ * The status is stored through `status` and returned. */
+TW_API int32_t PeakDetector(Array1DHandle x, double* threshold, int32_t* width, Array1DHandle locations,
+                            int32_t* count, int32_t* status);
+
+/* Settings of the streaming detector. flags bit 0: first block of a stream, bit 2: last block. */
+typedef struct {
+    Array1DHandle data;
+    double threshold;
+    int32_t width;
+    int32_t polarity; /* 0 peaks, 1 valleys */
+    Array1DHandle locations;
+    Array1DHandle amplitudes;
+    Array1DHandle secondDerivatives;
+    int32_t count;
+    uint32_t flags;
+} PeakDetectSettings;
+
+/* What a stream carries between blocks (64 bytes); the pointers point into the work buffer and
+ * are rebound on every call. Cleared after the last block or a failure. */
+typedef struct {
+    int32_t width;
+    int32_t windowsDone;
+    int32_t tailCount;
+    int32_t carried;
+    int32_t lastSign;
+    int32_t polarity;
+    double* projection;
+    double* window;
+    double* tail;
+    double* lastCoefficients;
+    const double* data;
+} PeakDetectState;
+
+/* Streaming peak or valley detection by quadratic fits over windows of `width` samples, with the
+ * window's tail carried in the work buffer (f64, 5 width + 3 elements). Locations are indices in
+ * the stream, fractional; amplitudes and second derivatives come from the fits. mode 2 reads raw
+ * instead of the settings' data; any non-zero mode fits near-constant data on the mean-removed,
+ * normalised windows. The status is stored through `status` and returned. */
+TW_API int32_t PeakD2014(Array1DHandle raw, PeakDetectSettings* settings, PeakDetectState* state,
+                         Array1DHandle work, int32_t* status, int32_t mode);
+TW_API int32_t PeakD2010(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work,
+                         int32_t* status, int32_t mode);
+TW_API int32_t PeakD(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work, int32_t* status);
+
 #endif

@@ -1,7 +1,10 @@
+#include <algorithm>
 #include <cstring>
 #include <initializer_list>
 
 #include "frame/frame.hpp"
+#include "frame/host_link.hpp"
+#include "measure/peaks.hpp"
 #include "measure/pulse.hpp"
 #include "measure/state_levels.hpp"
 #include "twanlys/measure.h"
@@ -191,4 +194,154 @@ TW_API int32_t CycleRMSAverage_IDP(Array1DHandle x, double t0, double dt, int32_
                                    void** cell, double* rms, double* mean, double* low, double* mid,
                                    double* high, int32_t strict) {
     return Cycle(x, t0, dt, number, references, histogram, cell, true, rms, mean, low, mid, high, strict);
+}
+
+namespace {
+
+static_assert(sizeof(PeakDetectSettings) == 56 && sizeof(PeakDetectState) == 64);
+
+// The detector's work buffer: projection (3 width), window copy, tail, last coefficients (3).
+struct WorkParts {
+    double *projection, *window, *tail, *last;
+};
+WorkParts Parts(double* base, int32_t width) {
+    const auto w = static_cast<size_t>(width);
+    return {base, base + 3 * w, base + 4 * w, base + 5 * w};
+}
+
+Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectState* stateRecord, Handle& work,
+                   int32_t mode) {
+    if (settingsRecord == nullptr || stateRecord == nullptr) return MeasureNullRecordErr;
+    PeakDetectSettings set;
+    PeakDetectState st;
+    std::memcpy(&set, settingsRecord, sizeof set);
+    std::memcpy(&st, stateRecord, sizeof st);
+    const bool first = (set.flags & 1u) != 0, final = (set.flags & 4u) != 0;
+    Handle data = mode == 2 ? raw : set.data;
+    const int32_t width = set.width, n = Count(data);
+
+    Frame f;
+    f.Output<double>(set.locations);
+    f.Output<double>(set.amplitudes);
+    f.Output<double>(set.secondDerivatives);
+    Status s = width < 3 || width > 1073741824 ? InvalidSelectorErr : n < width ? WidthRangeErr : 0;
+    double* wk = nullptr;
+    const double* xs = nullptr;
+    if (s == 0 && first && work == nullptr) s = NoPeakFoundErr;
+    if (s == 0 && !first && (st.tailCount != width || Count(work) != 5 * width + 3)) s = StateSizeErr;
+    if (s == 0) s = first ? f.Resize(work, 5 * width + 3, &wk) : f.InPlace(work, &wk);
+    if (s == 0) s = f.In(data, &xs);
+    const WorkParts w = s == 0 ? Parts(wk, width) : WorkParts{};
+    if (s == 0 && first) {
+        s = PeakProjection(width, w.projection);
+        std::copy(xs, xs + width, w.tail);
+        st.windowsDone = 0;
+        st.lastSign = 0;
+        w.last[0] = w.last[1] = w.last[2] = 0;
+    }
+    // The stream seen by this block: the carried tail, then the block's samples not yet carried.
+    const int32_t skip = first ? width : 0;
+    const int32_t rest = n - skip;
+    Scratch<double> joined;
+    Peak* peaks = nullptr;
+    int32_t count = 0, capacity = 0;
+    if (s == 0) s = joined.Allocate(static_cast<size_t>(width) + static_cast<size_t>(rest));
+    if (s == 0) {
+        double* j = joined.get();
+        std::copy(w.tail, w.tail + width, j);
+        std::copy(xs + skip, xs + n, j + width);
+        std::copy(j + rest, j + rest + width, w.tail);
+        double offset = 0;
+        bool flat = false;
+        if (mode != 0) {
+            double lo = j[0], hi = j[0], sum = 0;
+            for (int32_t i = 0; i < width + rest; ++i) {
+                lo = std::min(lo, j[i]);
+                hi = std::max(hi, j[i]);
+                sum += j[i];
+            }
+            if (hi - lo < 1e-8) {
+                flat = true;
+                offset = sum / (width + rest);
+                for (int32_t i = 0; i < width + rest; ++i) j[i] -= offset;
+            }
+        }
+        PeakScanState ps{st.windowsDone, st.lastSign, w.last};
+        s = PeakScan(w.projection, width, set.polarity, set.threshold, j, rest + (final ? 1 : 0), flat, offset,
+                     w.window, &ps, &peaks, &count, &capacity);
+        st.windowsDone = ps.windowsDone;
+        st.lastSign = ps.lastSign;
+    }
+    double *loc = nullptr, *amp = nullptr, *d2 = nullptr;
+    if (s == 0) s = f.Resize(set.locations, count, &loc);
+    if (s == 0) s = f.Resize(set.amplitudes, count, &amp);
+    if (s == 0) s = f.Resize(set.secondDerivatives, count, &d2);
+    if (s == 0)
+        for (int32_t i = 0; i < count; ++i) loc[i] = peaks[i].location, amp[i] = peaks[i].amplitude,
+                                            d2[i] = peaks[i].secondDerivative;
+    ScratchFree(peaks);
+    s = f.Finish(s);
+    if (s < 0 || final) {
+        if (work != nullptr) {
+            HostResize(TypeF64, 1, &work, 0);
+            if (*work != nullptr) std::memset(*work, 0, 4);
+        }
+        st = {};
+    } else {
+        // The record points into the host's block, wherever the host placed it.
+        auto* base = reinterpret_cast<double*>(static_cast<unsigned char*>(*work) + 4);
+        const auto wz = static_cast<size_t>(width);
+        st.width = width;
+        st.tailCount = st.carried = width;
+        st.polarity = set.polarity;
+        st.projection = base;
+        st.window = base + 3 * wz;
+        st.tail = base + 4 * wz;
+        st.lastCoefficients = base + 5 * wz;
+        st.data = reinterpret_cast<const double*>(static_cast<unsigned char*>(*data) + 4) + skip;
+    }
+    set.count = s < 0 ? 0 : count;
+    std::memcpy(stateRecord, &st, sizeof st);
+    std::memcpy(&settingsRecord->locations, &set.locations, 3 * sizeof(Handle));
+    std::memcpy(&settingsRecord->count, &set.count, sizeof set.count);
+    return s;
+}
+
+}  // namespace
+
+TW_API int32_t PeakDetector(Array1DHandle x, double* threshold, int32_t* width, Array1DHandle locations,
+                            int32_t* count, int32_t* status) {
+    Frame f;
+    f.Output<int32_t>(locations);
+    const int32_t n = Count(x);
+    Status s = n < 1 ? EmptyArrayErr : (*width < 1 || *width >= n) ? WidthRangeErr : 0;
+    const double* xs = nullptr;
+    int32_t* loc = nullptr;
+    int32_t found = 0;
+    if (s == 0) s = f.In(x, &xs);
+    if (s == 0) s = f.Resize(locations, n / *width + 1, &loc);
+    if (s == 0) {
+        found = ThresholdRuns(xs, n, *threshold, *width, loc);
+        s = f.Resize(locations, found, &loc);
+    }
+    s = f.Finish(s);
+    *count = s < 0 ? 0 : found;
+    *status = s;
+    return s;
+}
+
+TW_API int32_t PeakD2014(Array1DHandle raw, PeakDetectSettings* settings, PeakDetectState* state,
+                         Array1DHandle work, int32_t* status, int32_t mode) {
+    const Status s = StreamPeaks(raw, settings, state, work, mode);
+    if (status != nullptr) *status = s;
+    return s;
+}
+
+TW_API int32_t PeakD2010(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work,
+                         int32_t* status, int32_t mode) {
+    return PeakD2014(nullptr, settings, state, work, status, mode);
+}
+
+TW_API int32_t PeakD(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work, int32_t* status) {
+    return PeakD2010(settings, state, work, status, 0);
 }

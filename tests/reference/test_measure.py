@@ -312,5 +312,174 @@ class Pulses(unittest.TestCase):
                 self.assertAlmostEqual(rms, np.sqrt(np.mean(seg * seg)), delta=1e-14)
 
 
+class PeakSettings(ctypes.Structure):
+    _fields_ = [("data", P), ("threshold", D), ("width", I32), ("polarity", I32), ("locations", P),
+                ("amplitudes", P), ("second", P), ("count", I32), ("flags", ctypes.c_uint32)]
+
+
+tw.lib.PeakD2014.argtypes = [P, P, P, P, ctypes.POINTER(I32), I32]
+tw.lib.PeakDetector.argtypes = [P, PD, ctypes.POINTER(I32), P, ctypes.POINTER(I32), ctypes.POINTER(I32)]
+
+
+class PeakStream:
+    """One stream of blocks through PeakD2014."""
+
+    def __init__(self, width, polarity=0, threshold=-1e300, mode=0):
+        self.width, self.polarity, self.threshold, self.mode = width, polarity, threshold, mode
+        self.state = ctypes.create_string_buffer(64)
+        self.work = tw.array(np.zeros(0))
+        self.outs = [tw.array(np.zeros(0)) for _ in range(3)]
+
+    def feed(self, block, flags):
+        data = tw.array(block)
+        st = PeakSettings(data.h, self.threshold, self.width, self.polarity, *[o.h for o in self.outs], -1, flags)
+        status = I32()
+        s = tw.lib.PeakD2014(data if self.mode == 2 else None, ctypes.byref(st), self.state, self.work,
+                             ctypes.byref(status), self.mode)
+        assert s == status.value
+        return [o.numpy() for o in self.outs], st.count, s
+
+
+def peaks_once(x, width, polarity=0, threshold=-1e300, mode=0):
+    return PeakStream(width, polarity, threshold, mode).feed(x, 5)
+
+
+def scan_reference(x, w, polarity, threshold, mode=0):
+    """The detector's scan on a whole stream, with coefficients from np.polyfit."""
+    x = np.asarray(x, float)
+    offset, normalise = 0.0, False
+    if mode != 0 and x.max() - x.min() < 1e-8:
+        offset, normalise = x.mean(), True
+        x = x - offset
+    h = (w - 1) / 2
+    t = np.arange(w) - h
+    out, last, last_sign = [], None, None
+    for g in range(len(x) - w + 1):
+        win, scale = x[g:g + w], 1.0
+        if normalise:
+            ext = win.max() if polarity == 0 else win.min()
+            scale = max(abs(ext), 2.220446049250313e-16)
+            win = win / scale
+        c2, c1, c0 = np.polyfit(t, win, 2)
+        sign = (c2 > 0) if abs(c1) <= 1e-10 else (c1 > 0)
+        cand = g > 0 and ((c2 < 0 if polarity == 0 else c2 > 0) if w < 5 else sign != last_sign)
+        d = 2 * c2
+        if cand and abs(d) >= 1e-10:
+            xv = -c1 / d
+            y, at, sc, ok = (c2 * xv + c1) * xv + c0, g, scale, True
+            if xv < -0.5:
+                ld = 2 * last[2]
+                if ld == 0:
+                    ok = False
+                elif abs(-last[1] / ld) < abs(xv):
+                    xv = -last[1] / ld
+                    y, d, at, sc = (last[2] * xv + last[1]) * xv + last[0], ld, g - 1, 1.0
+            if ok and abs(xv) <= 0.5 * h + 2.220446049250313e-15:
+                hit = (d < 0 and polarity == 0 and y * sc > threshold - offset) or \
+                      (d > 0 and polarity == 1 and y * sc < threshold - offset)
+                if hit:
+                    p = (at + h + xv, y * sc + offset, d * sc)
+                    if out and abs(p[0] - out[-1][0]) < 1.0:
+                        better = p[1] > out[-1][1] if polarity == 0 else p[1] < out[-1][1]
+                        if better:
+                            out[-1] = p
+                    else:
+                        out.append(p)
+        last, last_sign = (c0 * scale, c1 * scale, c2 * scale), sign
+    return np.array(out).reshape(-1, 3)
+
+
+class Peaks(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(11)
+
+    def bumps(self, n=400):
+        t = np.arange(n, dtype=float)
+        centres = self.rng.uniform(10, n - 10, 8)
+        return sum(np.exp(-0.5 * ((t - c) / self.rng.uniform(2, 6)) ** 2) * self.rng.uniform(0.5, 2)
+                   for c in centres) + self.rng.normal(0, 0.02, n)
+
+    def test_scan_against_polyfit(self):
+        for _ in each_placement():
+            for w in (3, 4, 5, 8, 21):
+                for polarity in (0, 1):
+                    x = self.bumps()
+                    if polarity:
+                        x = -x
+                    thr = 0.3 if polarity == 0 else -0.3
+                    (loc, amp, d2), count, s = peaks_once(x, w, polarity, thr)
+                    ref = scan_reference(x, w, polarity, thr)
+                    self.assertEqual((s, count), (0, len(ref)), (w, polarity))
+                    self.assertGreater(count, 0)
+                    np.testing.assert_allclose(loc, ref[:, 0], rtol=0, atol=1e-9)
+                    np.testing.assert_allclose(amp, ref[:, 1], rtol=0, atol=1e-11)
+                    np.testing.assert_allclose(d2, ref[:, 2], rtol=0, atol=1e-11)
+
+    def test_sampled_parabolas_have_exact_vertices(self):
+        t = np.arange(101, dtype=float)
+        for w in (5, 6, 11):
+            for vertex, a, b in ((50.3, 3.0, 0.01), (20.75, -1.0, 0.2)):
+                (loc, amp, d2), count, s = peaks_once(a - b * (t - vertex) ** 2, w, 0)
+                self.assertEqual((s, count), (0, 1))
+                self.assertAlmostEqual(loc[0], vertex, delta=1e-10)
+                self.assertAlmostEqual(amp[0], a, delta=1e-12)
+                self.assertAlmostEqual(d2[0], -2 * b, delta=1e-12)
+                (loc, amp, d2), count, s = peaks_once(-a + b * (t - vertex) ** 2, w, 1, 1e300)
+                self.assertEqual((s, count), (0, 1))
+                self.assertAlmostEqual(loc[0], vertex, delta=1e-10)
+                self.assertAlmostEqual(amp[0], -a, delta=1e-12)
+        # Width 3 on a single raised sample: found at that index.
+        x = np.zeros(20)
+        x[7] = 1.0
+        (loc, amp, _), count, s = peaks_once(x, 3, 0, 0.5)
+        self.assertEqual((s, count, loc[0], amp[0]), (0, 1, 7.0, 1.0))
+
+    def test_blocks_agree_with_one_block(self):
+        x = self.bumps(1000)
+        for w in (3, 5, 9):
+            whole, count, _ = peaks_once(x, w, 0, 0.3)
+            self.assertGreater(count, 3)
+            for cuts in ([w, 500], [137, 400, 420, 990], list(range(50, 1000, 50))):
+                stream = PeakStream(w, 0, 0.3)
+                found = []
+                edges = [0] + cuts + [1000]
+                for k in range(len(edges) - 1):
+                    flags = (1 if k == 0 else 0) | (4 if k == len(edges) - 2 else 0)
+                    (loc, amp, d2), c, s = stream.feed(x[edges[k]:edges[k + 1]], flags)
+                    self.assertEqual(s, 0)
+                    found += list(zip(loc, amp, d2))
+                np.testing.assert_array_equal(np.array(found).reshape(-1, 3), np.stack(whole, axis=1))
+                self.assertEqual(bytes(stream.state), bytes(64))
+                self.assertEqual(stream.work.shape(), (0,))
+
+    def test_near_flat_data(self):
+        t = np.arange(300, dtype=float)
+        x = 5.0 + 1e-10 * np.sin(2 * np.pi * t / 37.3)
+        for polarity, thr in ((0, 4.0), (1, 6.0)):
+            for mode in (1, 2):
+                (loc, amp, d2), count, s = peaks_once(x, 9, polarity, thr, mode)
+                ref = scan_reference(x, 9, polarity, thr, mode)
+                self.assertEqual((s, count), (0, len(ref)))
+                self.assertGreaterEqual(count, 7)
+                np.testing.assert_allclose(loc, ref[:, 0], rtol=0, atol=1e-6)
+                np.testing.assert_allclose(amp, ref[:, 1], rtol=0, atol=1e-15 * 5)
+            # The plain path sees curvature below its floor and reports nothing.
+            self.assertEqual(peaks_once(x, 9, polarity, thr, 0)[1], 0)
+
+    def test_threshold_runs(self):
+        for _ in each_placement():
+            x = self.rng.normal(size=2000)
+            for thr, width in ((0.5, 1), (0.5, 3), (-0.2, 4), (1.5, 1)):
+                loc, count, status = tw.array(np.zeros(0), np.int32), I32(), I32()
+                s = tw.lib.PeakDetector(tw.array(x), ctypes.byref(D(thr)), ctypes.byref(I32(width)), loc,
+                                        ctypes.byref(count), ctypes.byref(status))
+                above = np.r_[False, x >= thr, False].astype(int)
+                starts = np.flatnonzero(np.diff(above) == 1)
+                ends = np.flatnonzero(np.diff(above) == -1)
+                ref = starts[ends - starts >= width]
+                self.assertEqual((s, status.value, count.value), (0, 0, len(ref)))
+                np.testing.assert_array_equal(loc.numpy(), ref)
+
+
 if __name__ == "__main__":
     unittest.main()
