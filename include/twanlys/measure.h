@@ -120,4 +120,23 @@ TW_API int32_t PeakD2010(PeakDetectSettings* settings, PeakDetectState* state, A
                          int32_t* status, int32_t mode);
 TW_API int32_t PeakD(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work, int32_t* status);
 
+/* The measurements hold no state: these return 0 and do nothing. */
+TW_API int32_t measurements_create(void);
+TW_API int32_t measurements_clear(void);
+TW_API int32_t measurements_destroy(void);
+
+/* One measurement of the n samples by selector, into result[0] (and result[2] for the time of
+ * 28, 29; result[0..7] for the transition records 32, 33). 0-2: minimum, maximum, their difference;
+ * 3-5: histogram low, high, amplitude; 6-8: automatic high, low, amplitude; 9-11: low, mid, high
+ * reference in absolute units; 12: hysteresis; 13: RMS; 14: mean; 15: period; 16: 1 / period;
+ * 17, 18: RMS and mean of the first cycle; 19, 20: duration of the first rising, falling
+ * transition; 21: 2-norm; 22, 23: width of the first positive, negative pulse; 24, 25: their duty
+ * cycles; 26, 27: slew rate of the first rising, falling transition; 28, 29: preshoot and
+ * overshoot of the first transition of `polarity` with its time; 30, 31: pulse centres; 32, 33:
+ * slew rate, duration, start, end, preshoot, its time, overshoot, its time of the first rising,
+ * falling transition. Other selectors leave the result alone. */
+TW_API int32_t measurements_fetch(void* unused, int32_t selector, const MeasureReferences* references,
+                                  const HistogramSettings* histogram, int32_t polarity, double t0, double dt,
+                                  const double* samples, int32_t n, int32_t strict, double* result);
+
 #endif

@@ -4,9 +4,11 @@
 
 #include "frame/frame.hpp"
 #include "frame/host_link.hpp"
+#include "measure/handles.hpp"
 #include "measure/peaks.hpp"
 #include "measure/pulse.hpp"
 #include "measure/state_levels.hpp"
+#include "twanlys/link.h"
 #include "twanlys/measure.h"
 
 using namespace tw;
@@ -344,4 +346,50 @@ TW_API int32_t PeakD2010(PeakDetectSettings* settings, PeakDetectState* state, A
 
 TW_API int32_t PeakD(PeakDetectSettings* settings, PeakDetectState* state, Array1DHandle work, int32_t* status) {
     return PeakD2010(settings, state, work, status, 0);
+}
+
+namespace {
+
+int32_t Nothing() { return 0; }
+
+}  // namespace
+
+// The measurements hold no state: the companions of the fetch entry have nothing to do.
+TW_API int32_t measurements_create(void) { return Nothing(); }
+TW_API int32_t measurements_clear(void) { return Nothing(); }
+TW_API int32_t measurements_destroy(void) { return Nothing(); }
+
+TW_API int32_t measurements_fetch(void*, int32_t selector, const MeasureReferences* references,
+                                  const HistogramSettings* histogram, int32_t polarity, double t0, double dt,
+                                  const double* samples, int32_t n, int32_t strict, double* result) {
+    Status s = 0;
+    if (n < 1 || samples == nullptr) s = MeasureEmptyWaveformErr;
+    else if (!(dt > 0)) s = MeasureDtErr;
+    double values[8] = {};
+    int32_t written = 0;
+    Scratch<double> copy;
+    if (s == 0) {
+        const double* xs = samples;
+        // The host's samples may be only 4-byte aligned.
+        if (reinterpret_cast<uintptr_t>(samples) % alignof(double) != 0) {
+            s = copy.Allocate(static_cast<size_t>(n));
+            if (s == 0) std::memcpy(copy.get(), samples, static_cast<size_t>(n) * sizeof(double));
+            xs = copy.get();
+        }
+        void* none = nullptr;
+        if (s == 0)
+            s = MeasureFrame(nullptr, references, histogram, &none, true, strict,
+                             [&](const double*, int32_t, References* r, const LevelSettings& ls) {
+                return FetchMeasurement(selector, *r, ls, polarity == 0xFFFF ? -1 : polarity, t0, dt, xs, n,
+                                        values, &written);
+            });
+        if (none != nullptr) MeasurementUnreserveProc(&none);
+    }
+    if (s < 0) written = FetchSlots(selector);
+    if (result != nullptr) {
+        if (written >= 1) std::memcpy(result, &values[0], sizeof(double));
+        if (written == 2) std::memcpy(result + 2, &values[2], sizeof(double));
+        if (written == 8) std::memcpy(result, values, sizeof values);
+    }
+    return s;
 }

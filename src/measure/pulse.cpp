@@ -48,6 +48,12 @@ double Between(const double* x, int32_t i, double level) {
 
 }  // namespace
 
+Status ReferenceLevels(const double* x, int32_t n, double t0, double dt, References* refs, const LevelSettings& ls,
+                       double* hysteresis) {
+    StateInfo st{};
+    return ResolveLevels(x, n, t0, dt, 1, refs, ls, false, &st, hysteresis);
+}
+
 int32_t FindCrossings(const double* x, int32_t n, double t0, double mid, double h, bool startArmed,
                       Crossing* list, int32_t capacity) {
     int32_t count = 0;

@@ -22,6 +22,10 @@ struct LevelSettings {
     int32_t strict;
 };
 
+// The references in absolute units and the hysteresis, with the checks every measurement makes.
+Status ReferenceLevels(const double* x, int32_t n, double t0, double dt, References* refs, const LevelSettings& ls,
+                       double* hysteresis);
+
 struct Crossing {
     double position;  // in samples, plus t0
     int32_t direction;  // 1 rising, 0 falling

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstring>
 #include <functional>
 #include <vector>
 
@@ -172,6 +173,52 @@ TEST_P(Measure, WorkCellKeepsOneBufferAndOneCleanup) {
     EXPECT_EQ(TWRTCleanupCount(2), before + 1);
     EXPECT_EQ(MeasurementUnreserveProc(&idp), 0);
     EXPECT_EQ(TWRTRunCleanups(2), before + 1);
+}
+
+TEST(MeasureFetch, StatusesAndUnalignedSamples) {
+    EXPECT_EQ(measurements_create(), 0);
+    EXPECT_EQ(measurements_clear(), 0);
+    EXPECT_EQ(measurements_destroy(), 0);
+    struct Case {
+        int32_t selector, n;
+        double dt;
+        bool nullRefs;
+        HistogramSettings hist;
+        MeasureReferences refs;
+        int32_t status;
+    };
+    const MeasureReferences good{0.9, 0.5, 0.1, 0};
+    const Case cases[] = {
+        {0, 0, 0, true, {0, 0}, good, MeasureEmptyWaveformErr},
+        {0, 20, 0, true, {0, 0}, good, MeasureDtErr},
+        {0, 20, 1, true, {0, 0}, good, MeasureNullRecordErr},
+        {0, 20, 1, false, {3, 0}, good, HistogramSizeErr},
+        {0, 20, 1, false, {3, 10}, good, HistogramMethodErr},
+        {12, 20, 1, false, {0, 10}, {0.9, 0.95, 0.1, 0}, ReferenceOrderErr},
+        {12, 20, 1, false, {0, 10}, good, 0},
+        {29, 20, 1, false, {0, 10}, {0.9, 0.95, 0.1, 0}, ReferenceOrderErr},
+        {33, 20, 1, false, {0, 10}, good, 0},
+    };
+    // Samples at a 4-byte offset, as a packed host passes them.
+    std::vector<double> storage(22);
+    auto* x = reinterpret_cast<double*>(reinterpret_cast<unsigned char*>(storage.data()) + 4);
+    const V square = Square();
+    std::memcpy(x, square.data(), 20 * sizeof(double));
+    for (const Case& c : cases) {
+        double result[8] = {7, 7, 7, 7, 7, 7, 7, 7};
+        EXPECT_EQ(measurements_fetch(nullptr, c.selector, c.nullRefs ? nullptr : &c.refs, &c.hist, 1, 0, c.dt, x,
+                                     c.n, 0, result),
+                  c.status)
+            << c.selector;
+        const int written = c.selector == 33 ? 8 : 1;
+        for (int i = 0; i < 8; ++i) {
+            const bool slot = i < written || (c.selector == 29 && i == 2);
+            if (!slot || c.status < 0) EXPECT_EQ(result[i], slot ? 0.0 : 7.0) << c.selector << " " << i;
+        }
+        // Hysteresis 0.4; the first fall crosses 0.9 at 7.1 and 0.1 at 7.9.
+        const double want = c.selector == 12 ? 0.4 : 0.8;
+        EXPECT_NEAR(result[c.selector == 33 ? 1 : 0], c.status == 0 ? want : 0.0, 1e-15) << c.selector;
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Placements, Measure, ::testing::Bool(), twtest::PlacementName);

@@ -481,5 +481,59 @@ class Peaks(unittest.TestCase):
                 np.testing.assert_array_equal(loc.numpy(), ref)
 
 
+tw.lib.measurements_fetch.argtypes = [P, I32, P, P, I32, D, D, P, I32, I32, P]
+
+
+def fetch(selector, x, refs, hist, polarity=1, t0=0.0, dt=1.0, strict=0):
+    result = (D * 8)(*([7.0] * 8))
+    xs = np.ascontiguousarray(x, float)
+    s = tw.lib.measurements_fetch(None, selector, ctypes.byref(refs), ctypes.byref(hist), polarity, t0, dt,
+                                  xs.ctypes.data, xs.size, strict, result)
+    return list(result), s
+
+
+class Fetch(unittest.TestCase):
+    def test_whole_waveform_selectors_against_numpy(self):
+        x = np.random.default_rng(5).normal(1.0, 2.0, 999)
+        refs, hist = Refs(90, 50, 10, 1), Hist(0, 50)
+        cases = {0: x.min(), 1: x.max(), 2: x.max() - x.min(), 13: np.sqrt(np.mean(x * x)),
+                 14: np.mean(x), 21: np.linalg.norm(x)}
+        for sel, ref in cases.items():
+            r, s = fetch(sel, x, refs, hist)
+            self.assertEqual(s, 0)
+            self.assertAlmostEqual(r[0], ref, delta=1e-13 * max(1, abs(ref)))
+            self.assertEqual(r[1:], [7.0] * 7)
+        r, s = fetch(34, x, refs, hist)
+        self.assertEqual((s, r), (0, [7.0] * 8))
+
+    def test_selectors_agree_with_the_exports(self):
+        x = trapezoid(200, [19.6, 80.3, 140.3], 8.0, -1.0, 3.0)
+        x[30], x[17], x[91] = 3.5, -1.3, -1.6
+        t0, dt = 1.5, 0.01
+        refs, hist = Refs(90, 50, 10, 1), Hist(0, 64)
+        levels = {m: state_levels(x, m, 64, t0=t0, dt=dt)[0] for m in (0, 1, 2)}
+        rises = transition(x, refs, hist, 1, t0=t0, dt=dt)[0]
+        falls = transition(x, refs, hist, 0, t0=t0, dt=dt)[0]
+        pos = pulse(x, refs, hist, 1, t0=t0, dt=dt)[0]
+        neg = pulse(x, refs, hist, 0, t0=t0, dt=dt)[0]
+        anyp = pulse(x, refs, hist, 0xFFFF, t0=t0, dt=dt)[0]
+        cyc = cycle(x, refs, hist, t0=t0, dt=dt)[0]
+        want = {3: levels[0][1], 4: levels[0][0], 5: levels[0][2], 6: levels[2][0], 7: levels[2][1],
+                8: levels[2][2], 9: anyp[4], 10: anyp[5], 11: anyp[6], 12: min(anyp[5] - anyp[4], anyp[6] - anyp[5]),
+                15: anyp[0], 16: 1 / anyp[0], 17: cyc[0], 18: cyc[1], 19: rises[1], 20: falls[1], 22: pos[1],
+                23: neg[1], 24: pos[2], 25: neg[2], 26: rises[0], 27: falls[0], 30: pos[3], 31: neg[3]}
+        for sel, ref in want.items():
+            r, s = fetch(sel, x, refs, hist, t0=t0, dt=dt)
+            self.assertIn(s, (0, WEAK), sel)
+            self.assertEqual(r[0], ref, sel)
+        for sel, pol, ref in ((28, 1, rises[4:6]), (29, 1, rises[6:8]), (29, 0, falls[6:8])):
+            r, s = fetch(sel, x, refs, hist, pol, t0, dt)
+            self.assertEqual([r[0], r[2]], ref)
+            self.assertEqual(r[1], 7.0)
+            self.assertNotEqual(r[0], 0.0)
+        self.assertEqual(fetch(32, x, refs, hist, t0=t0, dt=dt)[0], rises[:8])
+        self.assertEqual(fetch(33, x, refs, hist, t0=t0, dt=dt)[0], falls[:8])
+
+
 if __name__ == "__main__":
     unittest.main()
