@@ -213,7 +213,9 @@ TEST(MeasureFetch, StatusesAndUnalignedSamples) {
         const int written = c.selector == 33 ? 8 : 1;
         for (int i = 0; i < 8; ++i) {
             const bool slot = i < written || (c.selector == 29 && i == 2);
-            if (!slot || c.status < 0) EXPECT_EQ(result[i], slot ? 0.0 : 7.0) << c.selector << " " << i;
+            if (!slot || c.status < 0) {
+                EXPECT_EQ(result[i], slot ? 0.0 : 7.0) << c.selector << " " << i;
+            }
         }
         // Hysteresis 0.4; the first fall crosses 0.9 at 7.1 and 0.1 at 7.9.
         const double want = c.selector == 12 ? 0.4 : 0.8;
