@@ -139,4 +139,15 @@ TW_API int32_t measurements_fetch(void* unused, int32_t selector, const MeasureR
                                   const HistogramSettings* histogram, int32_t polarity, double t0, double dt,
                                   const double* samples, int32_t n, int32_t strict, double* result);
 
+/* Sine tones of the first n samples of x: frequency (1 / dt units), amplitude and phase in
+ * degrees of A sin(2 pi f t + phase), refined below the bin width on the Hann-windowed spectrum
+ * with the other tones' leakage removed. sort 1 orders by amplitude (largest first), otherwise by
+ * frequency. Tones below threshold are dropped; at most maxTones are sought (0: return at once).
+ * residualMode 0 none, 1 x, 2 the sum of the tones, 3 x minus that sum; spectrum is then the
+ * residual's windowed power spectrum in dB over (n + 1) / 2 bins from f0 = 0 in steps df. */
+TW_API int32_t MultipleToneMeasurements(Array1DHandle x, int32_t n, double dt, int32_t sort, int32_t residualMode,
+                                        double threshold, int32_t maxTones, int32_t* found, Array1DHandle frequencies,
+                                        Array1DHandle amplitudes, Array1DHandle phases, Array1DHandle residual,
+                                        double* dtOut, Array1DHandle spectrum, double* f0, double* df);
+
 #endif

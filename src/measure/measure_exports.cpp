@@ -5,6 +5,7 @@
 #include "frame/frame.hpp"
 #include "frame/host_link.hpp"
 #include "measure/handles.hpp"
+#include "measure/multitone.hpp"
 #include "measure/peaks.hpp"
 #include "measure/pulse.hpp"
 #include "measure/state_levels.hpp"
@@ -391,5 +392,51 @@ TW_API int32_t measurements_fetch(void*, int32_t selector, const MeasureReferenc
         if (written == 2) std::memcpy(result + 2, &values[2], sizeof(double));
         if (written == 8) std::memcpy(result, values, sizeof values);
     }
+    return s;
+}
+
+TW_API int32_t MultipleToneMeasurements(Array1DHandle x, int32_t n, double dt, int32_t sort, int32_t residualMode,
+                                        double threshold, int32_t maxTones, int32_t* found, Array1DHandle frequencies,
+                                        Array1DHandle amplitudes, Array1DHandle phases, Array1DHandle residual,
+                                        double* dtOut, Array1DHandle spectrum, double* f0, double* df) {
+    Status s = n < 1 ? EmptyArrayErr : maxTones < 0 ? NegativeArgumentErr : 0;
+    if (s == 0 && maxTones == 0) return 0;
+    if (s == 0 && n > Count(x)) s = SizeMismatchErr;
+    Frame f;
+    for (Handle* h : {&frequencies, &amplitudes, &phases, &residual, &spectrum}) f.Output<double>(*h);
+    MultitoneOutputs o{};
+    const double* xs = nullptr;
+    if (s == 0) s = f.In(x, &xs);
+    if (s == 0) s = f.Resize(residual, n, &o.residual);
+    if (s == 0) s = f.Resize(spectrum, (n + 1) / 2, &o.spectrum);
+    if (s == 0) s = f.Resize(frequencies, maxTones, &o.frequencies);
+    if (s == 0) s = f.Resize(amplitudes, maxTones, &o.amplitudes);
+    if (s == 0) s = f.Resize(phases, maxTones, &o.phases);
+    if (s == 0) s = MultitoneCore(xs, n, dt, sort, residualMode, threshold, maxTones, &o);
+    // The tone arrays shrink to the tones found; staged views are written back first.
+    if (s >= 0) s = f.Finish(s);
+    if (s >= 0) {
+        double* unused = nullptr;
+        Frame g;
+        for (Handle* h : {&frequencies, &amplitudes, &phases}) {
+            if (s == 0) s = g.Resize(*h, o.found, &unused);
+        }
+        s = g.Finish(s);
+    } else {
+        s = f.Finish(s);
+    }
+    if (s < 0) {
+        // Five arrays emptied; residual and spectrum are shrunk with the rest.
+        o = {};
+        for (Handle* h : {&frequencies, &amplitudes, &phases, &residual, &spectrum})
+            if (*h != nullptr) {
+                HostResize(TypeF64, 1, h, 0);
+                if (**h != nullptr) std::memset(**h, 0, 4);
+            }
+    }
+    if (found != nullptr) *found = o.found;
+    if (dtOut != nullptr) *dtOut = o.dt;
+    if (f0 != nullptr) *f0 = o.f0;
+    if (df != nullptr) *df = o.df;
     return s;
 }

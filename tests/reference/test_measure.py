@@ -535,5 +535,123 @@ class Fetch(unittest.TestCase):
         self.assertEqual(fetch(33, x, refs, hist, t0=t0, dt=dt)[0], falls[:8])
 
 
+tw.lib.MultipleToneMeasurements.argtypes = [P, I32, D, I32, I32, D, I32, ctypes.POINTER(I32)] + [P] * 4 + \
+    [PD, P, PD, PD]
+
+
+def multitone(x, dt=1e-3, sort=0, mode=0, threshold=0.01, max_tones=10, n=None):
+    n = len(x) if n is None else n
+    outs = [tw.array(np.zeros(0)) for _ in range(5)]
+    found, dt_out, f0, df = I32(-1), D(), D(), D()
+    s = tw.lib.MultipleToneMeasurements(tw.array(x), n, dt, sort, mode, threshold, max_tones, ctypes.byref(found),
+                                        *outs[:4], ctypes.byref(dt_out), outs[4], ctypes.byref(f0), ctypes.byref(df))
+    return s, found.value, [o.numpy() for o in outs], (dt_out.value, f0.value, df.value)
+
+
+def hann_spectrum(x):
+    n = len(x)
+    w = 0.5 - 0.5 * np.cos(2 * np.pi * np.arange(n) / n)
+    return np.fft.rfft(x * (2 * np.sqrt(2) / n) * w)[: (n + 1) // 2]
+
+
+def tones(n, dt, parts):
+    t = np.arange(n) * dt
+    return sum(a * np.sin(2 * np.pi * f * t + np.radians(p)) for f, a, p in parts)
+
+
+def same_phase(a, b):
+    return abs((a - b + 180) % 360 - 180)
+
+
+class Multitone(unittest.TestCase):
+    def check(self, got, parts, df):
+        s, found, (fr, am, ph, _, _), _ = got
+        self.assertEqual((s, found), (0, len(parts)))
+        for (f, a, p), gf, ga, gp in zip(sorted(parts), fr, am, ph):
+            self.assertLess(abs(gf - f) / df, 1e-4)
+            self.assertLess(abs(ga - a) / a, 1e-4)
+            self.assertLess(same_phase(gp, p), 0.01)
+
+    def test_single_tones_below_bin_resolution(self):
+        rng = np.random.default_rng(17)
+        for _ in each_placement():
+            for n, dt in ((1001, 1e-3), (4096, 1 / 48000), (48000, 1 / 48000)):
+                df = 1 / (n * dt)
+                for bins in (3.5, 17.25, rng.uniform(20, n / 2 - 20), 100.0):
+                    part = (bins * df, rng.uniform(0.1, 5), rng.uniform(-179, 179))
+                    got = multitone(tones(n, dt, [part]), dt)
+                    self.check(got, [part], df)
+                    self.assertEqual(got[3], (dt, 0.0, df))
+
+    def test_tones_four_bins_apart_and_sort_orders(self):
+        n, dt = 8192, 1e-4
+        df = 1 / (n * dt)
+        parts = [(200.3 * df, 1.0, 30.0), (204.6 * df, 0.3, -60.0), (210.1 * df, 2.0, 100.0), (900.77 * df, 0.05, 5.0)]
+        x = tones(n, dt, parts)
+        self.check(multitone(x, dt, sort=0), parts, df)
+        s, found, (fr, am, ph, _, _), _ = multitone(x, dt, sort=1)
+        self.assertEqual(list(np.argsort(-am)), list(range(4)))
+        self.assertEqual(sorted(am, reverse=True), list(am))
+        # Fewer tones sought: the largest peaks stay.
+        s, found, (fr, am, ph, _, _), _ = multitone(x, dt, sort=1, max_tones=2)
+        self.assertEqual((s, found), (0, 2))
+        np.testing.assert_allclose(am, [2.0, 1.0], rtol=5e-3)
+        # A threshold drops the small tone.
+        self.assertEqual(multitone(x, dt, threshold=0.1)[1], 3)
+
+    def test_threshold_zero_reports_every_scanned_peak(self):
+        rng = np.random.default_rng(23)
+        n, dt = 512, 1.0
+        x = tones(n, dt, [(0.1, 1.0, 0.0), (0.27, 0.5, 45.0)]) + rng.normal(0, 0.01, n)
+        m = np.r_[np.abs(hann_spectrum(x)), 0.0]
+        peaks, i = 0, 0
+        while i < len(m) - 2:
+            a, b, c = m[i:i + 3]
+            if (a <= b and c <= b) or (i == 0 and a >= b and a > c):
+                peaks += 1
+                i += 2
+            else:
+                i += 1
+        self.assertGreater(peaks, 20)
+        s, found, (fr, am, ph, _, _), _ = multitone(x, dt, threshold=0.0, max_tones=1000)
+        self.assertEqual((s, found), (0, peaks))
+        self.assertTrue(np.all(np.diff(fr) > 0))
+
+    def test_residual_modes_and_spectrum(self):
+        n, dt = 2000, 0.5
+        df = 1 / (n * dt)
+        parts = [(123.4 * df, 1.5, 20.0), (400.9 * df, 0.7, -80.0)]
+        x = tones(n, dt, parts) + 0.01 * np.cos(np.arange(n) * 0.001)
+        for mode in (1, 2, 3):
+            s, found, (fr, am, ph, res, spec), _ = multitone(x, dt, mode=mode, threshold=0.05)
+            self.assertEqual((s, found), (0, 2))
+            t = np.arange(n) * dt
+            fit = sum(a * np.sin(2 * np.pi * f * t + np.radians(p)) for f, a, p in zip(fr, am, ph))
+            want = {1: x, 2: fit, 3: x - fit}[mode]
+            np.testing.assert_allclose(res, want, rtol=0, atol=1e-12)
+            # Compared as magnitudes: rounding of the transform is absolute, far below the peak.
+            ref = np.abs(hann_spectrum(want))
+            self.assertEqual(spec.size, (n + 1) // 2)
+            np.testing.assert_allclose(10 ** (spec / 20), ref, rtol=1e-12, atol=1e-14 * ref.max())
+        self.assertLess(np.max(np.abs(res)), 0.05)
+        # Mode 0 writes neither array; n below the record's length measures the first n samples.
+        s, found, (_, _, _, res, spec), _ = multitone(np.r_[x, np.ones(77)], dt, mode=0, threshold=0.05, n=n)
+        self.assertEqual((s, found, res.size, spec.size), (0, 2, n, (n + 1) // 2))
+
+    def test_no_tones_and_no_search(self):
+        s, found, (fr, am, ph, res, spec), scalars = multitone(np.zeros(64), 0.5, mode=1)
+        self.assertEqual((s, found, fr.size, scalars), (0, 0, 0, (0.5, 0.0, 1 / 32)))
+        np.testing.assert_array_equal(res, np.zeros(64))
+        self.assertTrue(np.all(np.isneginf(spec)))
+        # maxTones 0: nothing resized, found left as it was.
+        outs = [tw.array(np.full(3, 9.0)) for _ in range(5)]
+        found = I32(-5)
+        s = tw.lib.MultipleToneMeasurements(tw.array(np.ones(8)), 8, -1.0, 0, 9, 0.0, 0, ctypes.byref(found),
+                                            *outs[:4], PD(D(7)), outs[4], PD(D(7)), PD(D(7)))
+        self.assertEqual((s, found.value), (0, -5))
+        for o in outs:
+            np.testing.assert_array_equal(o.numpy(), [9.0] * 3)
+
+
 if __name__ == "__main__":
     unittest.main()
