@@ -5,13 +5,6 @@
 #include "measure/state_levels.hpp"
 
 namespace tw {
-namespace {
-
-// Selectors in pairs: the first of each is the rising edge or the positive pulse.
-bool Second(int32_t selector, int32_t first) { return selector == first + 1; }
-
-}  // namespace
-
 int32_t FetchSlots(int32_t selector) {
     if (selector < 0 || selector > 33) return 0;
     if (selector == 28 || selector == 29) return 2;
@@ -46,7 +39,8 @@ Status FetchMeasurement(int32_t selector, References refs, const LevelSettings& 
         v = selector == 13 ? std::sqrt(squares / n) : selector == 14 ? sum / n : std::sqrt(squares);
     } else if (selector == 15 || selector == 16 || (selector >= 22 && selector <= 25) || selector == 30 ||
                selector == 31) {
-        const int32_t pol = selector <= 16 ? -1 : (Second(selector, 22) || Second(selector, 24) || selector == 31) ? 0 : 1;
+        // Pairs 22/23, 24/25, 30/31: the even selector is the positive pulse.
+        const int32_t pol = selector <= 16 ? -1 : selector % 2 == 0 ? 1 : 0;
         PulseResult p{};
         s = PulseCore(x, n, t0, dt, pol, false, 1, &refs, ls, &p);
         v = selector == 15 ? p.period : selector == 16 ? 1 / p.period : selector <= 23 ? p.width

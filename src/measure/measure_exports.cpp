@@ -21,6 +21,12 @@ void Zero(std::initializer_list<double*> results) {
         if (p != nullptr) *p = 0;
 }
 
+// A failed host resize is a measurement's allocation failure.
+template <class T>
+Status Grow(Frame& f, Handle& h, int32_t n, T** data) {
+    return f.Resize(h, n, data) != 0 ? OutOfMemoryErr : 0;
+}
+
 int32_t Polarity(uint16_t p) { return p == 0xFFFF ? -1 : p; }
 
 // The shared frame: record and histogram checks, the bin buffer, an aligned view of x.
@@ -232,7 +238,7 @@ Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectSta
     const double* xs = nullptr;
     if (s == 0 && first && work == nullptr) s = NoPeakFoundErr;
     if (s == 0 && !first && (st.tailCount != width || Count(work) != 5 * width + 3)) s = StateSizeErr;
-    if (s == 0) s = first ? f.Resize(work, 5 * width + 3, &wk) : f.InPlace(work, &wk);
+    if (s == 0) s = first ? Grow(f, work, 5 * width + 3, &wk) : f.InPlace(work, &wk);
     if (s == 0) s = f.In(data, &xs);
     const WorkParts w = s == 0 ? Parts(wk, width) : WorkParts{};
     if (s == 0 && first) {
@@ -276,9 +282,9 @@ Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectSta
         st.lastSign = ps.lastSign;
     }
     double *loc = nullptr, *amp = nullptr, *d2 = nullptr;
-    if (s == 0) s = f.Resize(set.locations, count, &loc);
-    if (s == 0) s = f.Resize(set.amplitudes, count, &amp);
-    if (s == 0) s = f.Resize(set.secondDerivatives, count, &d2);
+    if (s == 0) s = Grow(f, set.locations, count, &loc);
+    if (s == 0) s = Grow(f, set.amplitudes, count, &amp);
+    if (s == 0) s = Grow(f, set.secondDerivatives, count, &d2);
     if (s == 0)
         for (int32_t i = 0; i < count; ++i) loc[i] = peaks[i].location, amp[i] = peaks[i].amplitude,
                                             d2[i] = peaks[i].secondDerivative;
@@ -322,10 +328,10 @@ TW_API int32_t PeakDetector(Array1DHandle x, double* threshold, int32_t* width, 
     int32_t* loc = nullptr;
     int32_t found = 0;
     if (s == 0) s = f.In(x, &xs);
-    if (s == 0) s = f.Resize(locations, n / *width + 1, &loc);
+    if (s == 0) s = Grow(f, locations, n / *width + 1, &loc);
     if (s == 0) {
         found = ThresholdRuns(xs, n, *threshold, *width, loc);
-        s = f.Resize(locations, found, &loc);
+        s = Grow(f, locations, found, &loc);
     }
     s = f.Finish(s);
     *count = s < 0 ? 0 : found;
@@ -407,11 +413,11 @@ TW_API int32_t MultipleToneMeasurements(Array1DHandle x, int32_t n, double dt, i
     MultitoneOutputs o{};
     const double* xs = nullptr;
     if (s == 0) s = f.In(x, &xs);
-    if (s == 0) s = f.Resize(residual, n, &o.residual);
-    if (s == 0) s = f.Resize(spectrum, (n + 1) / 2, &o.spectrum);
-    if (s == 0) s = f.Resize(frequencies, maxTones, &o.frequencies);
-    if (s == 0) s = f.Resize(amplitudes, maxTones, &o.amplitudes);
-    if (s == 0) s = f.Resize(phases, maxTones, &o.phases);
+    if (s == 0) s = Grow(f, residual, n, &o.residual);
+    if (s == 0) s = Grow(f, spectrum, (n + 1) / 2, &o.spectrum);
+    if (s == 0) s = Grow(f, frequencies, maxTones, &o.frequencies);
+    if (s == 0) s = Grow(f, amplitudes, maxTones, &o.amplitudes);
+    if (s == 0) s = Grow(f, phases, maxTones, &o.phases);
     if (s == 0) s = MultitoneCore(xs, n, dt, sort, residualMode, threshold, maxTones, &o);
     // The tone arrays shrink to the tones found; staged views are written back first.
     if (s >= 0) s = f.Finish(s);
@@ -419,7 +425,7 @@ TW_API int32_t MultipleToneMeasurements(Array1DHandle x, int32_t n, double dt, i
         double* unused = nullptr;
         Frame g;
         for (Handle* h : {&frequencies, &amplitudes, &phases}) {
-            if (s == 0) s = g.Resize(*h, o.found, &unused);
+            if (s == 0) s = Grow(g, *h, o.found, &unused);
         }
         s = g.Finish(s);
     } else {

@@ -51,4 +51,27 @@ TEST(Multitone, StatusesInTheirOrder) {
     }
 }
 
+TEST(Multitone, HostResizeFailureIsOutOfMemory) {
+    for (int32_t at = 1; at <= 9; ++at) {
+        std::vector<double> v(100);
+        for (size_t i = 0; i < v.size(); ++i) v[i] = std::sin(0.3 * static_cast<double>(i));
+        Array1D<double> x(v), fr, am, ph, res, spec;
+        int32_t found = -1;
+        double dtOut = 7, f0 = 7, df = 7;
+        TWRTFailResizeAt(at);
+        const int32_t s = MultipleToneMeasurements(x.h(), 100, 1, 0, 1, 0.1, 3, &found, fr.h(), am.h(), ph.h(),
+                                                   res.h(), &dtOut, spec.h(), &f0, &df);
+        TWRTFailResizeAt(0);
+        // Five resizes before the core, three after it.
+        if (at == 9) {
+            EXPECT_EQ(s, 0);
+            EXPECT_EQ(found, 1);
+            continue;
+        }
+        EXPECT_EQ(s, OutOfMemoryErr) << at;
+        EXPECT_EQ(fr.size() + am.size() + ph.size() + res.size() + spec.size(), 0) << at;
+        EXPECT_EQ(found, 0);
+    }
+}
+
 }  // namespace
