@@ -115,13 +115,21 @@ double Change(double a, double b) {
     return std::fabs(a - b) / (m < 1e-12 ? 1 : m);
 }
 
-// The scaled, windowed spectrum of x in X[0..n).
-Status Spectrum(const FftTable* table, const double* x, int32_t n, double* work, double* half, cd* X) {
+// Bin k (0 <= k <= n) of the spectrum held half-complex in h.
+cd Bin(const double* h, int32_t n, int32_t k) {
+    if (k == 0 || k == n) return {h[0], 0};
+    if (2 * k == n) return {h[k], 0};
+    return 2 * k < n ? cd(h[k], h[n - k]) : cd(h[n - k], -h[k]);
+}
+
+// The scaled, windowed spectrum of x in X[0..count), count at most n + 1.
+Status Spectrum(const FftTable* table, const double* x, int32_t n, double* work, double* half, cd* X,
+                int32_t count) {
     const double scale = 2.8284271247461903 / n;
     for (int32_t i = 0; i < n; ++i) work[i] = x[i] * scale;
     Status s = CosineSumByNumber(work, n, 1, 0);
     if (s == 0) s = FftRealForward(table, work, half, 1, 1, n);
-    if (s == 0) FftUnpackHalfComplex(half, n, 0, X);
+    for (int32_t k = 0; s == 0 && k < count; ++k) X[k] = Bin(half, n, k);
     return s;
 }
 
@@ -176,21 +184,18 @@ Status MultitoneCore(const double* x, int32_t n, double dt, int32_t sort, int32_
     Scratch<PeakRecord> held;
     Status s = work.Allocate(un);
     if (s == 0) s = half.Allocate(un);
-    if (s == 0) s = X.Allocate(un + 1);
+    if (s == 0) s = X.Allocate(static_cast<size_t>(range) + 1);
     if (s == 0) s = mags.Allocate(static_cast<size_t>(range) + 1);
     if (s == 0) s = held.Allocate(static_cast<size_t>(maxTones));
     if (s == 0) s = tones.Allocate(static_cast<size_t>(maxTones));
     FftTable* table = s == 0 ? CreateFftTable(n) : nullptr;
     if (s == 0 && table == nullptr) s = OutOfMemoryErr;
-    if (s == 0) s = Spectrum(table, x, n, work.get(), half.get(), X.get());
+    if (s == 0) s = Spectrum(table, x, n, work.get(), half.get(), X.get(), range + 1);
     if (s != 0) {
         DestroyFftTable(table);
         return s;
     }
-    // The bin past the end of the full spectrum wraps to 0; only the third bin of a peak at the
-    // top of the range can reach it.
-    X[un] = X[0];
-    for (int32_t k = 0; k < range; ++k) mags[static_cast<size_t>(k)] = std::abs(X[static_cast<size_t>(k)]);
+    for (int32_t k = 0; k < range; ++k) mags[static_cast<size_t>(k)] = std::sqrt(std::norm(X[static_cast<size_t>(k)]));
     mags[static_cast<size_t>(range)] = 0;
     const int32_t peaks = ScanPeaks(X.get(), mags.get(), range, n, threshold / 2.2627416997969525, maxTones, held.get());
 
@@ -278,7 +283,7 @@ Status MultitoneCore(const double* x, int32_t n, double dt, int32_t sort, int32_
                 r[k] = residualMode == 2 ? sum : x[k] - sum;
             }
         }
-        s = Spectrum(table, r, n, work.get(), half.get(), X.get());
+        s = Spectrum(table, r, n, work.get(), half.get(), X.get(), range);
         for (int32_t k = 0; s == 0 && k < range; ++k)
             out->spectrum[k] = 10 * std::log10(std::norm(X[static_cast<size_t>(k)]));
     }
