@@ -220,6 +220,7 @@ WorkParts Parts(double* base, int32_t width) {
 
 Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectState* stateRecord, Handle& work,
                    int32_t mode) {
+    // Without its records a stream has nowhere to report; refused like the other measurements.
     if (settingsRecord == nullptr || stateRecord == nullptr) return MeasureNullRecordErr;
     PeakDetectSettings set;
     PeakDetectState st;

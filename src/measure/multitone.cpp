@@ -79,6 +79,8 @@ double Slope(const Kernel& h, double f, int32_t k, const cd* y) {
            1.862645149230957e-09;
 }
 
+// The start bracket is chosen on the balance itself (it changes sign at the tone), and the final
+// complex amplitude is the mean of the two pair fits, or the one pair at an edge of the record.
 void Estimate(const Kernel& h, const PeakRecord& r, const cd* y, Tone* t) {
     const double b = r.spacing, f1 = r.f1;
     const int32_t k = r.bin;
@@ -95,6 +97,7 @@ void Estimate(const Kernel& h, const PeakRecord& r, const cd* y, Tone* t) {
         if (d == 0 || !std::isfinite(d)) break;
         const double step = Balance(h, f, k, y) / d;
         const double next = f - step;
+        // A step out of the record keeps the last estimate inside it.
         if (!(next >= lo && next <= hi)) break;
         f = next;
         if (std::fabs(step) <= 1e-7 * std::fabs(f)) break;

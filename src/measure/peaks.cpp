@@ -120,6 +120,7 @@ Status PeakScan(const double* projection, int32_t width, int32_t polarity, doubl
                 }
             }
         }
+        // The first window of a stream is stored as well: the next window may look back to it.
         last[0] = c0 * scale;
         last[1] = c1 * scale;
         last[2] = c2 * scale;
