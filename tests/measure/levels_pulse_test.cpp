@@ -152,6 +152,13 @@ TEST_P(Measure, SquareWaveResults) {
               0);
     EXPECT_DOUBLE_EQ(c[1], 4.0 / 8);
     EXPECT_DOUBLE_EQ(c[0], std::sqrt(4.0 / 8));
+    // The second rise crosses 0.1 at 11.1 and 0.9 at 11.9; no shoots on a clean square wave.
+    double t[11];
+    ASSERT_EQ(TransMeas_IDP(x.h(), 2, 0.5, 1, 2, &refs, &hist, &idp, &t[0], &t[1], &t[2], &t[3], &t[4], &t[5], &t[6],
+                            &t[7], &t[8], &t[9], &t[10], 0),
+              0);
+    const double edge[8] = {0.8 / 0.8 / 0.5, 0.8 * 0.5, 2 + 11.1 * 0.5, 2 + 11.9 * 0.5, 0, 0, 0, 0};
+    for (int i = 0; i < 8; ++i) EXPECT_NEAR(t[i], edge[i], 1e-14) << i;
     MeasurementUnreserveProc(&idp);
     EXPECT_EQ(idp, nullptr);
     TWRTRunCleanups(2);
