@@ -33,4 +33,44 @@ TW_API int32_t ArbitraryWaveCIN(Array1DHandle out, int32_t* length, double* ampl
 TW_API int32_t ChirpCIN(Array1DHandle out, int32_t* length, double* amplitude, double* start, double* end,
                         int32_t* status);
 
+/* Caller-held records, packed as the host lays them out. GaussSpare keeps the second value of a
+ * polar pair between calls of Gauss (12 bytes); BinomialCache keeps what BinomialNoiseH derives
+ * from the folded probability and the trial count (52 bytes). Zeros are a valid start for both. */
+#pragma pack(push, 4)
+typedef struct {
+    int32_t haveSpare;
+    double spare;
+} GaussSpare;
+
+typedef struct {
+    double p;
+    double q;
+    double lnP;
+    double lnQ;
+    double trialsF;
+    double lnGammaTrials;
+    int32_t trials;
+} BinomialCache;
+#pragma pack(pop)
+
+/* Noise. Every generator reseeds when its seed is at least 0 (Gauss: above 0, which also drops
+ * the spare) and otherwise continues the caller's stream; the record is left after the last draw.
+ * white, Gauss and PeriodNoise report through the status pointer and return 0 or the host's own
+ * resize code; the others return the status. A rejection sampler that rejects 100000 times in a
+ * row (a record stuck at zero, a mean beyond what f64 resolves) gives NoConvergenceErr. */
+TW_API int32_t white(Array1DHandle out, int32_t* length, double* amplitude, int32_t* seed, int32_t* status,
+                     RandomState* state);
+TW_API int32_t Gauss(Array1DHandle out, int32_t* length, double* deviation, int32_t* seed, int32_t* status,
+                     RandomState* state, GaussSpare* spare);
+/* Period n, a flat line spectrum of amplitude A per line, integer phases in radians. */
+TW_API int32_t PeriodNoise(int32_t* length, double* amplitude, int32_t* seed, Array1DHandle out,
+                           int32_t* status, RandomState* state);
+TW_API AnalysisStatus GammaNoiseH(Array1DHandle out, int32_t length, int32_t order, int32_t seed,
+                                  RandomState* state);
+TW_API AnalysisStatus PoissonNoiseH(Array1DHandle out, int32_t length, double mean, int32_t seed,
+                                    RandomState* state);
+/* u32 output. */
+TW_API AnalysisStatus BinomialNoiseH(Array1DHandle out, int32_t length, int32_t trials, double probability,
+                                     int32_t seed, RandomState* state, BinomialCache* cache);
+
 #endif
