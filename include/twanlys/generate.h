@@ -73,4 +73,38 @@ TW_API AnalysisStatus PoissonNoiseH(Array1DHandle out, int32_t length, double me
 TW_API AnalysisStatus BinomialNoiseH(Array1DHandle out, int32_t length, int32_t trials, double probability,
                                      int32_t seed, RandomState* state, BinomialCache* cache);
 
+/* Patterns: one-shot sequences, status through the pointer; the result is 0, or the host's own
+ * code when resizing the output failed. Phase in degrees, duty in percent. */
+TW_API int32_t SinePtrn(Array1DHandle out, int32_t* length, double* amplitude, double* phase, double* cycles,
+                        int32_t* status);
+/* Unipolar: amplitude for the high part of each period, 0 otherwise. Duty not positive gives
+ * PeriodNotPositiveErr; cycles not positive or above length/2 DutyRangeErr. */
+TW_API int32_t Square(Array1DHandle out, int32_t* length, double* amplitude, double* duty, double* cycles,
+                      int32_t* status);
+TW_API int32_t PulsePtrn(Array1DHandle out, int32_t* length, double* amplitude, int32_t* delay,
+                         int32_t* width, int32_t* status);
+TW_API int32_t ImpulsePtrn(Array1DHandle out, int32_t* length, double* amplitude, int32_t* delay,
+                           int32_t* status);
+TW_API int32_t SincWave(Array1DHandle out, int32_t* length, double* amplitude, double* delay, double* dt,
+                        int32_t* status);
+TW_API int32_t RampPtrn(Array1DHandle out, int32_t* length, double* start, double* end, int32_t* status);
+TW_API AnalysisStatus RampPtrn80(Array1DHandle out, int32_t length, double start, double end,
+                                 int32_t excludeEnd);
+/* scale 0 linear, 1 logarithmic. excludeEnd 0 ends on end exactly; 1 stops a step short of it. */
+TW_API AnalysisStatus RampPtrn85(Array1DHandle out, int32_t length, double start, double end,
+                                 int32_t excludeEnd, uint32_t scale);
+
+/* Pulses. An out array that arrives non-empty holds the times to evaluate at (its count replaces
+ * the length; dt and delay are then ignored) and is overwritten with the shape; an empty one is
+ * sampled at t = k dt - delay. */
+TW_API AnalysisStatus AperiodTriangleH(Array1DHandle out, int32_t length, double amplitude, double delay,
+                                       double dt, double width, double skew);
+/* bandwidth is fractional, measured at attenuation dB below the peak. */
+TW_API AnalysisStatus GaussPulseH(Array1DHandle out, int32_t length, double amplitude, double delay,
+                                  double dt, double centerFrequency, double bandwidth, double attenuation);
+TW_API AnalysisStatus GaussMonopulseH(Array1DHandle out, int32_t length, double dt, double delay,
+                                      double centerFrequency, double amplitude);
+TW_API AnalysisStatus PeriodicSincH(Array1DHandle out, int32_t length, double amplitude, int32_t order,
+                                    double dt, double delay);
+
 #endif

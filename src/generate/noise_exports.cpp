@@ -69,17 +69,15 @@ TW_API int32_t PeriodNoise(int32_t* length, double* amplitude, int32_t* seed, Ar
 TW_API AnalysisStatus GammaNoiseH(Array1DHandle out, int32_t length, int32_t order, int32_t seed,
                                   RandomState* state) {
     const Status checked = order < 1 ? InvalidSelectorErr : 0;
-    return Noise<double>(out, length, checked, seed, state, [&](double* y, int32_t n, RandomState* st) {
-        return GammaNoise(y, n, order, st);
-    });
+    return Noise<double>(out, length, checked, seed, state,
+                         [&](double* y, int32_t n, RandomState* st) { return GammaNoise(y, n, order, st); });
 }
 
 TW_API AnalysisStatus PoissonNoiseH(Array1DHandle out, int32_t length, double mean, int32_t seed,
                                     RandomState* state) {
     const Status checked = mean < 0 || std::isnan(mean) ? InvalidSelectorErr : 0;
-    return Noise<double>(out, length, checked, seed, state, [&](double* y, int32_t n, RandomState* st) {
-        return PoissonNoise(y, n, mean, st);
-    });
+    return Noise<double>(out, length, checked, seed, state,
+                         [&](double* y, int32_t n, RandomState* st) { return PoissonNoise(y, n, mean, st); });
 }
 
 TW_API AnalysisStatus BinomialNoiseH(Array1DHandle out, int32_t length, int32_t trials, double probability,

@@ -54,10 +54,12 @@ TEST(Noise, FailuresInTheirOrder) {
         return status;
     };
     const auto gamma = [](int32_t order) {
-        return Call([order](void** o, int32_t n, RandomState* st) { return GammaNoiseH(o, n, order, 5, st); });
+        return Call(
+            [order](void** o, int32_t n, RandomState* st) { return GammaNoiseH(o, n, order, 5, st); });
     };
     const auto poisson = [](double mean) {
-        return Call([mean](void** o, int32_t n, RandomState* st) { return PoissonNoiseH(o, n, mean, 5, st); });
+        return Call(
+            [mean](void** o, int32_t n, RandomState* st) { return PoissonNoiseH(o, n, mean, 5, st); });
     };
     const auto binomial = [](int32_t trials, double p) {
         return Call([trials, p](void** o, int32_t n, RandomState* st) {
