@@ -107,4 +107,25 @@ TW_API AnalysisStatus GaussMonopulseH(Array1DHandle out, int32_t length, double 
 TW_API AnalysisStatus PeriodicSincH(Array1DHandle out, int32_t length, double amplitude, int32_t order,
                                     double dt, double delay);
 
+/* Shuffles in place and reports the permutation applied (data out = data in [permutation]).
+ * algorithm 0 is the older non-uniform shuffle kept for unchanged results; any other value is
+ * Fisher-Yates. The forms without an algorithm use 0. */
+TW_API AnalysisStatus RiffleArrayDBL2012_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                              RandomState* state, int32_t algorithm);
+TW_API AnalysisStatus RiffleArrayInt2012_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                              RandomState* state, int32_t algorithm);
+TW_API AnalysisStatus RiffleArrayCDB2012_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                              RandomState* state, int32_t algorithm);
+/* A shuffled permutation of 0 .. n-1 alone. */
+TW_API AnalysisStatus RiffleIntNum2012_head(Array1DHandle permutation, int32_t n, int32_t seed,
+                                            RandomState* state, int32_t algorithm);
+TW_API AnalysisStatus RiffleArrayDBL_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                          RandomState* state);
+TW_API AnalysisStatus RiffleArrayInt_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                          RandomState* state);
+TW_API AnalysisStatus RiffleArrayCDB_head(Array1DHandle data, Array1DHandle permutation, int32_t seed,
+                                          RandomState* state);
+TW_API AnalysisStatus RiffleIntNum_head(Array1DHandle permutation, int32_t n, int32_t seed,
+                                        RandomState* state);
+
 #endif

@@ -186,4 +186,25 @@ TEST(Patterns, SinePatternIsTheWaveOnAPhaseCopy) {
     EXPECT_EQ(phase, -40);
 }
 
+// A refused shuffle draws nothing and empties both arrays.
+TEST(Patterns, RefusedShuffleDrawsNothing) {
+    RandomState st{4, 5, 6};
+    Out empty;
+    twrt::Array1D<int32_t> perm{1, 2, 3};
+    EXPECT_EQ(RiffleArrayDBL2012_head(empty.h(), perm.h(), 3, &st, 1), EmptyArrayErr);
+    EXPECT_EQ(perm.size(), 0);
+    twrt::Array1D<int32_t> perm2{1, 2, 3};
+    EXPECT_EQ(RiffleIntNum_head(perm2.h(), 0, 3, &st), EmptyArrayErr);
+    EXPECT_EQ(perm2.size(), 0);
+    EXPECT_EQ(st.s1, 4);
+    EXPECT_EQ(st.s2, 5);
+    EXPECT_EQ(st.s3, 6);
+    twrt::Array1D<int32_t> data{7, 8}, perm3;
+    TWRTFailResizeAt(1);
+    EXPECT_EQ(RiffleArrayInt_head(data.h(), perm3.h(), 3, &st), OutOfMemoryErr);
+    TWRTFailResizeAt(0);
+    EXPECT_EQ(data.size(), 0);
+    EXPECT_EQ(st.s1, 4);
+}
+
 }  // namespace

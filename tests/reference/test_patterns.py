@@ -1,12 +1,18 @@
-"""Patterns and pulses against NumPy/SciPy and the stated formulas."""
+"""Patterns, pulses and shuffles against NumPy/SciPy, the stated formulas and a Python rendering of
+the shuffles' draws."""
 import ctypes
 import math
+import os
+import sys
 import unittest
 
 import numpy as np
 from scipy import signal, special
 
 import twanlys as tw
+
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "generate"))
+import wichmann_hill_reference as wh  # noqa: E402
 
 D, I32, U32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_uint32, ctypes.c_void_p
 lib = tw.lib
@@ -16,6 +22,16 @@ lib.AperiodTriangleH.argtypes = [P, I32, D, D, D, D, D]
 lib.GaussPulseH.argtypes = [P, I32, D, D, D, D, D, D]
 lib.GaussMonopulseH.argtypes = [P, I32, D, D, D, D]
 lib.PeriodicSincH.argtypes = [P, I32, D, I32, D, D]
+for name in ("RiffleArrayDBL2012_head", "RiffleArrayInt2012_head", "RiffleArrayCDB2012_head"):
+    getattr(lib, name).argtypes = [P, P, I32, P, I32]
+lib.RiffleIntNum2012_head.argtypes = [P, I32, I32, P, I32]
+for name in ("RiffleArrayDBL_head", "RiffleArrayInt_head", "RiffleArrayCDB_head"):
+    getattr(lib, name).argtypes = [P, P, I32, P]
+lib.RiffleIntNum_head.argtypes = [P, I32, I32, P]
+
+
+class State(ctypes.Structure):
+    _fields_ = [("s1", I32), ("s2", I32), ("s3", I32)]
 
 
 def pulse(export, n, *args, times=None):
@@ -132,6 +148,48 @@ class Pulses(unittest.TestCase):
         y, s = pulse("GaussMonopulseH", 0, 0.0, 0.0, fc, a, times=tt)
         np.testing.assert_allclose(y, [a, -a], rtol=1e-15)
         self.assertLessEqual(np.max(np.abs(pulse("GaussMonopulseH", n, dt, delay, fc, a)[0])), a * (1 + 1e-15))
+
+
+def ref_riffle(ref, n, algorithm):
+    perm = list(range(n))
+    order = range(n) if algorithm == 0 else range(n - 1, 0, -1)
+    for i in order:
+        j = int(math.floor(wh.uniform(ref) * (n if algorithm == 0 else i + 1)))
+        perm[i], perm[j] = perm[j], perm[i]
+    return perm
+
+
+class Riffle(unittest.TestCase):
+    def test_permutation_draws_and_data(self):
+        rng = np.random.default_rng(3)
+        kinds = [("DBL", np.float64, lambda n: rng.standard_normal(n)),
+                 ("Int", np.int32, lambda n: rng.integers(-1000, 1000, n)),
+                 ("CDB", np.complex128, lambda n: rng.standard_normal(n) + 1j * rng.standard_normal(n))]
+        for n in (1, 2, 7, 1000):
+            for algorithm in (0, 1, -3):
+                for kind, dtype, make in kinds:
+                    x = np.asarray(make(n), dtype=dtype)
+                    data, perm, st = tw.array(x, dtype), tw.empty(np.int32), State(5, 6, 7)
+                    seed = 40 + n
+                    if algorithm == 0 and n == 7:  # the old form forwards with algorithm 0
+                        s = getattr(lib, "RiffleArray%s_head" % kind)(data, perm, seed, ctypes.byref(st))
+                    else:
+                        s = getattr(lib, "RiffleArray%s2012_head" % kind)(data, perm, seed, ctypes.byref(st),
+                                                                         algorithm)
+                    self.assertEqual(s, 0)
+                    ref = wh.seed(seed)
+                    expected = ref_riffle(ref, n, algorithm)
+                    np.testing.assert_array_equal(perm.numpy(), expected)
+                    np.testing.assert_array_equal(data.numpy(), x[expected])
+                    self.assertEqual([st.s1, st.s2, st.s3], ref)  # n draws, or n - 1
+                perm, st = tw.empty(np.int32), State(5, 6, 7)
+                self.assertEqual(lib.RiffleIntNum2012_head(perm, n, -1, ctypes.byref(st), algorithm), 0)
+                ref = [5, 6, 7]
+                np.testing.assert_array_equal(perm.numpy(), ref_riffle(ref, n, algorithm))
+                self.assertEqual([st.s1, st.s2, st.s3], ref)
+        perm = tw.empty(np.int32)
+        self.assertEqual(lib.RiffleIntNum_head(perm, 50, 9, ctypes.byref(State())), 0)
+        np.testing.assert_array_equal(perm.numpy(), ref_riffle(wh.seed(9), 50, 0))
 
 
 if __name__ == "__main__":
