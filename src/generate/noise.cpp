@@ -203,12 +203,12 @@ Status BinomialNoise(uint32_t* y, int32_t n, int32_t trials, double probability,
         const double g = std::exp(-am);
         for (int32_t k = 0; k < n; ++k) {
             double t = 1.0;
-            int32_t j = 0;
+            int64_t j = 0;  // may pass the largest trial count
             for (; j <= trials; ++j) {
                 t *= RandomUniform(st);
                 if (t < g) break;
             }
-            store(k, std::min(j, trials));
+            store(k, static_cast<double>(std::min<int64_t>(j, trials)));
         }
         return 0;
     }
