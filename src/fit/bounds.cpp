@@ -87,8 +87,8 @@ struct PolyModel {
 // Jacobian rows into jac (n by p) and model values into f; G = sum |w| J^T J unless g is null.
 // Returns the residual sum of the expanded terms ((f - 2y) f + y y) |w|, not yet divided.
 template <class Model>
-double Rows(const Model& m, int32_t p, const double* x, const double* y, const double* w, int32_t n, double* jac,
-            double* f, double* g) {
+double Rows(const Model& m, int32_t p, const double* x, const double* y, const double* w, int32_t n,
+            double* jac, double* f, double* g) {
     double sum = 0;
     if (g != nullptr) std::fill(g, g + Cells(p, p), 0.0);
     for (int32_t i = 0; i < n; ++i) {
@@ -187,7 +187,8 @@ Status FitBoundsCore(const BoundModelParams& m, const double* x, const double* y
     if (!(level > 0 && level < 1)) return ProbabilityRangeErr;
 
     Scratch<double> deltas;
-    const bool wantDelta = !prediction && (upperParams != nullptr || lowerParams != nullptr || delta != nullptr);
+    const bool wantDelta =
+        !prediction && (upperParams != nullptr || lowerParams != nullptr || delta != nullptr);
     if (wantDelta && deltas.Allocate(static_cast<size_t>(p)) != 0) return OutOfMemoryErr;
     double* dj = wantDelta ? deltas.get() : nullptr;
     Status st = 0;
@@ -202,10 +203,12 @@ Status FitBoundsCore(const BoundModelParams& m, const double* x, const double* y
             st = Bands(PowerModel{v[0], v[1]}, p, false, x, y, w, n, level, prediction, upper, lower, dj);
             break;
         case BoundModel::Log:
-            st = Bands(LogModel(v[0], v[1], m.base), p, false, x, y, w, n, level, prediction, upper, lower, dj);
+            st = Bands(LogModel(v[0], v[1], m.base), p, false, x, y, w, n, level, prediction, upper, lower,
+                       dj);
             break;
         case BoundModel::Gauss:
-            st = Bands(GaussModel{v[0], v[1], v[2]}, p, false, x, y, w, n, level, prediction, upper, lower, dj);
+            st = Bands(GaussModel{v[0], v[1], v[2]}, p, false, x, y, w, n, level, prediction, upper, lower,
+                       dj);
             break;
         case BoundModel::Poly:
             st = Bands(PolyModel{v, p}, p, !prediction, x, y, w, n, level, prediction, upper, lower, dj);

@@ -22,9 +22,7 @@ struct BoundModelParams {
 };
 
 // Parameter count of a fixed model (the polynomial's is its coefficient count).
-constexpr int32_t BoundParameterCount(BoundModel m) {
-    return m == BoundModel::Gauss ? 3 : 2;
-}
+constexpr int32_t BoundParameterCount(BoundModel m) { return m == BoundModel::Gauss ? 3 : 2; }
 
 // The band f +/- d at the n samples into upper and lower. The confidence band (prediction false)
 // also gives the parameter intervals, count values each in argument order: upperParams,

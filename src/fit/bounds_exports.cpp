@@ -27,8 +27,8 @@ BoundOutputs Confidence(Handle& upper, Handle& lower, Handle& upperParams, Handl
 }
 
 // params holds the fixed models' parameters; the polynomial reads its coefficients from coef.
-Status BoundsFrame(BoundModel kind, Handle y, Handle x, Handle w, const double* params, Handle coef, double base,
-                   double level, bool prediction, const BoundOutputs& o) {
+Status BoundsFrame(BoundModel kind, Handle y, Handle x, Handle w, const double* params, Handle coef,
+                   double base, double level, bool prediction, const BoundOutputs& o) {
     Frame f;
     f.Output<double>(*o.upper);
     f.Output<double>(*o.lower);
@@ -49,10 +49,9 @@ Status BoundsFrame(BoundModel kind, Handle y, Handle x, Handle w, const double* 
                    (o.deltaArray != nullptr && f.Resize(*o.deltaArray, p, &dp) != 0)))
         s = OutOfMemoryErr;
     double d[3] = {0, 0, 0};
-    const bool scalars = o.deltas[0] != nullptr || o.deltas[1] != nullptr || o.deltas[2] != nullptr;
+    if (o.deltaArray == nullptr && o.upperParams != nullptr) dp = d;  // the fixed models' delta scalars
     if (s == 0)
-        s = FitBoundsCore({kind, cs, p, base}, xs, ys, ws, n, level, prediction, upper, lower, up, lo,
-                          o.deltaArray != nullptr ? dp : scalars ? d : nullptr);
+        s = FitBoundsCore({kind, cs, p, base}, xs, ys, ws, n, level, prediction, upper, lower, up, lo, dp);
     s = f.Finish(s);
     // Unlike the rest of the fitting exports, the deltas of a failed call are 0, not NaN.
     for (int j = 0; j < 3; ++j)
@@ -69,22 +68,25 @@ Status TwoParam(BoundModel kind, Handle y, Handle x, Handle w, double base, doub
 }  // namespace
 
 TW_API int32_t ConfBndLinear_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
-                                  double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
-                                  Array1DHandle lowerParams, double* deltaA, double* deltaB) {
+                                  double level, Array1DHandle upper, Array1DHandle lower,
+                                  Array1DHandle upperParams, Array1DHandle lowerParams, double* deltaA,
+                                  double* deltaB) {
     return TwoParam(BoundModel::Line, y, x, weights, 0, a, b, level, false,
                     Confidence(upper, lower, upperParams, lowerParams, deltaA, deltaB));
 }
 
 TW_API int32_t ConfBndExp_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
-                               double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
-                               Array1DHandle lowerParams, double* deltaA, double* deltaB) {
+                               double level, Array1DHandle upper, Array1DHandle lower,
+                               Array1DHandle upperParams, Array1DHandle lowerParams, double* deltaA,
+                               double* deltaB) {
     return TwoParam(BoundModel::Exp, y, x, weights, 0, a, b, level, false,
                     Confidence(upper, lower, upperParams, lowerParams, deltaA, deltaB));
 }
 
 TW_API int32_t ConfBndPower_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
-                                 double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
-                                 Array1DHandle lowerParams, double* deltaA, double* deltaB) {
+                                 double level, Array1DHandle upper, Array1DHandle lower,
+                                 Array1DHandle upperParams, Array1DHandle lowerParams, double* deltaA,
+                                 double* deltaB) {
     return TwoParam(BoundModel::Power, y, x, weights, 0, a, b, level, false,
                     Confidence(upper, lower, upperParams, lowerParams, deltaA, deltaB));
 }
@@ -102,15 +104,20 @@ TW_API int32_t ConfBndGauss_head(Array1DHandle y, Array1DHandle x, Array1DHandle
                                  Array1DHandle lower, Array1DHandle upperParams, Array1DHandle lowerParams,
                                  double* deltaAmplitude, double* deltaCentre, double* deltaDeviation) {
     const double params[3] = {amplitude, centre, deviation};
-    return BoundsFrame(BoundModel::Gauss, y, x, weights, params, nullptr, 0, level, false,
-                       Confidence(upper, lower, upperParams, lowerParams, deltaAmplitude, deltaCentre,
-                                  deltaDeviation));
+    return BoundsFrame(
+        BoundModel::Gauss, y, x, weights, params, nullptr, 0, level, false,
+        Confidence(upper, lower, upperParams, lowerParams, deltaAmplitude, deltaCentre, deltaDeviation));
 }
 
-TW_API int32_t ConfBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle coefficients,
-                                double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperCoefficients,
+TW_API int32_t ConfBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                Array1DHandle coefficients, double level, Array1DHandle upper,
+                                Array1DHandle lower, Array1DHandle upperCoefficients,
                                 Array1DHandle lowerCoefficients, Array1DHandle deltaCoefficients) {
-    const BoundOutputs o{&upper, &lower, &upperCoefficients, &lowerCoefficients, &deltaCoefficients,
+    const BoundOutputs o{&upper,
+                         &lower,
+                         &upperCoefficients,
+                         &lowerCoefficients,
+                         &deltaCoefficients,
                          {nullptr, nullptr, nullptr}};
     return BoundsFrame(BoundModel::Poly, y, x, weights, nullptr, coefficients, 0, level, false, o);
 }
@@ -139,11 +146,13 @@ TW_API int32_t PredBndGauss_head(Array1DHandle y, Array1DHandle x, Array1DHandle
                                  double centre, double deviation, double level, Array1DHandle upper,
                                  Array1DHandle lower) {
     const double params[3] = {amplitude, centre, deviation};
-    return BoundsFrame(BoundModel::Gauss, y, x, weights, params, nullptr, 0, level, true, Prediction(upper, lower));
+    return BoundsFrame(BoundModel::Gauss, y, x, weights, params, nullptr, 0, level, true,
+                       Prediction(upper, lower));
 }
 
-TW_API int32_t PredBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle coefficients,
-                                double level, Array1DHandle upper, Array1DHandle lower) {
+TW_API int32_t PredBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                Array1DHandle coefficients, double level, Array1DHandle upper,
+                                Array1DHandle lower) {
     return BoundsFrame(BoundModel::Poly, y, x, weights, nullptr, coefficients, 0, level, true,
                        Prediction(upper, lower));
 }

@@ -24,50 +24,34 @@ struct Bands {
     V upper, lower, upperParams, lowerParams, delta;
 };
 
+using H = Array1DHandle;
+using Conf2 = int32_t (*)(H, H, H, double, double, double, H, H, H, H, double*, double*);
+using Pred2 = int32_t (*)(H, H, H, double, double, double, H, H);
+const Conf2 kConf2[] = {ConfBndLinear_head, ConfBndExp_head, ConfBndPower_head};
+const Pred2 kPred2[] = {PredBndLinear_head, PredBndExp_head, PredBndPower_head};
+
 // One call of a confidence (or prediction) export; parameters in argument order. The delta
 // scalars start as 7 so that a failure visibly rewrites them.
 Bands Call(Model m, bool prediction, const V& y, const V& x, const V& w, const V& p, double level, double base = 10) {
-    Array1D<double> ya(y), xa(x), wa(w), up, lo, upp, lop, dc;
+    Array1D<double> ya(y), xa(x), wa(w), up, lo, upp, lop, dc, coef(p);
     double d[3] = {7, 7, 7};
     int32_t s = 0;
+    H a = ya.h(), b = xa.h(), c = wa.h();
     if (prediction) {
-        switch (m) {
-            case Line: s = PredBndLinear_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h()); break;
-            case Exp: s = PredBndExp_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h()); break;
-            case Power: s = PredBndPower_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h()); break;
-            case Log: s = PredBndLog_head(ya.h(), xa.h(), wa.h(), base, p[0], p[1], level, up.h(), lo.h()); break;
-            case Gauss:
-                s = PredBndGauss_head(ya.h(), xa.h(), wa.h(), p[0], p[1], p[2], level, up.h(), lo.h());
-                break;
-            case Poly: s = PredBndPoly_head(ya.h(), xa.h(), wa.h(), Array1D<double>(p).h(), level, up.h(), lo.h());
-        }
+        if (m <= Power) s = kPred2[m](a, b, c, p[0], p[1], level, up.h(), lo.h());
+        if (m == Log) s = PredBndLog_head(a, b, c, base, p[0], p[1], level, up.h(), lo.h());
+        if (m == Gauss) s = PredBndGauss_head(a, b, c, p[0], p[1], p[2], level, up.h(), lo.h());
+        if (m == Poly) s = PredBndPoly_head(a, b, c, coef.h(), level, up.h(), lo.h());
         return {s, up.vec(), lo.vec(), {}, {}, {}};
     }
-    switch (m) {
-        case Line:
-            s = ConfBndLinear_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0],
-                                   &d[1]);
-            break;
-        case Exp:
-            s = ConfBndExp_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0],
-                                &d[1]);
-            break;
-        case Power:
-            s = ConfBndPower_head(ya.h(), xa.h(), wa.h(), p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0],
-                                  &d[1]);
-            break;
-        case Log:
-            s = ConfBndLog_head(ya.h(), xa.h(), wa.h(), base, p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(),
-                                &d[0], &d[1]);
-            break;
-        case Gauss:
-            s = ConfBndGauss_head(ya.h(), xa.h(), wa.h(), p[0], p[1], p[2], level, up.h(), lo.h(), upp.h(), lop.h(),
-                                  &d[0], &d[1], &d[2]);
-            break;
-        case Poly:
-            s = ConfBndPoly_head(ya.h(), xa.h(), wa.h(), Array1D<double>(p).h(), level, up.h(), lo.h(), upp.h(),
-                                 lop.h(), dc.h());
-            return {s, up.vec(), lo.vec(), upp.vec(), lop.vec(), dc.vec()};
+    if (m <= Power) s = kConf2[m](a, b, c, p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0], &d[1]);
+    if (m == Log)
+        s = ConfBndLog_head(a, b, c, base, p[0], p[1], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0], &d[1]);
+    if (m == Gauss)
+        s = ConfBndGauss_head(a, b, c, p[0], p[1], p[2], level, up.h(), lo.h(), upp.h(), lop.h(), &d[0], &d[1], &d[2]);
+    if (m == Poly) {
+        s = ConfBndPoly_head(a, b, c, coef.h(), level, up.h(), lo.h(), upp.h(), lop.h(), dc.h());
+        return {s, up.vec(), lo.vec(), upp.vec(), lop.vec(), dc.vec()};
     }
     return {s, up.vec(), lo.vec(), upp.vec(), lop.vec(), V(d, d + (m == Gauss ? 3 : 2))};
 }
