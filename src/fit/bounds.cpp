@@ -112,8 +112,9 @@ double Rows(const Model& m, int32_t p, const double* x, const double* y, const d
 }
 
 // The common procedure. svdCovariance: C from the SVD of the sqrt|w|-scaled Jacobian without a
-// cut-off (the polynomial confidence band), else the pseudo-inverse of G at the default
-// tolerance. f goes into upper first. deltaJ (p, in J order) may be null.
+// cut-off (the polynomial confidence band; the least-squares core takes it through the triangle of
+// a QR reduction, which has the same singular values and right vectors), else the pseudo-inverse
+// of G at the default tolerance. f goes into upper first. deltaJ (p, in J order) may be null.
 template <class Model>
 Status Bands(const Model& m, int32_t p, bool svdCovariance, const double* x, const double* y, const double* w,
              int32_t n, double level, bool prediction, double* upper, double* lower, double* deltaJ) {
