@@ -129,6 +129,19 @@ void Fits() {
     std::printf("Fits to %d samples with a ripple of 0.05\n", n);
     std::printf("  line 0.75 t - 1.5:        slope %.6f, intercept %.6f, R^2 %.6f (status %d)\n", slope,
                 intercept, r2, status);
+    Array1D<double> cu, cl, pu, pl, upperParams, lowerParams;
+    double dSlope = 0, dIntercept = 0;
+    const int32_t cs = ConfBndLinear_head(lineData.h(), x.h(), none.h(), slope, intercept, 0.95, cu.h(), cl.h(),
+                                          upperParams.h(), lowerParams.h(), &dSlope, &dIntercept);
+    const int32_t ps = PredBndLinear_head(lineData.h(), x.h(), none.h(), slope, intercept, 0.95, pu.h(), pl.h());
+    if (cs == 0 && ps == 0) {
+        std::printf("  95 %% intervals: slope +/- %.6f, intercept +/- %.6f; bands of the line:\n", dSlope, dIntercept);
+        for (int32_t i : {0, 50, 100, 150, n - 1})
+            std::printf("    t %5.2f  fit %8.4f  confidence [%8.4f, %8.4f]  prediction [%8.4f, %8.4f]\n", x[i],
+                        line[i], cl[i], cu[i], pl[i], pu[i]);
+    } else {
+        std::printf("  bounds failed: %d %d\n", cs, ps);
+    }
     double amplitude, centre, deviation;
     int32_t steps = 500;
     status = GaussianPeakFit_head(peak.h(), x.h(), none.h(), 1e-8, none.h(), &amplitude, &centre, &deviation,

@@ -71,4 +71,51 @@ TW_API int32_t GaussianPeakFitCoef_head(Array1DHandle y, Array1DHandle x, Array1
                                         Array1DHandle guess, double* amplitude, double* centre, double* deviation,
                                         int32_t* iterations, double floor);
 
+/* ---- Confidence and prediction bounds ---------------------------------------------------------
+ * Bands of a model at given parameters (from any fit), by linearisation: C is the pseudo-inverse
+ * of sum |w| J^T J, s2 = sum(((f - 2y) f + y y) |w|) / (n - p), t the Student t quantile at
+ * 1 - (1 - level) / 2 with n - p degrees of freedom. Confidence band f +/- sqrt(J C J^T s2) t;
+ * prediction band f +/- sqrt((J C J^T + 1 / |w|) s2) t (1 in place of 1 / |w| unweighted). The
+ * confidence exports also give parameter intervals: delta_j = sqrt(C_jj) t sqrt(s2), upper and
+ * lower parameters the parameters plus and minus their deltas (the line's slope first). Curves
+ * are resized to n, parameter outputs to the parameter count. level lies in (0, 1); the models
+ * take at least 3 samples (the Gaussian 4, the polynomial more than its coefficient count). On
+ * failure the arrays shrink and the delta scalars are 0. Model values and the logarithm base rule
+ * are those of the fits above. */
+TW_API int32_t ConfBndLinear_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                                  double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
+                                  Array1DHandle lowerParams, double* deltaA, double* deltaB);
+TW_API int32_t ConfBndExp_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                               double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
+                               Array1DHandle lowerParams, double* deltaA, double* deltaB);
+TW_API int32_t ConfBndPower_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                                 double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperParams,
+                                 Array1DHandle lowerParams, double* deltaA, double* deltaB);
+TW_API int32_t ConfBndLog_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double a,
+                               double b, double level, Array1DHandle upper, Array1DHandle lower,
+                               Array1DHandle upperParams, Array1DHandle lowerParams, double* deltaA,
+                               double* deltaB);
+TW_API int32_t ConfBndGauss_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double amplitude,
+                                 double centre, double deviation, double level, Array1DHandle upper,
+                                 Array1DHandle lower, Array1DHandle upperParams, Array1DHandle lowerParams,
+                                 double* deltaAmplitude, double* deltaCentre, double* deltaDeviation);
+/* The polynomial confidence band takes C from the SVD of the sqrt|w|-scaled Vandermonde matrix
+ * without a cut-off, and its deltas are sqrt(C_jj s2) t. */
+TW_API int32_t ConfBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle coefficients,
+                                double level, Array1DHandle upper, Array1DHandle lower, Array1DHandle upperCoefficients,
+                                Array1DHandle lowerCoefficients, Array1DHandle deltaCoefficients);
+TW_API int32_t PredBndLinear_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                                  double level, Array1DHandle upper, Array1DHandle lower);
+TW_API int32_t PredBndExp_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                               double level, Array1DHandle upper, Array1DHandle lower);
+TW_API int32_t PredBndPower_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double a, double b,
+                                 double level, Array1DHandle upper, Array1DHandle lower);
+TW_API int32_t PredBndLog_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double a,
+                               double b, double level, Array1DHandle upper, Array1DHandle lower);
+TW_API int32_t PredBndGauss_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double amplitude,
+                                 double centre, double deviation, double level, Array1DHandle upper,
+                                 Array1DHandle lower);
+TW_API int32_t PredBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle coefficients,
+                                double level, Array1DHandle upper, Array1DHandle lower);
+
 #endif
