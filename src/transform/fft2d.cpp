@@ -1,0 +1,191 @@
+#include "transform/fft2d.hpp"
+
+#include <algorithm>
+
+namespace tw {
+namespace {
+
+using cdouble = std::complex<double>;
+
+// Columns transformed together: gathered row by row into unit-stride buffers, so each pass over
+// the matrix reads a run of neighbours instead of one strided element.
+constexpr int32_t kBatch = 8;
+
+double* Lanes(cdouble* p) { return reinterpret_cast<double*>(p); }
+const double* Lanes(const cdouble* p) { return reinterpret_cast<const double*>(p); }
+
+size_t Idx(int32_t r, int32_t c, int32_t ld) { return static_cast<size_t>(r) * static_cast<size_t>(ld) + static_cast<size_t>(c); }
+
+// Complex transforms of the first `ncols` columns of src (leading dimension ld, rows x ld), into
+// dst: column element i is read from row (i + readOffset) mod rows if i < present (else zero) and
+// written to row (i + writeOffset) mod rows. src and dst may be the same matrix.
+template <bool Inverse>
+Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t rows, int32_t ncols, int32_t ld,
+                  int32_t present, int32_t readOffset, int32_t writeOffset) {
+    Scratch<cdouble> work;
+    if (const Status s = work.Allocate(2 * static_cast<size_t>(kBatch) * static_cast<size_t>(rows))) return s;
+    cdouble* in = work.get();
+    cdouble* out = in + static_cast<size_t>(kBatch) * static_cast<size_t>(rows);
+    for (int32_t c0 = 0; c0 < ncols; c0 += kBatch) {
+        const int32_t nb = std::min(kBatch, ncols - c0);
+        for (int32_t i = 0; i < rows; ++i) {
+            const int32_t r = (i + readOffset) % rows;
+            for (int32_t b = 0; b < nb; ++b) in[Idx(b, i, rows)] = i < present ? src[Idx(r, c0 + b, ld)] : cdouble{};
+        }
+        for (int32_t b = 0; b < nb; ++b) {
+            double* bi = Lanes(in + Idx(b, 0, rows));
+            double* bo = Lanes(out + Idx(b, 0, rows));
+            const Status s = Inverse ? FftComplexInverse(t, bi, bi + 1, bo, bo + 1, 2, 2, rows)
+                                     : FftComplexForward(t, bi, bi + 1, bo, bo + 1, 2, 2, rows);
+            if (s != 0) return MergeRelease(s, work.Release());
+        }
+        for (int32_t i = 0; i < rows; ++i) {
+            const int32_t r = (i + writeOffset) % rows;
+            for (int32_t b = 0; b < nb; ++b) dst[Idx(r, c0 + b, ld)] = out[Idx(b, i, rows)];
+        }
+    }
+    return work.Release();
+}
+
+// Rows actually present in the window, and its columns present in x.
+int32_t PresentRows(const Fft2DWindow& w) { return std::min(w.rows, w.xRows - w.rowStart); }
+int32_t PresentCols(const Fft2DWindow& w) { return w.xCols - w.colStart; }
+
+bool BadStart(const Fft2DWindow& w) { return w.rowStart < 0 || w.colStart < 0; }
+
+// Row r of the window, zero-padded to cols when the matrix ends first.
+template <class T>
+const T* WindowRow(const T* x, const Fft2DWindow& w, int32_t r, T* pad) {
+    const T* row = x + Idx(w.rowStart + r, w.colStart, w.xCols);
+    const int32_t avail = PresentCols(w);
+    if (w.cols <= avail) return row;
+    std::copy(row, row + avail, pad);
+    std::fill(pad + avail, pad + w.cols, T{});
+    return pad;
+}
+
+}  // namespace
+
+Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x, const Fft2DWindow& w,
+                        int32_t shift, cdouble* y) {
+    if (BadStart(w)) return IndexRangeErr;
+    const int32_t rows = w.rows, cols = w.cols, half = cols / 2 + 1, present = PresentRows(w);
+    // Only the non-negative row frequencies 0 .. cols/2 are transformed down the columns.
+    Scratch<cdouble> spectrum;
+    Scratch<double> rowWork;
+    Status s = spectrum.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(half));
+    if (s == 0) s = rowWork.Allocate(2 * static_cast<size_t>(cols));
+    Scratch<cdouble> unpacked;
+    if (s == 0) s = unpacked.Allocate(static_cast<size_t>(cols));
+    for (int32_t r = 0; s == 0 && r < present; ++r) {
+        const double* row = WindowRow(x, w, r, rowWork.get() + cols);
+        s = FftRealForward(rowTable, row, rowWork.get(), 1, 1, cols);
+        if (s == 0) {
+            FftUnpackHalfComplex(rowWork.get(), cols, 0, unpacked.get());
+            std::copy(unpacked.get(), unpacked.get() + half, spectrum.get() + Idx(r, 0, half));
+        }
+    }
+    if (s == 0) s = ColumnPass<false>(colTable, spectrum.get(), spectrum.get(), rows, half, half, present, 0, 0);
+    if (s == 0) {
+        // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c]. The columns of the DC and (even
+        // cols) Nyquist row frequencies pair with themselves: their lower half is mirrored too, and
+        // their self-paired entries are real, so the result is exactly Hermitian.
+        const cdouble* hs = spectrum.get();
+        const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
+        for (int32_t r = 0; r < rows; ++r) {
+            const int32_t mr = r == 0 ? 0 : rows - r;
+            cdouble* out = y + Idx((r + ro) % rows, 0, cols);
+            for (int32_t c = 0; c < cols; ++c) {
+                const bool selfColumn = c == 0 || 2 * c == cols;
+                cdouble v;
+                if (c < half && !selfColumn)
+                    v = hs[Idx(r, c, half)];
+                else if (c < half && r < mr)
+                    v = hs[Idx(r, c, half)];
+                else if (c < half && r == mr)
+                    v = {hs[Idx(r, c, half)].real(), 0.0};
+                else
+                    v = std::conj(hs[Idx(mr, c == 0 ? 0 : cols - c, half)]);
+                out[(c + co) % cols] = v;
+            }
+        }
+    }
+    s = MergeRelease(s, unpacked.Release());
+    s = MergeRelease(s, rowWork.Release());
+    return MergeRelease(s, spectrum.Release());
+}
+
+Status Fft2DComplexForward(const FftTable* rowTable, const FftTable* colTable, const cdouble* x,
+                           const Fft2DWindow& w, int32_t shift, cdouble* y) {
+    if (BadStart(w)) return IndexRangeErr;
+    const int32_t rows = w.rows, cols = w.cols, present = PresentRows(w);
+    Scratch<cdouble> pad;
+    Status s = pad.Allocate(static_cast<size_t>(cols));
+    for (int32_t r = 0; s == 0 && r < present; ++r) {
+        const cdouble* row = WindowRow(x, w, r, pad.get());
+        cdouble* out = y + Idx(r, 0, cols);
+        s = FftComplexForward(rowTable, Lanes(row), Lanes(row) + 1, Lanes(out), Lanes(out) + 1, 2, 2, cols);
+        if (s == 0 && shift != 0) std::rotate(out, out + (cols - cols / 2), out + cols);
+    }
+    if (s == 0) s = ColumnPass<false>(colTable, y, y, rows, cols, cols, present, 0, shift != 0 ? rows / 2 : 0);
+    return MergeRelease(s, pad.Release());
+}
+
+namespace {
+
+// The row pass of both inverses: S[r] = inverse transform of row r of x, rotation undone first.
+Status InverseRows(const FftTable* rowTable, const cdouble* x, int32_t rows, int32_t cols, int32_t shift,
+                   cdouble* S) {
+    Scratch<cdouble> unrotated;
+    Status s = shift != 0 ? unrotated.Allocate(static_cast<size_t>(cols)) : 0;
+    for (int32_t r = 0; s == 0 && r < rows; ++r) {
+        const cdouble* row = x + Idx(r, 0, cols);
+        if (shift != 0) {
+            std::rotate_copy(row, row + cols / 2, row + cols, unrotated.get());
+            row = unrotated.get();
+        }
+        cdouble* out = S + Idx(r, 0, cols);
+        s = FftComplexInverse(rowTable, Lanes(row), Lanes(row) + 1, Lanes(out), Lanes(out) + 1, 2, 2, cols);
+    }
+    return MergeRelease(s, unrotated.Release());
+}
+
+}  // namespace
+
+Status Fft2DComplexInverse(const FftTable* rowTable, const FftTable* colTable, const cdouble* x, int32_t rows,
+                           int32_t cols, int32_t shift, cdouble* y) {
+    Scratch<cdouble> S;
+    Status s = S.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(cols));
+    if (s == 0) s = InverseRows(rowTable, x, rows, cols, shift, S.get());
+    if (s == 0) s = ColumnPass<true>(colTable, S.get(), y, rows, cols, cols, rows, shift != 0 ? rows / 2 : 0, 0);
+    return MergeRelease(s, S.Release());
+}
+
+Status Fft2DRealInverse(const FftTable* rowTable, const FftTable* colTable, const cdouble* x, int32_t rows,
+                        int32_t cols, int32_t shift, double* y) {
+    Scratch<cdouble> S;
+    Scratch<double> work;
+    Status s = S.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(cols));
+    if (s == 0) s = InverseRows(rowTable, x, rows, cols, shift, S.get());
+    // Per batch: the gathered columns (complex), their packings and the real results.
+    const size_t n = static_cast<size_t>(rows), batch = static_cast<size_t>(kBatch);
+    if (s == 0) s = work.Allocate(batch * n * 4);
+    for (int32_t c0 = 0; s == 0 && c0 < cols; c0 += kBatch) {
+        const int32_t nb = std::min(kBatch, cols - c0);
+        auto* column = reinterpret_cast<cdouble*>(work.get());
+        double* packed = work.get() + 2 * batch * n;
+        double* real = packed + batch * n;
+        for (int32_t i = 0; i < rows; ++i)
+            for (int32_t b = 0; b < nb; ++b) column[Idx(b, i, rows)] = S.get()[Idx(i, c0 + b, cols)];
+        for (int32_t b = 0; s == 0 && b < nb; ++b) {
+            FftPackHalfComplex(column + Idx(b, 0, rows), rows, shift, packed + Idx(b, 0, rows));
+            s = FftRealInverse(colTable, packed + Idx(b, 0, rows), real + Idx(b, 0, rows), 1, 1, rows);
+        }
+        for (int32_t i = 0; s == 0 && i < rows; ++i)
+            for (int32_t b = 0; b < nb; ++b) y[Idx(i, c0 + b, cols)] = real[Idx(b, i, rows)];
+    }
+    s = MergeRelease(s, work.Release());
+    return MergeRelease(s, S.Release());
+}
+
+}  // namespace tw
