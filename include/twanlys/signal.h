@@ -80,4 +80,14 @@ TW_API int32_t CxConvolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, 
  * returned and stored. */
 TW_API int32_t Deconvolution(Array1DHandle x, Array1DHandle y, int32_t* status);
 
+/* Two-dimensional convolution of matrices. sizeMode: 0 full, 1 the size of x from row r2/2 and
+ * column c2/2 of the full result (y of r2 x c2), 2 the valid part only. algorithm as above. */
+TW_API int32_t Convolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode, int32_t algorithm);
+/* Complex twin; in sizeMode 2 it also refuses matrices with fewer rows than columns. */
+TW_API int32_t CxConvolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode,
+                              int32_t algorithm);
+/* Full 2-D correlation: x reversed along both dimensions (and conjugated) convolved with y. */
+TW_API int32_t Correlation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
+TW_API int32_t CxCorrelation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
+
 #endif

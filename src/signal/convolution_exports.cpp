@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <cstdint>
+#include <type_traits>
 
 #include "frame/frame.hpp"
 #include "frame/status_styles.hpp"
@@ -122,6 +123,64 @@ Status DeconvolutionInPlace(Handle& x, Handle y) {
     return f.Finish(tw::MergeRelease(s, q.Release()));
 }
 
+// 2-D convolution (reverse false) or correlation: x reversed along both dimensions, and
+// conjugated for complex data, convolved with y. sizeMode 1 and 2 cut the full result, which is
+// then held in a scratch.
+template <class T>
+Status TwoD(Handle x, Handle y, Handle& z, int32_t sizeMode, int32_t algorithm, bool reverse) {
+    constexpr bool kComplex = std::is_same_v<T, cdouble>;
+    Frame f;
+    f.Output2D<T>(z);
+    const tw::Shape a = tw::Dims(x), b = tw::Dims(y);
+    const bool yLarger = b.rows > a.rows || b.cols > a.cols;
+    Status s = tw::Elements(a) < 1 || tw::Elements(b) < 1              ? EmptyArrayErr
+               : sizeMode < 0 || sizeMode > 2                        ? InvalidSelectorErr
+               : algorithm != 0 && algorithm != 1                    ? InvalidSelectorErr
+               : sizeMode == 2 && yLarger                            ? SizeMismatchErr
+               : kComplex && sizeMode == 2 && (a.rows < a.cols || b.rows < b.cols) ? SizeMismatchErr
+                                                                       : 0;
+    const int32_t fullRows = a.rows + b.rows - 1, fullCols = a.cols + b.cols - 1;
+    tw::Shape out = {fullRows, fullCols}, origin = {0, 0};
+    if (sizeMode == 1) out = a, origin = {b.rows / 2, b.cols / 2};
+    if (sizeMode == 2) out = {a.rows - b.rows + 1, a.cols - b.cols + 1}, origin = {b.rows - 1, b.cols - 1};
+    T* zs = nullptr;
+    if (s == 0) s = f.Resize2D(z, out.rows, out.cols, &zs) == 0 ? 0 : OutOfMemoryErr;
+    const T *xs = nullptr, *ys = nullptr;
+    if (s == 0) s = f.In2D(x, &xs);
+    if (s == 0) s = f.In2D(y, &ys);
+    tw::Scratch<T> reversed, full;
+    if (s == 0 && reverse) {
+        const size_t n = static_cast<size_t>(tw::Elements(a));
+        s = reversed.Allocate(n);
+        for (size_t i = 0; s == 0 && i < n; ++i) {
+            if constexpr (kComplex)
+                reversed[i] = std::conj(xs[n - 1 - i]);
+            else
+                reversed[i] = xs[n - 1 - i];
+        }
+        xs = reversed.get();
+    }
+    T* target = zs;
+    if (s == 0 && sizeMode != 0) {
+        s = full.Allocate(static_cast<size_t>(fullRows) * static_cast<size_t>(fullCols));
+        target = full.get();
+    }
+    if (s == 0) {
+        if (algorithm == 0)
+            tw::Convolve2DDirect(xs, a.rows, a.cols, ys, b.rows, b.cols, target);
+        else
+            s = tw::Convolve2DFrequency(xs, a.rows, a.cols, ys, b.rows, b.cols, target);
+    }
+    if (s == 0 && sizeMode != 0) {
+        for (int32_t r = 0; r < out.rows; ++r) {
+            const T* from = target + static_cast<size_t>(origin.rows + r) * static_cast<size_t>(fullCols) + origin.cols;
+            std::copy(from, from + out.cols, zs + static_cast<size_t>(r) * static_cast<size_t>(out.cols));
+        }
+    }
+    s = tw::MergeRelease(s, full.Release());
+    return f.Finish(tw::MergeRelease(s, reversed.Release()));
+}
+
 }  // namespace
 
 TW_API int32_t Convolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t* status) {
@@ -153,4 +212,21 @@ TW_API int32_t Deconvolution(Array1DHandle x, Array1DHandle y, int32_t* status) 
     const Status s = DeconvolutionInPlace(x, y);
     if (status != nullptr) *status = s;
     return s;
+}
+
+TW_API int32_t Convolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode, int32_t algorithm) {
+    return TwoD<double>(x, y, z, sizeMode, algorithm, false);
+}
+
+TW_API int32_t CxConvolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode,
+                              int32_t algorithm) {
+    return TwoD<cdouble>(x, y, z, sizeMode, algorithm, false);
+}
+
+TW_API int32_t Correlation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm) {
+    return TwoD<double>(x, y, z, 0, algorithm, true);
+}
+
+TW_API int32_t CxCorrelation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm) {
+    return TwoD<cdouble>(x, y, z, 0, algorithm, true);
 }

@@ -48,4 +48,14 @@ Status NormalizeCorrelation(T* z, int32_t nx, int32_t ny, int32_t normalization)
 // has a (near) zero at one of the bin pairs tested.
 Status Deconvolve(const double* x, int32_t nx, const double* y, int32_t ny, double* q);
 
+// Full 2-D convolution of x (r1 x c1) and y (r2 x c2) into z of (r1 + r2 - 1) x (c1 + c2 - 1),
+// row-major, T double or std::complex<double>. Direct: the input with fewer elements is the
+// kernel, every term bounds-tested. Frequency: both padded to exactly the full size (no length
+// rule) and multiplied under 2-D complex transforms; the real form keeps the real part.
+template <class T>
+void Convolve2DDirect(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2, int32_t c2, T* z);
+template <class T>
+Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2, int32_t c2, T* z);
+
+
 }  // namespace tw

@@ -206,6 +206,84 @@ class Deconvolution(unittest.TestCase):
             self.assertEqual((ret, s, len(got)), (want, want, 0))
 
 
+def two_d(name, x, y, *args):
+    dtype = np.complex128 if name.startswith("Cx") else np.float64
+    z = tw.empty(dtype, dims=2)
+    s = getattr(lib, name)(tw.matrix(x, dtype), tw.matrix(y, dtype), z, *args)
+    return s, z.numpy()
+
+
+class TwoD(unittest.TestCase):
+    def within(self, name, algorithm, got, want, ax, ay):
+        self.assertEqual(got.shape, want.shape, name)
+        if algorithm == 0:
+            # Each term of a complex sum carries two products: twice the real bound.
+            factor = 4 if np.iscomplexobj(got) else 2
+            bound = factor * EPS * min(ax.size, ay.size) * ss.convolve2d(ax, ay)
+            # The full bound, cut where the result is cut.
+            bound = bound[self.cut] if self.cut is not None else bound
+            ratio = np.max(np.abs(got - want) / np.maximum(bound, 1e-300))
+        else:
+            n = (ax.shape[0] + ay.shape[0] - 1) * (ax.shape[1] + ay.shape[1] - 1)
+            bound = 4 * EPS * max(1.0, np.log2(n)) * np.linalg.norm(ax) * np.linalg.norm(ay)
+            ratio = np.max(np.abs(got - want)) / bound
+        key = (name, algorithm)
+        WORST[key] = max(WORST.get(key, 0.0), ratio)
+        self.assertLessEqual(ratio, 1.0, "%s algorithm %d" % (name, algorithm))
+
+    def test_against_convolve2d_and_correlate2d(self):
+        rng = np.random.default_rng(36)
+        shapes = [((1, 1), (1, 1)), ((5, 7), (3, 2)), ((6, 4), (2, 4)), ((9, 8), (4, 3)), ((3, 3), (7, 5)),
+                  ((1, 12), (1, 5)), ((12, 1), (4, 1)), ((30, 20), (5, 6))]
+        for (r1, c1), (r2, c2) in shapes:
+            for complex_ in (False, True):
+                prefix = "Cx" if complex_ else ""
+                x, y = rng.standard_normal((r1, c1)), rng.standard_normal((r2, c2))
+                if complex_:
+                    x = x + 1j * rng.standard_normal((r1, c1))
+                    y = y + 1j * rng.standard_normal((r2, c2))
+                full = ss.convolve2d(x, y)
+                cuts = {0: (slice(None), slice(None)),
+                        1: (slice(r2 // 2, r2 // 2 + r1), slice(c2 // 2, c2 // 2 + c1)),
+                        2: (slice(r2 - 1, r1), slice(c2 - 1, c1))}
+                for algorithm in (0, 1):
+                    for mode, cut in cuts.items():
+                        if mode == 2 and (r2 > r1 or c2 > c1 or (complex_ and (r1 < c1 or r2 < c2))):
+                            continue
+                        self.cut = cut
+                        s, z = two_d(prefix + "Convolve_2DH", x, y, mode, algorithm)
+                        self.assertEqual(s, 0, (prefix, mode, algorithm))
+                        self.within(prefix + "Convolve_2DH", algorithm, z, full[cut], abs(x), abs(y))
+                    self.cut = None
+                    s, z = two_d(prefix + "Correlation_2DH", x, y, algorithm)
+                    self.assertEqual(s, 0)
+                    self.within(prefix + "Correlation_2DH", algorithm, z, ss.correlate2d(y, x), abs(x), abs(y))
+
+    def test_statuses_in_their_order(self):
+        x, y, wide = np.ones((4, 3)), np.ones((2, 2)), np.ones((2, 3))
+        rows = [  # (x, y, sizeMode, algorithm, real status, complex status)
+            (np.ones((0, 3)), y, 5, 5, -20003, -20003),
+            (x, y, 3, 5, -20061, -20061),
+            (x, y, -1, 0, -20061, -20061),
+            (x, y, 2, 2, -20061, -20061),
+            (y, x, 2, 0, -20008, -20008),
+            (x, np.ones((1, 4)), 2, 0, -20008, -20008),
+            (wide, np.ones((1, 1)), 2, 0, 0, -20008),  # only the complex twin refuses wide x
+            (x, np.ones((1, 2)), 2, 1, 0, -20008),     # or a wide y
+            (y, np.ones((3, 3)), 1, 0, 0, 0),          # sizeMode 1 keeps the size of x
+        ]
+        for a, b, mode, algorithm, real, cx in rows:
+            for name, want in (("Convolve_2DH", real), ("CxConvolve_2DH", cx)):
+                s, z = two_d(name, a, b, mode, algorithm)
+                self.assertEqual(s, want, (name, a.shape, b.shape, mode, algorithm))
+                valid = (a.shape[0] - b.shape[0] + 1, a.shape[1] - b.shape[1] + 1)
+                self.assertEqual(z.shape, (0, 0) if want else a.shape if mode == 1 else valid)
+        for name in ("Correlation_2DH", "CxCorrelation_2DH"):
+            for b, algorithm, want in ((np.ones((0, 0)), 0, -20003), (y, 2, -20061)):
+                s, z = two_d(name, x, b, algorithm)
+                self.assertEqual((s, z.shape), (want, (0, 0)))
+
+
 def tearDownModule():
     if WORST:
         sys.stderr.write("\nworst error as a fraction of its model bound:\n")
