@@ -87,27 +87,30 @@ Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, cons
     }
     if (s == 0) s = ColumnPass<false>(colTable, spectrum.get(), spectrum.get(), rows, half, half, present, 0, 0);
     if (s == 0) {
-        // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c]. The columns of the DC and (even
-        // cols) Nyquist row frequencies pair with themselves: their lower half is mirrored too, and
-        // their self-paired entries are real, so the result is exactly Hermitian.
+        // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c], built a row at a time in the
+        // unpacked buffer. The columns of the DC and (even cols) Nyquist row frequencies pair
+        // with themselves: their lower half is mirrored too, and their self-paired entries are
+        // real, so the result is exactly Hermitian.
         const cdouble* hs = spectrum.get();
+        cdouble* line = unpacked.get();
         const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
+        const int32_t nyquist = cols % 2 == 0 ? cols / 2 : -1;
         for (int32_t r = 0; r < rows; ++r) {
             const int32_t mr = r == 0 ? 0 : rows - r;
-            cdouble* out = y + Idx((r + ro) % rows, 0, cols);
-            for (int32_t c = 0; c < cols; ++c) {
-                const bool selfColumn = c == 0 || 2 * c == cols;
-                cdouble v;
-                if (c < half && !selfColumn)
-                    v = hs[Idx(r, c, half)];
-                else if (c < half && r < mr)
-                    v = hs[Idx(r, c, half)];
-                else if (c < half && r == mr)
-                    v = {hs[Idx(r, c, half)].real(), 0.0};
-                else
-                    v = std::conj(hs[Idx(mr, c == 0 ? 0 : cols - c, half)]);
-                out[(c + co) % cols] = v;
+            const cdouble* own = hs + Idx(r, 0, half);
+            const cdouble* mirror = hs + Idx(mr, 0, half);
+            std::copy(own, own + half, line);
+            for (int32_t c = half; c < cols; ++c) line[c] = std::conj(mirror[cols - c]);
+            for (const int32_t c : {0, nyquist}) {
+                if (c < 0) continue;
+                if (r == mr)
+                    line[c] = {own[c].real(), 0.0};
+                else if (r > mr)
+                    line[c] = std::conj(mirror[c]);
             }
+            cdouble* out = y + Idx((r + ro) % rows, 0, cols);
+            std::copy(line, line + (cols - co), out + co);
+            std::copy(line + (cols - co), line + cols, out);
         }
     }
     s = MergeRelease(s, unpacked.Release());
