@@ -76,37 +76,27 @@ Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32
     const FftTable* colTable = rows == cols ? t.cols : t.rows;
     if (rowTable == nullptr || colTable == nullptr) return OutOfMemoryErr;
     Scratch<cdouble> work;
-    // Two spectra; the real form also needs room for one input as a complex matrix.
-    constexpr bool kReal = std::is_same_v<T, double>;
-    const size_t copies = kReal ? std::max(static_cast<size_t>(r1) * static_cast<size_t>(c1),
-                                           static_cast<size_t>(r2) * static_cast<size_t>(c2))
-                                : 0;
-    if (const Status s = work.Allocate(2 * n + copies)) return s;
+    if (const Status s = work.Allocate(2 * n)) return s;
     cdouble* fx = work.get();
     cdouble* fy = fx + n;
+    // Real data take the real forward transform (half the column work, an exactly Hermitian
+    // spectrum, so the product is Hermitian too) and the real inverse, whose output is the real
+    // part of the complex inverse.
     const auto spectrum = [&](const T* v, int32_t rv, int32_t cv, cdouble* out) {
-        const cdouble* source;
-        if constexpr (kReal) {
-            cdouble* c = fy + n;
-            for (size_t i = 0; i < static_cast<size_t>(rv) * static_cast<size_t>(cv); ++i) c[i] = {v[i], 0.0};
-            source = c;
-        } else {
-            source = v;
-        }
         const Fft2DWindow w{rv, cv, 0, 0, rows, cols};
-        return Fft2DComplexForward(rowTable, colTable, source, w, 0, out);
+        if constexpr (std::is_same_v<T, double>)
+            return Fft2DRealForward(rowTable, colTable, v, w, 0, out);
+        else
+            return Fft2DComplexForward(rowTable, colTable, v, w, 0, out);
     };
     Status s = spectrum(x, r1, c1, fx);
     if (s == 0) s = spectrum(y, r2, c2, fy);
     if (s == 0) {
         for (size_t i = 0; i < n; ++i) fx[i] = Mul(fx[i], fy[i]);
-        s = Fft2DComplexInverse(rowTable, colTable, fx, rows, cols, 0, fy);
-    }
-    if (s == 0) {
-        if constexpr (kReal)
-            for (size_t i = 0; i < n; ++i) z[i] = fy[i].real();
+        if constexpr (std::is_same_v<T, double>)
+            s = Fft2DRealInverse(rowTable, colTable, fx, rows, cols, 0, z);
         else
-            std::copy(fy, fy + n, z);
+            s = Fft2DComplexInverse(rowTable, colTable, fx, rows, cols, 0, z);
     }
     return MergeRelease(s, work.Release());
 }
