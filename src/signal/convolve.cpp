@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <utility>
 
 #include "transform/fft/fft.hpp"
 
@@ -15,18 +16,19 @@ const double* Lanes(const cdouble* p) { return reinterpret_cast<const double*>(p
 
 size_t Size(int32_t n) { return static_cast<size_t>(n); }
 
-// A table of the shared list for one call.
-class OwnTable {
-public:
-    explicit OwnTable(int32_t n) : t_(CreateFftTable(n)) {}
-    OwnTable(const OwnTable&) = delete;
-    OwnTable& operator=(const OwnTable&) = delete;
-    ~OwnTable() { DestroyFftTable(t_); }
-    FftTable* get() const { return t_; }
+constexpr int32_t kPinLimit = 1 << 20;
 
-private:
-    FftTable* t_;
+// References held per thread, most recent first.
+struct PinnedTables {
+    FftTable* t[2] = {nullptr, nullptr};
+    PinnedTables() = default;
+    PinnedTables(const PinnedTables&) = delete;
+    PinnedTables& operator=(const PinnedTables&) = delete;
+    ~PinnedTables() {
+        for (FftTable* p : t) DestroyFftTable(p);
+    }
 };
+thread_local PinnedTables pinned;
 
 // a *= b bin by bin on half-complex spectra of length n; with power set, a becomes |a|^2 (b unused).
 void MultiplyHalfComplex(double* a, const double* b, int32_t n, bool power) {
@@ -54,7 +56,7 @@ Status RealFrequency(const double* x, int32_t nx, const double* y, int32_t ny, d
     const int32_t m = nx + ny - 1;
     const int32_t n = ConvolutionFftLength(m);
     if (n == 0) return OutOfMemoryErr;
-    OwnTable table(n);
+    CallTable table(n);
     if (table.get() == nullptr) return OutOfMemoryErr;
     Scratch<double> work;
     if (const Status s = work.Allocate(3 * Size(n))) return s;
@@ -96,6 +98,18 @@ void ComplexDot(const cdouble* x, int32_t nx, const cdouble* y, int32_t ny, cdou
 
 }  // namespace
 
+CallTable::CallTable(int32_t n) : t_(CreateFftTable(n)) {
+    if (t_ == nullptr || n > kPinLimit || pinned.t[0] == t_) return;
+    if (pinned.t[1] == t_) {
+        std::swap(pinned.t[0], pinned.t[1]);
+        return;
+    }
+    FftTable* extra = CreateFftTable(n);  // another reference to the same table
+    DestroyFftTable(pinned.t[1]);
+    pinned.t[1] = pinned.t[0];
+    pinned.t[0] = extra;
+}
+
 void ConvolveDirect(const double* x, int32_t nx, const double* y, int32_t ny, double* z) {
     std::fill(z, z + Size(nx + ny - 1), 0.0);
     for (int32_t i = 0; i < nx; ++i) {
@@ -127,7 +141,7 @@ Status CorrelateFrequency(const double* x, int32_t nx, const double* y, int32_t 
 Status AutoCorrelateFrequency(const double* x, int32_t n, double* z) {
     const int32_t len = ConvolutionFftLength(2 * n - 1);
     if (len == 0) return OutOfMemoryErr;
-    OwnTable table(len);
+    CallTable table(len);
     if (table.get() == nullptr) return OutOfMemoryErr;
     Scratch<double> work;
     if (const Status s = work.Allocate(2 * Size(len))) return s;
@@ -158,7 +172,7 @@ Status CxConvolveFrequency(const cdouble* x, int32_t nx, const cdouble* y, int32
     const int32_t m = nx + ny - 1;
     const int32_t n = ConvolutionFftLength(m);
     if (n == 0) return OutOfMemoryErr;
-    OwnTable table(n);
+    CallTable table(n);
     if (table.get() == nullptr) return OutOfMemoryErr;
     Scratch<cdouble> work;
     if (const Status s = work.Allocate(3 * Size(n))) return s;

@@ -7,8 +7,24 @@
 #include <cstdint>
 
 #include "frame/memory.hpp"
+#include "transform/fft/fft.hpp"
 
 namespace tw {
+
+// The table of length n for one call, from the shared list. The last two lengths a thread used
+// (up to 2^20 points) stay referenced until the thread ends, so that repeated calls of one size
+// do not rebuild their twiddles each time.
+class CallTable {
+public:
+    explicit CallTable(int32_t n);
+    CallTable(const CallTable&) = delete;
+    CallTable& operator=(const CallTable&) = delete;
+    ~CallTable() { DestroyFftTable(t_); }
+    FftTable* get() const { return t_; }
+
+private:
+    FftTable* t_;
+};
 
 // z = x * y directly: z zeroed, then z[i + j] += x[i] * y[j] with i outer and j inner. The loop
 // order fixes the rounding, which callers (section merging, narrowband filters) rely on.

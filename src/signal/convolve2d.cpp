@@ -41,19 +41,6 @@ void KernelSums(const T* b, int32_t rb, int32_t cb, const T* k, int32_t rk, int3
     }
 }
 
-// Deletes the two tables of a call.
-struct TablePair {
-    FftTable* rows = nullptr;
-    FftTable* cols = nullptr;
-    TablePair() = default;
-    TablePair(const TablePair&) = delete;
-    TablePair& operator=(const TablePair&) = delete;
-    ~TablePair() {
-        DestroyFftTable(rows);
-        DestroyFftTable(cols);
-    }
-};
-
 }  // namespace
 
 template <class T>
@@ -69,11 +56,10 @@ Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32
     const int32_t rows = r1 + r2 - 1, cols = c1 + c2 - 1;
     const size_t n = static_cast<size_t>(rows) * static_cast<size_t>(cols);
     // The row transforms run on length cols, the columns on length rows: one table when equal.
-    TablePair t;
-    t.cols = CreateFftTable(cols);
-    t.rows = rows == cols ? nullptr : CreateFftTable(rows);
-    const FftTable* rowTable = t.cols;
-    const FftTable* colTable = rows == cols ? t.cols : t.rows;
+    CallTable rowCall(cols);
+    CallTable colCall(rows == cols ? 0 : rows);
+    const FftTable* rowTable = rowCall.get();
+    const FftTable* colTable = rows == cols ? rowTable : colCall.get();
     if (rowTable == nullptr || colTable == nullptr) return OutOfMemoryErr;
     Scratch<cdouble> work;
     if (const Status s = work.Allocate(2 * n)) return s;

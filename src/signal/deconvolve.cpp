@@ -49,7 +49,8 @@ int32_t PowerOfTwoAtLeast(int32_t n) {
 Status Deconvolve(const double* x, int32_t nx, const double* y, int32_t ny, double* q) {
     const int32_t n = PowerOfTwoAtLeast(nx);
     const int32_t h = n / 2;
-    FftTable* table = CreateFftTable(n);
+    CallTable call(n);
+    FftTable* table = call.get();
     if (table == nullptr) return OutOfMemoryErr;
     Scratch<double> work;
     Status s = work.Allocate(3 * static_cast<size_t>(n));
@@ -89,7 +90,6 @@ Status Deconvolve(const double* x, int32_t nx, const double* y, int32_t ny, doub
         }
         if (s == 0) std::copy(a, a + (nx - ny + 1), q);
     }
-    DestroyFftTable(table);
     return MergeRelease(s, work.Release());
 }
 
