@@ -16,12 +16,18 @@ const double* Lanes(const cdouble* p) { return reinterpret_cast<const double*>(p
 
 size_t Idx(int32_t r, int32_t c, int32_t ld) { return static_cast<size_t>(r) * static_cast<size_t>(ld) + static_cast<size_t>(c); }
 
-// Complex transforms of the first `ncols` columns of src (leading dimension ld, rows x ld), into
-// dst: column element i is read from row (i + readOffset) mod rows if i < present (else zero) and
-// written to row (i + writeOffset) mod rows. src and dst may be the same matrix.
+// The placement of a column pass: column element i is read from row (i + readOffset) mod rows of
+// src if i < present (else zero); column c is written to row (i + writeOffset) mod rows, column
+// (c + colOffset) mod ldOut of dst.
+struct ColumnPlan {
+    int32_t ldIn, ldOut;
+    int32_t present, readOffset, writeOffset, colOffset;
+};
+
+// Complex transforms of the first `ncols` columns of src into dst; src and dst may be the same
+// matrix when nothing moves between columns.
 template <bool Inverse>
-Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t rows, int32_t ncols, int32_t ld,
-                  int32_t present, int32_t readOffset, int32_t writeOffset) {
+Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t rows, int32_t ncols, const ColumnPlan& p) {
     Scratch<cdouble> work;
     if (const Status s = work.Allocate(2 * static_cast<size_t>(kBatch) * static_cast<size_t>(rows))) return s;
     cdouble* in = work.get();
@@ -29,8 +35,8 @@ Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t r
     for (int32_t c0 = 0; c0 < ncols; c0 += kBatch) {
         const int32_t nb = std::min(kBatch, ncols - c0);
         for (int32_t i = 0; i < rows; ++i) {
-            const int32_t r = (i + readOffset) % rows;
-            for (int32_t b = 0; b < nb; ++b) in[Idx(b, i, rows)] = i < present ? src[Idx(r, c0 + b, ld)] : cdouble{};
+            const int32_t r = (i + p.readOffset) % rows;
+            for (int32_t b = 0; b < nb; ++b) in[Idx(b, i, rows)] = i < p.present ? src[Idx(r, c0 + b, p.ldIn)] : cdouble{};
         }
         for (int32_t b = 0; b < nb; ++b) {
             double* bi = Lanes(in + Idx(b, 0, rows));
@@ -40,8 +46,8 @@ Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t r
             if (s != 0) return MergeRelease(s, work.Release());
         }
         for (int32_t i = 0; i < rows; ++i) {
-            const int32_t r = (i + writeOffset) % rows;
-            for (int32_t b = 0; b < nb; ++b) dst[Idx(r, c0 + b, ld)] = out[Idx(b, i, rows)];
+            cdouble* row = dst + Idx((i + p.writeOffset) % rows, 0, p.ldOut);
+            for (int32_t b = 0; b < nb; ++b) row[(c0 + b + p.colOffset) % p.ldOut] = out[Idx(b, i, rows)];
         }
     }
     return work.Release();
@@ -85,32 +91,25 @@ Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, cons
             std::copy(unpacked.get(), unpacked.get() + half, spectrum.get() + Idx(r, 0, half));
         }
     }
-    if (s == 0) s = ColumnPass<false>(colTable, spectrum.get(), spectrum.get(), rows, half, half, present, 0, 0);
+    const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
+    if (s == 0) s = ColumnPass<false>(colTable, spectrum.get(), y, rows, half, {half, cols, present, 0, ro, co});
     if (s == 0) {
-        // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c], built a row at a time in the
-        // unpacked buffer. The columns of the DC and (even cols) Nyquist row frequencies pair
-        // with themselves: their lower half is mirrored too, and their self-paired entries are
-        // real, so the result is exactly Hermitian.
-        const cdouble* hs = spectrum.get();
-        cdouble* line = unpacked.get();
-        const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
+        // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c], in place in y (in centred
+        // order when shifted). Columns above cols/2 mirror transformed ones. The DC and (even
+        // cols) Nyquist columns pair with themselves: their lower half is mirrored too, and their
+        // self-paired entries are made real, so the result is exactly Hermitian.
+        const auto col = [&](int32_t c) { return c + co < cols ? c + co : c + co - cols; };
         const int32_t nyquist = cols % 2 == 0 ? cols / 2 : -1;
         for (int32_t r = 0; r < rows; ++r) {
             const int32_t mr = r == 0 ? 0 : rows - r;
-            const cdouble* own = hs + Idx(r, 0, half);
-            const cdouble* mirror = hs + Idx(mr, 0, half);
-            std::copy(own, own + half, line);
-            for (int32_t c = half; c < cols; ++c) line[c] = std::conj(mirror[cols - c]);
-            for (const int32_t c : {0, nyquist}) {
-                if (c < 0) continue;
-                if (r == mr)
-                    line[c] = {own[c].real(), 0.0};
-                else if (r > mr)
-                    line[c] = std::conj(mirror[c]);
-            }
             cdouble* out = y + Idx((r + ro) % rows, 0, cols);
-            std::copy(line, line + (cols - co), out + co);
-            std::copy(line + (cols - co), line + cols, out);
+            const cdouble* mirror = y + Idx((mr + ro) % rows, 0, cols);
+            for (int32_t c = half; c < cols; ++c) out[col(c)] = std::conj(mirror[col(cols - c)]);
+            for (const int32_t c : {0, nyquist}) {
+                if (c < 0 || r < mr) continue;
+                const cdouble v = mirror[col(c)];
+                out[col(c)] = r == mr ? cdouble{v.real(), 0.0} : std::conj(v);
+            }
         }
     }
     s = MergeRelease(s, unpacked.Release());
@@ -130,7 +129,7 @@ Status Fft2DComplexForward(const FftTable* rowTable, const FftTable* colTable, c
         s = FftComplexForward(rowTable, Lanes(row), Lanes(row) + 1, Lanes(out), Lanes(out) + 1, 2, 2, cols);
         if (s == 0 && shift != 0) std::rotate(out, out + (cols - cols / 2), out + cols);
     }
-    if (s == 0) s = ColumnPass<false>(colTable, y, y, rows, cols, cols, present, 0, shift != 0 ? rows / 2 : 0);
+    if (s == 0) s = ColumnPass<false>(colTable, y, y, rows, cols, {cols, cols, present, 0, shift != 0 ? rows / 2 : 0, 0});
     return MergeRelease(s, pad.Release());
 }
 
@@ -160,7 +159,7 @@ Status Fft2DComplexInverse(const FftTable* rowTable, const FftTable* colTable, c
     Scratch<cdouble> S;
     Status s = S.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(cols));
     if (s == 0) s = InverseRows(rowTable, x, rows, cols, shift, S.get());
-    if (s == 0) s = ColumnPass<true>(colTable, S.get(), y, rows, cols, cols, rows, shift != 0 ? rows / 2 : 0, 0);
+    if (s == 0) s = ColumnPass<true>(colTable, S.get(), y, rows, cols, {cols, cols, rows, shift != 0 ? rows / 2 : 0, 0, 0});
     return MergeRelease(s, S.Release());
 }
 
