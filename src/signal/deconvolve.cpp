@@ -28,7 +28,8 @@ void ImpulseResponse(const double* b, int32_t nb, const double* a, int32_t na, d
 // Long division after skipping the divisor's s leading zeros; the quotient starts at index s.
 Status LongDivision(const double* x, int32_t nx, const double* y, int32_t ny, double* q) {
     int32_t s = 0;
-    while (y[s] == 0.0) ++s;
+    while (s < ny && y[s] == 0.0) ++s;
+    if (s == ny) return DivisorLeadingZeroErr;
     const int32_t d = ny - s;
     const int32_t len = nx - d + 1;
     Scratch<double> out;
