@@ -27,7 +27,8 @@ bool SameBlock(Handle a, Handle b) { return a == b || (a != nullptr && b != null
 
 // Real convolution (correlate false) or correlation. Any algorithm other than 0 and 1 computes
 // nothing and succeeds, with z as the resize left it and the normalization unread.
-Status RealConvolution(Handle x, Handle y, Handle& z, int32_t algorithm, bool correlate, int32_t normalization) {
+Status RealConvolution(Handle x, Handle y, Handle& z, int32_t algorithm, bool correlate,
+                       int32_t normalization) {
     Frame f;
     f.Output<double>(z);
     const int32_t nx = tw::Count(x), ny = tw::Count(y);
@@ -47,7 +48,8 @@ Status RealConvolution(Handle x, Handle y, Handle& z, int32_t algorithm, bool co
         else if (!correlate)
             s = tw::ConvolveFrequency(xs, nx, ys, ny, out);
         else
-            s = autoCorrelation ? tw::AutoCorrelateFrequency(xs, nx, out) : tw::CorrelateFrequency(xs, nx, ys, ny, out);
+            s = autoCorrelation ? tw::AutoCorrelateFrequency(xs, nx, out)
+                                : tw::CorrelateFrequency(xs, nx, ys, ny, out);
     }
     if (s == 0 && correlate) s = tw::NormalizeCorrelation(out, nx, ny, normalization);
     return f.Finish(s);
@@ -76,8 +78,8 @@ Status ComplexConvolution(Handle x, Handle y, Handle& z, int32_t algorithm, int3
     Frame f;
     f.Output<cdouble>(z);
     const int32_t nx = tw::Count(x), ny = tw::Count(y);
-    Status s = nx < 1 || ny < 1                        ? EmptyArrayErr
-               : (algorithm != 0 && algorithm != 1)     ? InvalidSelectorErr
+    Status s = nx < 1 || ny < 1                           ? EmptyArrayErr
+               : (algorithm != 0 && algorithm != 1)       ? InvalidSelectorErr
                : (normalization < 0 || normalization > 2) ? InvalidSelectorErr
                                                           : 0;
     cdouble* out = nullptr;
@@ -88,7 +90,8 @@ Status ComplexConvolution(Handle x, Handle y, Handle& z, int32_t algorithm, int3
     tw::Scratch<cdouble> reversed;
     if (s == 0 && correlate != 0) {
         s = reversed.Allocate(static_cast<size_t>(nx));
-        for (int32_t i = 0; s == 0 && i < nx; ++i) reversed[static_cast<size_t>(i)] = std::conj(xs[nx - 1 - i]);
+        for (int32_t i = 0; s == 0 && i < nx; ++i)
+            reversed[static_cast<size_t>(i)] = std::conj(xs[nx - 1 - i]);
         xs = reversed.get();
     }
     if (s == 0) {
@@ -133,12 +136,12 @@ Status TwoD(Handle x, Handle y, Handle& z, int32_t sizeMode, int32_t algorithm, 
     f.Output2D<T>(z);
     const tw::Shape a = tw::Dims(x), b = tw::Dims(y);
     const bool yLarger = b.rows > a.rows || b.cols > a.cols;
-    Status s = tw::Elements(a) < 1 || tw::Elements(b) < 1              ? EmptyArrayErr
-               : sizeMode < 0 || sizeMode > 2                        ? InvalidSelectorErr
-               : algorithm != 0 && algorithm != 1                    ? InvalidSelectorErr
-               : sizeMode == 2 && yLarger                            ? SizeMismatchErr
+    Status s = tw::Elements(a) < 1 || tw::Elements(b) < 1                          ? EmptyArrayErr
+               : sizeMode < 0 || sizeMode > 2                                      ? InvalidSelectorErr
+               : algorithm != 0 && algorithm != 1                                  ? InvalidSelectorErr
+               : sizeMode == 2 && yLarger                                          ? SizeMismatchErr
                : kComplex && sizeMode == 2 && (a.rows < a.cols || b.rows < b.cols) ? SizeMismatchErr
-                                                                       : 0;
+                                                                                   : 0;
     const int32_t fullRows = a.rows + b.rows - 1, fullCols = a.cols + b.cols - 1;
     tw::Shape out = {fullRows, fullCols}, origin = {0, 0};
     if (sizeMode == 1) out = a, origin = {b.rows / 2, b.cols / 2};
@@ -173,7 +176,8 @@ Status TwoD(Handle x, Handle y, Handle& z, int32_t sizeMode, int32_t algorithm, 
     }
     if (s == 0 && sizeMode != 0) {
         for (int32_t r = 0; r < out.rows; ++r) {
-            const T* from = target + static_cast<size_t>(origin.rows + r) * static_cast<size_t>(fullCols) + origin.cols;
+            const T* from =
+                target + static_cast<size_t>(origin.rows + r) * static_cast<size_t>(fullCols) + origin.cols;
             std::copy(from, from + out.cols, zs + static_cast<size_t>(r) * static_cast<size_t>(out.cols));
         }
     }
@@ -183,14 +187,15 @@ Status TwoD(Handle x, Handle y, Handle& z, int32_t sizeMode, int32_t algorithm, 
 
 }  // namespace
 
-TW_API int32_t Convolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t* status) {
+TW_API int32_t Convolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm,
+                           int32_t* status) {
     return tw::ToPointer(status, RealConvolution(x, y, z, algorithm != nullptr ? *algorithm : 0, false, 0));
 }
 
-TW_API int32_t Rxy80(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t normalization,
-                     int32_t* status) {
-    return tw::ToPointer(status,
-                         RealConvolution(x, y, z, algorithm != nullptr ? *algorithm : 0, true, normalization));
+TW_API int32_t Rxy80(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm,
+                     int32_t normalization, int32_t* status) {
+    return tw::ToPointer(
+        status, RealConvolution(x, y, z, algorithm != nullptr ? *algorithm : 0, true, normalization));
 }
 
 TW_API int32_t Rxy(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t* status) {
@@ -203,8 +208,8 @@ TW_API int32_t AutoCorrelation80(Array1DHandle x, int32_t normalization, int32_t
 
 TW_API int32_t AutoCorrelation(Array1DHandle x, int32_t* status) { return AutoCorrelation80(x, 0, status); }
 
-TW_API int32_t CxConvolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t algorithm, int32_t correlate,
-                             int32_t normalization) {
+TW_API int32_t CxConvolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t algorithm,
+                             int32_t correlate, int32_t normalization) {
     return ComplexConvolution(x, y, z, algorithm, correlate, normalization);
 }
 
@@ -214,7 +219,8 @@ TW_API int32_t Deconvolution(Array1DHandle x, Array1DHandle y, int32_t* status) 
     return s;
 }
 
-TW_API int32_t Convolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode, int32_t algorithm) {
+TW_API int32_t Convolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode,
+                            int32_t algorithm) {
     return TwoD<double>(x, y, z, sizeMode, algorithm, false);
 }
 

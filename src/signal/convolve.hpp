@@ -73,5 +73,4 @@ void Convolve2DDirect(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2
 template <class T>
 Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2, int32_t c2, T* z);
 
-
 }  // namespace tw

@@ -87,11 +87,13 @@ Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32
     return MergeRelease(s, work.Release());
 }
 
-template void Convolve2DDirect<double>(const double*, int32_t, int32_t, const double*, int32_t, int32_t, double*);
-template void Convolve2DDirect<cdouble>(const cdouble*, int32_t, int32_t, const cdouble*, int32_t, int32_t, cdouble*);
+template void Convolve2DDirect<double>(const double*, int32_t, int32_t, const double*, int32_t, int32_t,
+                                       double*);
+template void Convolve2DDirect<cdouble>(const cdouble*, int32_t, int32_t, const cdouble*, int32_t, int32_t,
+                                        cdouble*);
 template Status Convolve2DFrequency<double>(const double*, int32_t, int32_t, const double*, int32_t, int32_t,
                                             double*);
-template Status Convolve2DFrequency<cdouble>(const cdouble*, int32_t, int32_t, const cdouble*, int32_t, int32_t,
-                                             cdouble*);
+template Status Convolve2DFrequency<cdouble>(const cdouble*, int32_t, int32_t, const cdouble*, int32_t,
+                                             int32_t, cdouble*);
 
 }  // namespace tw

@@ -14,7 +14,9 @@ constexpr int32_t kBatch = 8;
 double* Lanes(cdouble* p) { return reinterpret_cast<double*>(p); }
 const double* Lanes(const cdouble* p) { return reinterpret_cast<const double*>(p); }
 
-size_t Idx(int32_t r, int32_t c, int32_t ld) { return static_cast<size_t>(r) * static_cast<size_t>(ld) + static_cast<size_t>(c); }
+size_t Idx(int32_t r, int32_t c, int32_t ld) {
+    return static_cast<size_t>(r) * static_cast<size_t>(ld) + static_cast<size_t>(c);
+}
 
 // The placement of a column pass: column element i is read from row (i + readOffset) mod rows of
 // src if i < present (else zero); column c is written to row (i + writeOffset) mod rows, column
@@ -27,7 +29,8 @@ struct ColumnPlan {
 // Complex transforms of the first `ncols` columns of src into dst; src and dst may be the same
 // matrix when nothing moves between columns.
 template <bool Inverse>
-Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t rows, int32_t ncols, const ColumnPlan& p) {
+Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t rows, int32_t ncols,
+                  const ColumnPlan& p) {
     Scratch<cdouble> work;
     if (const Status s = work.Allocate(2 * static_cast<size_t>(kBatch) * static_cast<size_t>(rows))) return s;
     cdouble* in = work.get();
@@ -36,7 +39,8 @@ Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t r
         const int32_t nb = std::min(kBatch, ncols - c0);
         for (int32_t i = 0; i < rows; ++i) {
             const int32_t r = (i + p.readOffset) % rows;
-            for (int32_t b = 0; b < nb; ++b) in[Idx(b, i, rows)] = i < p.present ? src[Idx(r, c0 + b, p.ldIn)] : cdouble{};
+            for (int32_t b = 0; b < nb; ++b)
+                in[Idx(b, i, rows)] = i < p.present ? src[Idx(r, c0 + b, p.ldIn)] : cdouble{};
         }
         for (int32_t b = 0; b < nb; ++b) {
             double* bi = Lanes(in + Idx(b, 0, rows));
@@ -72,8 +76,8 @@ const T* WindowRow(const T* x, const Fft2DWindow& w, int32_t r, T* pad) {
 
 }  // namespace
 
-Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x, const Fft2DWindow& w,
-                        int32_t shift, cdouble* y) {
+Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x,
+                        const Fft2DWindow& w, int32_t shift, cdouble* y) {
     if (BadStart(w)) return IndexRangeErr;
     const int32_t rows = w.rows, cols = w.cols, half = cols / 2 + 1, present = PresentRows(w);
     // Only the non-negative row frequencies 0 .. cols/2 are transformed down the columns.
@@ -92,7 +96,8 @@ Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, cons
         }
     }
     const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
-    if (s == 0) s = ColumnPass<false>(colTable, spectrum.get(), y, rows, half, {half, cols, present, 0, ro, co});
+    if (s == 0)
+        s = ColumnPass<false>(colTable, spectrum.get(), y, rows, half, {half, cols, present, 0, ro, co});
     if (s == 0) {
         // The rest by conjugate symmetry, Y[r][c] = conj Y[-r][-c], in place in y (in centred
         // order when shifted). Columns above cols/2 mirror transformed ones. The DC and (even
@@ -129,7 +134,9 @@ Status Fft2DComplexForward(const FftTable* rowTable, const FftTable* colTable, c
         s = FftComplexForward(rowTable, Lanes(row), Lanes(row) + 1, Lanes(out), Lanes(out) + 1, 2, 2, cols);
         if (s == 0 && shift != 0) std::rotate(out, out + (cols - cols / 2), out + cols);
     }
-    if (s == 0) s = ColumnPass<false>(colTable, y, y, rows, cols, {cols, cols, present, 0, shift != 0 ? rows / 2 : 0, 0});
+    if (s == 0)
+        s = ColumnPass<false>(colTable, y, y, rows, cols,
+                              {cols, cols, present, 0, shift != 0 ? rows / 2 : 0, 0});
     return MergeRelease(s, pad.Release());
 }
 
@@ -159,7 +166,9 @@ Status Fft2DComplexInverse(const FftTable* rowTable, const FftTable* colTable, c
     Scratch<cdouble> S;
     Status s = S.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(cols));
     if (s == 0) s = InverseRows(rowTable, x, rows, cols, shift, S.get());
-    if (s == 0) s = ColumnPass<true>(colTable, S.get(), y, rows, cols, {cols, cols, rows, shift != 0 ? rows / 2 : 0, 0, 0});
+    if (s == 0)
+        s = ColumnPass<true>(colTable, S.get(), y, rows, cols,
+                             {cols, cols, rows, shift != 0 ? rows / 2 : 0, 0, 0});
     return MergeRelease(s, S.Release());
 }
 

@@ -20,8 +20,8 @@ struct Fft2DWindow {
 };
 
 // y (rows x cols) is the spectrum of the real window; exactly conjugate-symmetric.
-Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x, const Fft2DWindow& w,
-                        int32_t shift, std::complex<double>* y);
+Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x,
+                        const Fft2DWindow& w, int32_t shift, std::complex<double>* y);
 Status Fft2DComplexForward(const FftTable* rowTable, const FftTable* colTable, const std::complex<double>* x,
                            const Fft2DWindow& w, int32_t shift, std::complex<double>* y);
 

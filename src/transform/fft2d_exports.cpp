@@ -15,15 +15,15 @@ using tw::Status;
 // The row table (length cols) sits in the first cell or slot 0, the column table (length rows) in
 // the second cell or slot 1.
 template <class T, bool InstanceData>
-Status Forward(Handle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols, int32_t shift, Handle& y,
-               void** cell0, void** cell1) {
+Status Forward(Handle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols, int32_t shift,
+               Handle& y, void** cell0, void** cell1) {
     Frame f(tw::FailOn::NonZero);
     f.Output2D<cdouble>(y);
     const tw::Shape d = tw::Dims(x);
-    Status s = d.rows < 1 || d.cols < 1                          ? EmptyArrayErr
-               : rowStart >= d.rows || colStart >= d.cols         ? IndexRangeErr
-               : rows < 1 || cols < 1                             ? SizeMismatchErr
-                                                                  : 0;
+    Status s = d.rows < 1 || d.cols < 1                   ? EmptyArrayErr
+               : rowStart >= d.rows || colStart >= d.cols ? IndexRangeErr
+               : rows < 1 || cols < 1                     ? SizeMismatchErr
+                                                          : 0;
     tw::CachedTables tables(cell0, InstanceData ? cell0 : cell1, InstanceData);
     tw::FftTable *rowTable = nullptr, *colTable = nullptr;
     if (s == 0) s = tables.Acquire(0, cols, &rowTable);

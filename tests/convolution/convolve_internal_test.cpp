@@ -53,7 +53,8 @@ TEST(ConvolutionCores, CorrelationsReverseTheFirstOperand) {
 }
 
 TEST(ConvolutionCores, TransformLengthSkipsTwentyThree) {
-    const int cases[][2] = {{1, 1}, {22, 22}, {23, 24}, {46, 48}, {47, 48}, {529, 532}, {1024, 1024}, {1025, 1025}, {1058, 1064}};
+    const int cases[][2] = {{1, 1},     {22, 22},     {23, 24},     {46, 48},    {47, 48},
+                            {529, 532}, {1024, 1024}, {1025, 1025}, {1058, 1064}};
     for (const auto& c : cases) EXPECT_EQ(tw::ConvolutionFftLength(c[0]), c[1]) << c[0];
 }
 

@@ -76,17 +76,15 @@ TEST(Fft2DFrames, StatusesInTheirOrderEmptyY) {
         int32_t rowStart, colStart, rows, cols, status;
     };
     const Row rows[] = {
-        {&none, 9, 9, 0, 0, -20003},  // empty first
-        {&x, 4, 0, 0, 2, -20017},     // start past the end before the size
-        {&x, 0, 3, 2, 2, -20017},
-        {&x, -1, 0, 2, 2, -20017},    // negative starts are refused by the core
-        {&x, 0, -2, 2, 2, -20017},
-        {&x, 3, 2, 0, 2, -20008},
-        {&x, 3, 2, 2, -1, -20008},
+        {&none, 9, 9, 0, 0, -20003},                             // empty first
+        {&x, 4, 0, 0, 2, -20017},                                // start past the end before the size
+        {&x, 0, 3, 2, 2, -20017},    {&x, -1, 0, 2, 2, -20017},  // negative starts are refused by the core
+        {&x, 0, -2, 2, 2, -20017},   {&x, 3, 2, 0, 2, -20008},  {&x, 3, 2, 2, -1, -20008},
     };
     for (const Row& r : rows) {
         twrt::Array2D<cd> y(2, 2, std::vector<cd>(4, cd(1, 1)));
-        EXPECT_EQ(ReFFT2D_H(r.x->h(), r.rowStart, r.colStart, r.rows, r.cols, 0, y.h(), nullptr, nullptr), r.status);
+        EXPECT_EQ(ReFFT2D_H(r.x->h(), r.rowStart, r.colStart, r.rows, r.cols, 0, y.h(), nullptr, nullptr),
+                  r.status);
         EXPECT_EQ(y.rows(), 0);
         EXPECT_EQ(y.cols(), 0);
     }
