@@ -54,24 +54,25 @@ void Convolve2DDirect(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2
 template <class T>
 Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32_t r2, int32_t c2, T* z) {
     const int32_t rows = r1 + r2 - 1, cols = c1 + c2 - 1;
-    const size_t n = static_cast<size_t>(rows) * static_cast<size_t>(cols);
     // The row transforms run on length cols, the columns on length rows: one table when equal.
     CallTable rowCall(cols);
     CallTable colCall(rows == cols ? 0 : rows);
     const FftTable* rowTable = rowCall.get();
     const FftTable* colTable = rows == cols ? rowTable : colCall.get();
     if (rowTable == nullptr || colTable == nullptr) return OutOfMemoryErr;
+    // Real data keep only the row frequencies 0 .. cols/2 of their spectra (the rest is their
+    // conjugate mirror) and come back through the real inverse of that half: the real part of
+    // the full complex inverse, for half the work.
+    constexpr bool kReal = std::is_same_v<T, double>;
+    const size_t n = static_cast<size_t>(rows) * static_cast<size_t>(kReal ? cols / 2 + 1 : cols);
     Scratch<cdouble> work;
     if (const Status s = work.Allocate(2 * n)) return s;
     cdouble* fx = work.get();
     cdouble* fy = fx + n;
-    // Real data take the real forward transform (half the column work, an exactly Hermitian
-    // spectrum, so the product is Hermitian too) and the real inverse, whose output is the real
-    // part of the complex inverse.
     const auto spectrum = [&](const T* v, int32_t rv, int32_t cv, cdouble* out) {
         const Fft2DWindow w{rv, cv, 0, 0, rows, cols};
-        if constexpr (std::is_same_v<T, double>)
-            return Fft2DRealForward(rowTable, colTable, v, w, 0, out);
+        if constexpr (kReal)
+            return Fft2DRealForwardHalf(rowTable, colTable, v, w, out);
         else
             return Fft2DComplexForward(rowTable, colTable, v, w, 0, out);
     };
@@ -79,8 +80,8 @@ Status Convolve2DFrequency(const T* x, int32_t r1, int32_t c1, const T* y, int32
     if (s == 0) s = spectrum(y, r2, c2, fy);
     if (s == 0) {
         for (size_t i = 0; i < n; ++i) fx[i] = Mul(fx[i], fy[i]);
-        if constexpr (std::is_same_v<T, double>)
-            s = Fft2DRealInverse(rowTable, colTable, fx, rows, cols, 0, z);
+        if constexpr (kReal)
+            s = Fft2DRealInverseHalf(rowTable, colTable, fx, rows, cols, z);
         else
             s = Fft2DComplexInverse(rowTable, colTable, fx, rows, cols, 0, z);
     }

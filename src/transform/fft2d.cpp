@@ -76,25 +76,66 @@ const T* WindowRow(const T* x, const Fft2DWindow& w, int32_t r, T* pad) {
 
 }  // namespace
 
+namespace {
+
+// The real transforms of the window's present rows, cut to their frequencies 0 .. cols/2: the
+// rows of `half` (leading dimension cols/2 + 1).
+Status RealRows(const FftTable* rowTable, const double* x, const Fft2DWindow& w, cdouble* half) {
+    const int32_t cols = w.cols, width = cols / 2 + 1;
+    Scratch<double> rowWork;
+    Scratch<cdouble> unpacked;
+    Status s = rowWork.Allocate(2 * static_cast<size_t>(cols));
+    if (s == 0) s = unpacked.Allocate(static_cast<size_t>(cols));
+    for (int32_t r = 0; s == 0 && r < PresentRows(w); ++r) {
+        const double* row = WindowRow(x, w, r, rowWork.get() + cols);
+        s = FftRealForward(rowTable, row, rowWork.get(), 1, 1, cols);
+        if (s == 0) {
+            FftUnpackHalfComplex(rowWork.get(), cols, 0, unpacked.get());
+            std::copy(unpacked.get(), unpacked.get() + width, half + Idx(r, 0, width));
+        }
+    }
+    s = MergeRelease(s, unpacked.Release());
+    return MergeRelease(s, rowWork.Release());
+}
+
+}  // namespace
+
+Status Fft2DRealForwardHalf(const FftTable* rowTable, const FftTable* colTable, const double* x,
+                            const Fft2DWindow& w, cdouble* half) {
+    if (BadStart(w)) return IndexRangeErr;
+    const int32_t width = w.cols / 2 + 1;
+    Status s = RealRows(rowTable, x, w, half);
+    if (s == 0)
+        s = ColumnPass<false>(colTable, half, half, w.rows, width, {width, width, PresentRows(w), 0, 0, 0});
+    return s;
+}
+
+Status Fft2DRealInverseHalf(const FftTable* rowTable, const FftTable* colTable, const cdouble* half,
+                            int32_t rows, int32_t cols, double* y) {
+    const int32_t width = cols / 2 + 1;
+    Scratch<cdouble> columns;
+    Scratch<double> packed;
+    Status s = columns.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(width));
+    if (s == 0) s = packed.Allocate(static_cast<size_t>(cols));
+    if (s == 0)
+        s = ColumnPass<true>(colTable, half, columns.get(), rows, width, {width, width, rows, 0, 0, 0});
+    // Each row is Hermitian now: its frequencies 0 .. cols/2 make the packing of a real inverse.
+    for (int32_t r = 0; s == 0 && r < rows; ++r) {
+        FftPackHalfComplex(columns.get() + Idx(r, 0, width), cols, 0, packed.get());
+        s = FftRealInverse(rowTable, packed.get(), y + Idx(r, 0, cols), 1, 1, cols);
+    }
+    s = MergeRelease(s, packed.Release());
+    return MergeRelease(s, columns.Release());
+}
+
 Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, const double* x,
                         const Fft2DWindow& w, int32_t shift, cdouble* y) {
     if (BadStart(w)) return IndexRangeErr;
     const int32_t rows = w.rows, cols = w.cols, half = cols / 2 + 1, present = PresentRows(w);
     // Only the non-negative row frequencies 0 .. cols/2 are transformed down the columns.
     Scratch<cdouble> spectrum;
-    Scratch<double> rowWork;
     Status s = spectrum.Allocate(static_cast<size_t>(rows) * static_cast<size_t>(half));
-    if (s == 0) s = rowWork.Allocate(2 * static_cast<size_t>(cols));
-    Scratch<cdouble> unpacked;
-    if (s == 0) s = unpacked.Allocate(static_cast<size_t>(cols));
-    for (int32_t r = 0; s == 0 && r < present; ++r) {
-        const double* row = WindowRow(x, w, r, rowWork.get() + cols);
-        s = FftRealForward(rowTable, row, rowWork.get(), 1, 1, cols);
-        if (s == 0) {
-            FftUnpackHalfComplex(rowWork.get(), cols, 0, unpacked.get());
-            std::copy(unpacked.get(), unpacked.get() + half, spectrum.get() + Idx(r, 0, half));
-        }
-    }
+    if (s == 0) s = RealRows(rowTable, x, w, spectrum.get());
     const int32_t ro = shift != 0 ? rows / 2 : 0, co = shift != 0 ? cols / 2 : 0;
     if (s == 0)
         s = ColumnPass<false>(colTable, spectrum.get(), y, rows, half, {half, cols, present, 0, ro, co});
@@ -117,8 +158,6 @@ Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, cons
             }
         }
     }
-    s = MergeRelease(s, unpacked.Release());
-    s = MergeRelease(s, rowWork.Release());
     return MergeRelease(s, spectrum.Release());
 }
 

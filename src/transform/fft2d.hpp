@@ -33,4 +33,12 @@ Status Fft2DComplexInverse(const FftTable* rowTable, const FftTable* colTable, c
 Status Fft2DRealInverse(const FftTable* rowTable, const FftTable* colTable, const std::complex<double>* x,
                         int32_t rows, int32_t cols, int32_t shift, double* y);
 
+// The half spectrum of a real window, unshifted: frequencies 0 .. cols/2 along the rows, all
+// rows, as rows x (cols/2 + 1); and the real rows x cols inverse of such a half spectrum (columns
+// first, then the rows' real inverses). The convolutions of real data work on these.
+Status Fft2DRealForwardHalf(const FftTable* rowTable, const FftTable* colTable, const double* x,
+                            const Fft2DWindow& w, std::complex<double>* half);
+Status Fft2DRealInverseHalf(const FftTable* rowTable, const FftTable* colTable,
+                            const std::complex<double>* half, int32_t rows, int32_t cols, double* y);
+
 }  // namespace tw
