@@ -37,11 +37,12 @@ Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t r
     cdouble* out = in + static_cast<size_t>(kBatch) * static_cast<size_t>(rows);
     for (int32_t c0 = 0; c0 < ncols; c0 += kBatch) {
         const int32_t nb = std::min(kBatch, ncols - c0);
-        for (int32_t i = 0; i < rows; ++i) {
-            const int32_t r = (i + p.readOffset) % rows;
-            for (int32_t b = 0; b < nb; ++b)
-                in[Idx(b, i, rows)] = i < p.present ? src[Idx(r, c0 + b, p.ldIn)] : cdouble{};
+        for (int32_t i = 0; i < p.present; ++i) {
+            const cdouble* from = src + Idx((i + p.readOffset) % rows, c0, p.ldIn);
+            for (int32_t b = 0; b < nb; ++b) in[Idx(b, i, rows)] = from[b];
         }
+        for (int32_t b = 0; b < nb; ++b)
+            std::fill(in + Idx(b, p.present, rows), in + Idx(b, rows, rows), cdouble{});
         for (int32_t b = 0; b < nb; ++b) {
             double* bi = Lanes(in + Idx(b, 0, rows));
             double* bo = Lanes(out + Idx(b, 0, rows));
@@ -49,9 +50,12 @@ Status ColumnPass(const FftTable* t, const cdouble* src, cdouble* dst, int32_t r
                                      : FftComplexForward(t, bi, bi + 1, bo, bo + 1, 2, 2, rows);
             if (s != 0) return MergeRelease(s, work.Release());
         }
+        const int32_t d0 = (c0 + p.colOffset) % p.ldOut;
+        const int32_t run = std::min(nb, p.ldOut - d0);  // the rest wraps to column 0
         for (int32_t i = 0; i < rows; ++i) {
             cdouble* row = dst + Idx((i + p.writeOffset) % rows, 0, p.ldOut);
-            for (int32_t b = 0; b < nb; ++b) row[(c0 + b + p.colOffset) % p.ldOut] = out[Idx(b, i, rows)];
+            for (int32_t b = 0; b < run; ++b) row[d0 + b] = out[Idx(b, i, rows)];
+            for (int32_t b = run; b < nb; ++b) row[b - run] = out[Idx(b, i, rows)];
         }
     }
     return work.Release();
