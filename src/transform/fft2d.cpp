@@ -1,6 +1,7 @@
 #include "transform/fft2d.hpp"
 
 #include <algorithm>
+#include <utility>
 
 namespace tw {
 namespace {
@@ -154,7 +155,14 @@ Status Fft2DRealForward(const FftTable* rowTable, const FftTable* colTable, cons
             const int32_t mr = r == 0 ? 0 : rows - r;
             cdouble* out = y + Idx((r + ro) % rows, 0, cols);
             const cdouble* mirror = y + Idx((mr + ro) % rows, 0, cols);
-            for (int32_t c = half; c < cols; ++c) out[col(c)] = std::conj(mirror[col(cols - c)]);
+            // Runs of c in which neither the target nor the mirrored column wraps around.
+            int32_t cuts[4] = {half, std::clamp(cols - co, half, cols), std::clamp(co + 1, half, cols), cols};
+            if (cuts[1] > cuts[2]) std::swap(cuts[1], cuts[2]);
+            for (int k = 0; k < 3; ++k) {
+                cdouble* to = out + col(cuts[k]);
+                const cdouble* from = mirror + col(cols - cuts[k]);
+                for (int32_t j = 0; j < cuts[k + 1] - cuts[k]; ++j) to[j] = std::conj(from[-j]);
+            }
             for (const int32_t c : {0, nyquist}) {
                 if (c < 0 || r < mr) continue;
                 const cdouble v = mirror[col(c)];
