@@ -96,11 +96,4 @@ TEST(Fft2DFrames, StatusesInTheirOrderEmptyY) {
     EXPECT_EQ(cell, nullptr);
 }
 
-TEST(Fft2DFrames, OneByOneIsTheStartElement) {
-    twrt::Array2D<double> x(3, 4, {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12});
-    twrt::Array2D<cd> y;
-    ASSERT_EQ(ReFFT2D_H(x.h(), 2, 1, 1, 1, 1, y.h(), nullptr, nullptr), 0);
-    EXPECT_EQ(y.vec(), std::vector<cd>{cd(10, 0)});
-}
-
 }  // namespace
