@@ -71,4 +71,63 @@ TW_API int32_t GaussianPeakFitCoef_head(Array1DHandle y, Array1DHandle x, Array1
                                         Array1DHandle guess, double* amplitude, double* centre, double* deviation,
                                         int32_t* iterations, double floor);
 
+/* Robust fits. Bisquare (Bi..., GenBisquareFit...): reweighted least squares with Tukey's biweight
+ * on leverage-adjusted residuals; the error output is the mse at the final parameters with the
+ * caller's |w|. Least absolute residual (LAR..., GenLARFit_head): the error output is the mean of
+ * |(y - f) w|. tolerance (not above 0: 1e-4) ends the loop on a relative change, floor (not above
+ * 0: 1e-12) ends a least-absolute-residual loop, iterations is the limit in and the completed
+ * refits out (GenLARFit_head and LARPolyFit_head only read it). coefficientsOnly non-zero: y stays
+ * as passed, no error output, and the polynomial exports leave the best fit as passed. */
+TW_API int32_t BiLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                double* slope, double* intercept, double* mse, int32_t* iterations,
+                                int32_t coefficientsOnly);
+TW_API int32_t LARLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                 double* slope, double* intercept, double* mae, int32_t* iterations, double floor,
+                                 int32_t coefficientsOnly);
+TW_API int32_t BiPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
+                              Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
+                              Array1DHandle coefficients, double* mse, double tolerance, int32_t* iterations,
+                              int32_t coefficientsOnly);
+TW_API int32_t LARPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
+                               Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
+                               Array1DHandle coefficients, double* mae, double tolerance, int32_t* iterations,
+                               double floor, int32_t coefficientsOnly);
+TW_API int32_t BiExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                             Array1DHandle guess, uint16_t method, double* a, double* b, double* mse,
+                             int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t LARExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                              Array1DHandle guess, uint16_t method, double* a, double* b, double* mae,
+                              int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t BiPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                               Array1DHandle guess, double* a, double* b, double* mse, int32_t* iterations,
+                               double floor, int32_t coefficientsOnly);
+TW_API int32_t LARPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                Array1DHandle guess, double* a, double* b, double* mae, int32_t* iterations,
+                                double floor, int32_t coefficientsOnly);
+TW_API int32_t BiLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
+                             double* a, double* b, double* mse, int32_t* iterations, int32_t coefficientsOnly);
+TW_API int32_t LARLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
+                              double* a, double* b, double* mae, int32_t* iterations, double floor,
+                              int32_t coefficientsOnly);
+TW_API int32_t BiGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                               Array1DHandle guess, double* amplitude, double* centre, double* deviation, double* mse,
+                               int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t LARGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                Array1DHandle guess, double* amplitude, double* centre, double* deviation,
+                                double* mae, int32_t* iterations, double floor, int32_t coefficientsOnly);
+/* h is n by k; weights of length 0 or n. GenBisquareFit_Weight_head hands back the last refit's
+ * weights (robust times |w|) in weights, filled with 1.0 first when it came empty. */
+TW_API int32_t GenBisquareFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                                   int32_t covarianceWanted, double tolerance, int32_t* iterations,
+                                   Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                                   double* mse);
+TW_API int32_t GenBisquareFit_Weight_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                                          int32_t covarianceWanted, double tolerance, int32_t* iterations,
+                                          Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                                          double* mse);
+TW_API int32_t GenLARFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                              int32_t covarianceWanted, double tolerance, double floor, int32_t* iterations,
+                              Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                              double* mae);
+
 #endif
