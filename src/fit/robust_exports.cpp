@@ -134,6 +134,7 @@ Status GeneralFrame(bool lar, Handle h, Handle y, Handle& w, bool weightsOut, in
     f.Output<double>(bestFit);
     f.Output2D<double>(covariance);
     f.Result(err);
+    if (weightsOut) f.Output<double>(w);
     const Shape d = Dims(h);
     const int32_t n = d.rows, k = d.cols, nw = Count(w);
     const double *hs = nullptr, *ys = nullptr, *ws = nullptr;
