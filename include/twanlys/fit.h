@@ -130,4 +130,36 @@ TW_API int32_t GenLARFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle we
                               Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
                               double* mae);
 
+/* Bounded fits: each parameter between lower and upper (arrays of equal length, at least the
+ * parameter count, or both empty for no bounds; infinities mean no bound, equal bounds fix the
+ * parameter). Models a exp(b x) + c, a x^b + c, a exp(-0.5 ((x - m) / s)^2) + o, a log_base(b x)
+ * and a x + b. errorKind: 0 least squares, 1 least absolute residual, 2 bisquare. y in, fit out.
+ * iterations is read only (0 is written for empty data). A limit reached without convergence
+ * returns -20062 with the outputs standing. */
+TW_API int32_t BoundExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                uint16_t errorKind, double* a, double* b, double* c, double* mse);
+TW_API int32_t BoundPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                  int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                  uint16_t errorKind, double* a, double* b, double* c, double* mse);
+TW_API int32_t BoundGaussianFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                     int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
+                                     Array1DHandle upper, uint16_t errorKind, double* amplitude, double* centre,
+                                     double* deviation, double* offset, double* mse);
+TW_API int32_t BoundLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                uint16_t errorKind, double base, double* a, double* b, double* mse);
+TW_API int32_t BoundLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle lower,
+                                   Array1DHandle upper, double* slope, double* intercept, double* mse);
+TW_API int32_t BoundLinearFitBi_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                     int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
+                                     double* intercept, double* mse);
+TW_API int32_t BoundLinearFitLAR_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                      int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
+                                      double* intercept, double* mae);
+/* One damped step for a host-side iteration: coefficients += (alpha with its diagonal times
+ * (lambda + 1))^-1 beta; alpha k by k, beta k. The status is stored through status and returned. */
+TW_API int32_t GetNewCoef_head(Array1DHandle coefficients, Array2DHandle alpha, Array1DHandle beta, double* lambda,
+                               int32_t* status);
+
 #endif

@@ -34,20 +34,6 @@ Status MedianOf(const double* v, int32_t n, double* m) {
     return s == BoundsNanErr ? NanInfErr : s;
 }
 
-// 1 / max(|y - f|, t) weights of a reweighting pass, times |w| when given; r is scratch.
-Status InverseResidualWeights(const double* y, const double* f, const double* w, int32_t n, double* r, double* v) {
-    for (int32_t i = 0; i < n; ++i) r[i] = std::fabs(y[i] - f[i]);
-    double med = 0;
-    if (const Status s = MedianOf(r, n, &med)) return s;
-    double t = kFloorRatio * med;
-    if (med == 0) t = kFloorFallback;
-    for (int32_t i = 0; i < n; ++i) {
-        const double d = std::max(r[i], t);
-        v[i] = w != nullptr ? std::fabs(w[i] / d) : std::fabs(1 / d);
-    }
-    return 0;
-}
-
 // Which of the last, the one before and the start wins; ties go to the later test.
 enum class Pick { Latest, Before, Start };
 Pick Choose(double current, double previous, double start) {
@@ -76,6 +62,19 @@ void LineValues(const double* x, int32_t n, double a, double b, double* f) {
 }
 
 }  // namespace
+
+Status InverseResidualWeights(const double* y, const double* f, const double* w, int32_t n, double* r, double* v) {
+    for (int32_t i = 0; i < n; ++i) r[i] = std::fabs(y[i] - f[i]);
+    double med = 0;
+    if (const Status s = MedianOf(r, n, &med)) return s;
+    double t = kFloorRatio * med;
+    if (med == 0) t = kFloorFallback;
+    for (int32_t i = 0; i < n; ++i) {
+        const double d = std::max(r[i], t);
+        v[i] = w != nullptr ? std::fabs(w[i] / d) : std::fabs(1 / d);
+    }
+    return 0;
+}
 
 Status BisquarePass(const double* r, const double* w, int32_t n, double* rw, int32_t* zeros, bool* scaleZero) {
     *zeros = 0;
@@ -259,7 +258,17 @@ Status RobustPolySolve(int32_t kind, RobustTuning tuning, const double* h, int32
 }
 
 Status BisquareLine(const double* x, const double* y, const double* w, int32_t n, double tolerance, int32_t limit,
-                    double* slope, double* intercept, double* fit, double* mse, int32_t* count) {
+                    double* slope, double* intercept, double* fit, double* mse, int32_t* count,
+                    const LineBounds* bounds) {
+    if (bounds != nullptr && n <= 2) {
+        if (count != nullptr) *count = 0;
+        return BoundedLine(x, y, w, n, *bounds, slope, intercept, fit, mse);
+    }
+    // The start and every refit: the free line, or the bounded one.
+    const auto refit = [&](const double* v, double* a, double* b) {
+        return bounds != nullptr ? BoundedLine(x, y, v, n, *bounds, a, b, nullptr, nullptr)
+                                 : LineFit(x, y, v, n, a, b, nullptr, nullptr);
+    };
     if (n < 2) return TooFewSamples2Err;
     const double* vw = nullptr;
     if (const Status s = VetWeights(w, n, 1, &vw)) return s;
@@ -276,7 +285,7 @@ Status BisquareLine(const double* x, const double* y, const double* w, int32_t n
         a = (y[1] - y[0]) / (x[1] - x[0]);
         b = y[0] - a * x[0];
     } else {
-        if (const Status s = LineFit(x, y, vw, n, &a, &b, nullptr, nullptr)) return s;
+        if (const Status s = refit(vw, &a, &b)) return s;
         for (int32_t i = 0; i < n; ++i) j[2 * i] = x[i], j[2 * i + 1] = 1.0;
         if (const Status s = LeverageAdjust(j, vw, n, 2, true, adj)) return s;
         double pa = a + kFirstPassOffset, pb = b + kFirstPassOffset;
@@ -291,7 +300,7 @@ Status BisquareLine(const double* x, const double* y, const double* w, int32_t n
             bool exact = false;
             if (const Status s = BisquarePass(r, vw, n, rw, &zeros, &exact)) return s;
             if (exact || zeros >= n - 1) break;
-            if (const Status s = LineFit(x, y, rw, n, &a, &b, nullptr, nullptr)) return s;
+            if (const Status s = refit(rw, &a, &b)) return s;
             ++passes;
         }
     }
@@ -300,14 +309,39 @@ Status BisquareLine(const double* x, const double* y, const double* w, int32_t n
     if (count != nullptr) *count = passes;
     double* f = j;
     LineValues(x, n, a, b, f);
-    if (mse != nullptr) *mse = FitMse(y, f, vw, n, MseWalk::Forward);
+    if (mse != nullptr && bounds != nullptr) {
+        double sum = 0;
+        for (int32_t i = 0; i < n; ++i) sum += (y[i] - f[i]) * (y[i] - f[i]) * (vw != nullptr ? std::fabs(vw[i]) : 1.0);
+        *mse = sum / n;
+    } else if (mse != nullptr) {
+        *mse = FitMse(y, f, vw, n, MseWalk::Forward);
+    }
     if (fit != nullptr) std::memcpy(fit, f, static_cast<size_t>(n) * sizeof(double));
     return work.Release();
 }
 
 Status LarLine(const double* x, const double* y, const double* w, int32_t n, double tolerance, double floor,
-               int32_t limit, double* slope, double* intercept, double* fit, double* mae, int32_t* count) {
+               int32_t limit, double* slope, double* intercept, double* fit, double* mae, int32_t* count,
+               const LineBounds* bounds) {
     const double tol = IterationTolerance(tolerance), fl = MseFloor(floor);
+    if (bounds != nullptr && n <= 2) {
+        if (count != nullptr) *count = 0;
+        double e = 0;
+        double* f = fit;
+        Scratch<double> values;
+        if (f == nullptr && mae != nullptr && n > 0) {
+            if (values.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
+            f = values.get();
+        }
+        if (const Status s = BoundedLine(x, y, w, n, *bounds, slope, intercept, f, &e)) return s;
+        const double* vw = w;
+        if (n > 1) VetWeights(w, n, 1, &vw);
+        if (mae != nullptr) *mae = n > 0 ? MeanAbsResidual(y, f, vw, n) : 0.0;
+        return values.Release();
+    }
+    const auto clampTo = [&](int32_t j, double v) {
+        return bounds != nullptr ? std::clamp(v, bounds->lower[j], bounds->upper[j]) : v;
+    };
     if (n < 2) return TooFewSamples2Err;
     const double* vw = nullptr;
     if (const Status s = VetWeights(w, n, 1, &vw)) return s;
@@ -326,7 +360,9 @@ Status LarLine(const double* x, const double* y, const double* w, int32_t n, dou
         return work.Release();
     }
     double a = 0, b = 0;
-    if (const Status s = LineFit(x, y, vw, n, &a, &b, nullptr, nullptr)) return s;
+    const Status start = bounds != nullptr ? BoundedLine(x, y, vw, n, *bounds, &a, &b, nullptr, nullptr)
+                                           : LineFit(x, y, vw, n, &a, &b, nullptr, nullptr);
+    if (start != 0) return start;
     int32_t zero = -1, zeros = 0;
     for (int32_t i = 0; i < n; ++i)
         if (x[i] == 0) zero = i, ++zeros;
@@ -349,13 +385,13 @@ Status LarLine(const double* x, const double* y, const double* w, int32_t n, dou
                 v[m++] = vw != nullptr ? std::fabs(x[i] * vw[i]) : std::fabs(x[i]);
             }
             if (const Status s = SortAscendingPaired(q, v, m, stack)) return s;
-            a = WeightedMedian(q, v, m);
+            a = clampTo(0, WeightedMedian(q, v, m));
             for (int32_t i = 0; i < n; ++i) {
                 q[i] = y[i] - x[i] * a;
                 v[i] = vw != nullptr ? std::fabs(vw[i]) : 1.0;
             }
             if (const Status s = SortAscendingPaired(q, v, n, stack)) return s;
-            b = WeightedMedian(q, v, n);
+            b = clampTo(1, WeightedMedian(q, v, n));
             line[0][0] = a, line[0][1] = b;
             LineValues(x, n, a, b, f);
             current = MeanAbsResidual(y, f, vw, n);

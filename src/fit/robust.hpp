@@ -4,6 +4,7 @@
 
 #include <cstdint>
 
+#include "fit/bounded.hpp"
 #include "fit/fit_core.hpp"
 
 namespace tw {
@@ -16,6 +17,10 @@ Status BisquarePass(const double* r, const double* w, int32_t n, double* rw, int
 // Leverage adjustment of the n by k design j: adj[i] = sqrt(q / (1 - h[i])), h the diagonal of
 // J pinv(J^T W J) J^T, q = |w[i]| or 1. leverageByWeight multiplies h by |w[i]| as well.
 Status LeverageAdjust(const double* j, const double* w, int32_t n, int32_t k, bool leverageByWeight, double* adj);
+
+// Weights of a reweighting pass: 1 / max(|y - f|, t), times |w| when given, with t 0.01 times the
+// median |y - f| (1e-7 when that is 0); r is scratch of n.
+Status InverseResidualWeights(const double* y, const double* f, const double* w, int32_t n, double* r, double* v);
 
 // Mean absolute residual (1 / n) sum |(y - f) w|, w null meaning 1.
 double MeanAbsResidual(const double* y, const double* f, const double* w, int32_t n);
@@ -40,11 +45,15 @@ Status RobustPolySolve(int32_t kind, RobustTuning tuning, const double* h, int32
                        const double* w, uint32_t method, double* coef);
 
 // Robust straight lines. fit (may be y) and err are optional; count gets the completed refits
-// (passes for the least-absolute-residual line).
+// (passes for the least-absolute-residual line). With bounds every fit is the bounded line (the
+// bisquare mse then squares the residual) and the medians are clamped into the box; n <= 2 is
+// the bounded line itself.
 Status BisquareLine(const double* x, const double* y, const double* w, int32_t n, double tolerance, int32_t limit,
-                    double* slope, double* intercept, double* fit, double* mse, int32_t* count);
+                    double* slope, double* intercept, double* fit, double* mse, int32_t* count,
+                    const LineBounds* bounds = nullptr);
 Status LarLine(const double* x, const double* y, const double* w, int32_t n, double tolerance, double floor,
-               int32_t limit, double* slope, double* intercept, double* fit, double* mae, int32_t* count);
+               int32_t limit, double* slope, double* intercept, double* fit, double* mae, int32_t* count,
+               const LineBounds* bounds = nullptr);
 
 // The robust loops around the nonlinear models.
 enum class RobustModel { Exp, Power, Log, Gauss };

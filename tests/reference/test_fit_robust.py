@@ -1,5 +1,6 @@
-"""Robust fits against NumPy transcriptions of the stated iterations, the L1 optimum of
-scipy.optimize.linprog and outlier-resistance checks against the plain fits."""
+"""Robust and bounded fits against NumPy transcriptions of the stated iterations, the L1 optimum
+of scipy.optimize.linprog, scipy.optimize.least_squares / lsq_linear with bounds, and
+outlier-resistance checks against the plain fits."""
 import ctypes
 import sys
 import unittest
@@ -30,6 +31,15 @@ for name, args in {
     "ExpFit80_head": [P, P, P, D, P, U16, DP, DP, DP, IP, D],
     "PowerFit_head": [P, P, P, D, P, DP, DP, DP, IP, D],
     "GaussianPeakFit_head": [P, P, P, D, P, DP, DP, DP, DP, IP, D],
+    "LinFit_head": [P, P, P, DP, DP, DP],
+    "BoundExpFit_head": [P, P, P, D, IP, P, P, P, U16, DP, DP, DP, DP],
+    "BoundPowerFit_head": [P, P, P, D, IP, P, P, P, U16, DP, DP, DP, DP],
+    "BoundGaussianFit_head": [P, P, P, D, IP, P, P, P, U16, DP, DP, DP, DP, DP],
+    "BoundLogFit_head": [P, P, P, D, IP, P, P, P, U16, D, DP, DP, DP],
+    "BoundLinearFit_head": [P, P, P, P, P, DP, DP, DP],
+    "BoundLinearFitBi_head": [P, P, P, D, IP, P, P, DP, DP, DP],
+    "BoundLinearFitLAR_head": [P, P, P, D, IP, P, P, DP, DP, DP],
+    "GetNewCoef_head": [P, P, P, DP, IP],
 }.items():
     getattr(tw.lib, name).argtypes = args
 
@@ -38,6 +48,13 @@ WORST = {}
 
 def note(key, err):
     WORST[key] = max(WORST.get(key, 0.0), float(err))
+
+
+def placements():
+    for aligned in (0, 1):
+        tw.placement(aligned)
+        yield aligned
+    tw.placement(0)
 
 
 def rel(got, want):
@@ -449,6 +466,215 @@ class Models(unittest.TestCase):
         note("LAR log mae over L1 optimum", mae / opt - 1)
         self.assertLess(mae, opt * 1.02)
         np.testing.assert_allclose(fit, a * np.log(b * x), rtol=1e-12)
+
+
+# --- Bounded fits --------------------------------------------------------------------------------
+
+INF = np.inf
+
+
+def bounded_values(kind, q, x, base=2.71828):
+    if kind == "Exp":
+        return q[0] * np.exp(q[1] * x) + q[2]
+    if kind == "Power":
+        return q[0] * x ** q[1] + q[2]
+    if kind == "Gaussian":
+        return q[0] * np.exp(-0.5 * ((x - q[1]) / q[2]) ** 2) + q[3]
+    return model_values("Log", q, x, base)
+
+
+def call_bounded(kind, y, x, lower=(), upper=(), w=(), err=0, tol=1e-9, limit=300, guess=(), base=2.71828):
+    yh, it, mse = tw.array(y), tw.i32(limit), tw.f64()
+    out = [tw.f64() for _ in range({"Gaussian": 4, "Log": 2}.get(kind, 3))]
+    extra = [base] if kind == "Log" else []
+    s = getattr(tw.lib, "Bound" + kind + "Fit_head")(yh, tw.array(x), tw.array(w), tol, it.ref, tw.array(guess),
+                                                      tw.array(lower), tw.array(upper), err, *extra,
+                                                      *(o.ref for o in out), mse.ref)
+    return s, np.array([o.value for o in out]), yh.numpy(), mse.value, it.value
+
+
+def reference_fit(kind, x, y, lower, upper, start, base=2.71828):
+    """scipy's trust-region fit; a fixed parameter is held by leaving it out."""
+    lower, upper, start = (np.asarray(v, float) for v in (lower, upper, start))
+    free = lower != upper
+
+    def residual(z):
+        q = lower.copy()
+        q[free] = z
+        return bounded_values(kind, q, x, base) - y
+    r = scipy.optimize.least_squares(residual, np.clip(start[free], lower[free], upper[free]),
+                                     bounds=(lower[free], upper[free]), xtol=1e-15, ftol=1e-15, gtol=1e-15,
+                                     max_nfev=20000)
+    q = lower.copy()
+    q[free] = r.x
+    return q, np.mean(r.fun ** 2)
+
+
+def penalised_line(x, y, lo, up):
+    """The penalised Newton iteration of the bounded line, unweighted."""
+    n = len(x)
+    s, sx, sy, sxy, sxx = float(n), sum(x), sum(y), sum(x * y), sum(x * x)
+    d = sx * sx - sxx * n
+    a, b = (sy * sx - sxy * n) / d, (sxy * sx - sy * sxx) / d
+    if lo[0] <= a <= up[0] and lo[1] <= b <= up[1]:
+        return a, b
+    F = lambda p, q: 0.5 * sxx * p * p + 0.5 * s * q * q + sx * p * q - sxy * p - sy * q  # noqa: E731
+    g = np.sqrt(2.0**-52)
+    a, b = min(max(a, lo[0]), up[0]), min(max(b, lo[1]), up[1])
+    f = F(a, b)
+    mu = max(f / 1.414, 1.0)
+    while True:
+        P = 1 / (g + min(up[0] - a, a - lo[0]))
+        Q = 1 / (g + min(up[1] - b, b - lo[1]))
+        mu /= 10
+        while True:
+            A, B = P * P * mu + sxx, Q * Q * mu + s
+            g1, g2 = -(a * sxx - sxy + b * sx), -(b * s + a * sx - sy)
+            D = sx * sx - A * B
+            da, db = (g2 * sx - g1 * B) / D, (g1 * sx - g2 * A) / D
+            a, b = min(max(a + da, lo[0]), up[0]), min(max(b + db, lo[1]), up[1])
+            fnew = F(a, b)
+            m = min(up[0] - a, a - lo[0], up[1] - b, b - lo[1])
+            mu *= 2
+            if not g + min(m, f - fnew) < 0:
+                break
+            P, Q = da, db
+        rel_change = abs(f - fnew) / (abs(f) + 2.0**-52)
+        f = fnew
+        if not rel_change > 1e-12:
+            return a, b
+
+
+def call_bounded_line(name, y, x, lower, upper, w=(), tol=1e-8, limit=50):
+    yh, out = tw.array(y), [tw.f64() for _ in range(3)]
+    mid = [] if name == "BoundLinearFit_head" else [tol, tw.i32(limit).ref]
+    s = getattr(tw.lib, name)(yh, tw.array(x), tw.array(w), *mid, tw.array(lower), tw.array(upper),
+                              *(o.ref for o in out))
+    return s, [o.value for o in out], yh.numpy()
+
+
+class Bounded(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(74)
+
+    CASES = {
+        "Exp": (np.linspace(0, 3, 40), [2.0, 0.5, 1.0], [1, 0.3, 0.5]),
+        "Power": (np.linspace(0.5, 4, 40), [1.5, 1.3, -0.5], [1, 1, 0]),
+        "Gaussian": (np.linspace(-3, 5, 60), [3.0, 1.0, 0.8, 0.5], [2.5, 0.8, 1.0, 0.3]),
+        "Log": (np.linspace(0.5, 6, 40), [1.5, 2.0], [1.0, 1.0]),
+    }
+
+    def test_models_against_least_squares(self):
+        for kind, (x, truth, start) in self.CASES.items():
+            p = len(truth)
+            y = bounded_values(kind, truth, x) + self.rng.normal(0, 0.03, x.size)
+            free, _ = reference_fit(kind, x, y, [-INF] * p, [INF] * p, start)
+            # Free; the second parameter held below its free value; the first one fixed.
+            held = list(free)
+            held[1] = free[1] - 0.1 * abs(free[1])
+            boxes = [([-INF] * p, [INF] * p, None),
+                     ([-INF] * p, [INF, held[1]] + [INF] * (p - 2), 1),
+                     ([truth[0], -INF] + [-INF] * (p - 2), [truth[0], INF] + [INF] * (p - 2), 0)]
+            for lower, upper, active in boxes:
+                s, q, fit, mse, it = call_bounded(kind, y, x, lower, upper)
+                self.assertEqual(s, 0, (kind, lower, upper))
+                self.assertEqual(it, 300)  # read only
+                ref, ref_mse = reference_fit(kind, x, y, lower, upper, start)
+                note("bounded " + kind + " mse relative to least_squares", abs(mse / ref_mse - 1))
+                self.assertLess(abs(mse / ref_mse - 1), 1e-4, (kind, q, ref))
+                if active is not None:
+                    self.assertEqual(q[active], upper[active])
+                np.testing.assert_allclose(fit, bounded_values(kind, q, x), rtol=1e-13, atol=1e-13)
+                self.assertAlmostEqual(mse, mse_of(y, fit), delta=1e-12 * (1 + mse))
+
+    def test_robust_error_kinds(self):
+        x = np.linspace(0, 3, 40)
+        y = bounded_values("Exp", [2.0, 0.5, 1.0], x) + self.rng.normal(0, 0.03, x.size)
+        clean_q, _ = reference_fit("Exp", x, y, [-INF] * 3, [INF] * 3, [1, 0.3, 0.5])
+        y[[7, 25]] += 3
+        w = self.rng.uniform(0.5, 2, x.size)
+        # Least absolute residual: the mae (with |w|) at the returned parameters, near the L1 optimum.
+        s, q, fit, mae, _ = call_bounded("Exp", y, x, w=w, err=1)
+        self.assertEqual(s, 0)
+        self.assertAlmostEqual(mae, mae_of(y, fit, w), delta=1e-13)
+        opt = scipy.optimize.minimize(lambda z: mae_of(y, bounded_values("Exp", z, x), w), clean_q,
+                                      method="Nelder-Mead", options={"xatol": 1e-12, "fatol": 1e-14,
+                                                                     "maxiter": 20000}).fun
+        note("bounded exp kind 1 mae over L1 optimum", mae / opt - 1)
+        self.assertLess(mae, opt * 1.02)
+        # Bisquare: the two outliers barely move the curve; the error is the mse with |w|. (a and c
+        # trade off against each other, so the curves are compared, not the parameters.)
+        clean = bounded_values("Exp", clean_q, x)
+        s, q, fit, mse, _ = call_bounded("Exp", y, x, w=w, err=2)
+        self.assertEqual(s, 0)
+        self.assertAlmostEqual(mse, mse_of(y, fit, w), delta=1e-12)
+        note("bounded exp kind 2 curve shift from clean fit", rel(fit, clean))
+        s0, q0, plain, *_ = call_bounded("Exp", y, x, w=w, err=0)
+        note("bounded exp kind 0 curve shift from clean fit", rel(plain, clean))
+        self.assertLess(rel(fit, clean), 0.005)
+        self.assertGreater(rel(plain, clean), 0.01)
+
+    def test_line_against_lsq_linear_and_the_penalised_iteration(self):
+        x = np.arange(12.0)
+        y = 2 * x + 1 + self.rng.normal(0, 0.2, x.size)
+        for aligned in placements():
+            # Inside the box: exactly the closed-form line.
+            yl, m, b, e = tw.array(y), tw.f64(), tw.f64(), tw.f64()
+            tw.lib.LinFit_head(yl, tw.array(x), tw.array([]), m.ref, b.ref, e.ref)
+            s, (a, c, mse), fit = call_bounded_line("BoundLinearFit_head", y, x, [-5, -5], [5, 5])
+            self.assertEqual((s, a, c), (0, m.value, b.value))
+            for lower, upper in (([0, -5], [1.5, 5]), ([2.1, -5], [3, 5]), ([-5, -5], [5, 0.2])):
+                s, (a, c, mse), fit = call_bounded_line("BoundLinearFit_head", y, x, lower, upper)
+                ref = scipy.optimize.lsq_linear(np.c_[x, np.ones_like(x)], y, bounds=(lower, upper), tol=1e-14).x
+                ta, tc = penalised_line(x, y, lower, upper)
+                self.assertEqual(s, 0)
+                note("bounded line vs lsq_linear", rel([a, c], ref))
+                note("bounded line vs transcription", rel([a, c], [ta, tc]))
+                self.assertLess(rel([a, c], [ta, tc]), 1e-8)
+                self.assertLess(rel([a, c], ref), 1e-6)
+                self.assertTrue(a in lower + upper or c in lower + upper)  # the active bound is held exactly
+                np.testing.assert_allclose(fit, a * x + c, rtol=1e-15)
+                self.assertAlmostEqual(mse, np.mean((y - fit) ** 2), delta=1e-13)
+        # Both bounds violated by the free line: the clamped start stays in the corner although
+        # the constrained optimum only needs the slope bound.
+        s, (a, c, _), _ = call_bounded_line("BoundLinearFit_head", y, x, [-5, 2], [1.5, 5])
+        ref = scipy.optimize.lsq_linear(np.c_[x, np.ones_like(x)], y, bounds=([-5, 2], [1.5, 5])).x
+        self.assertEqual(a, 1.5)
+        self.assertAlmostEqual(c, 2.0, delta=1e-12)
+        self.assertGreater(ref[1], 2.5)
+
+    def test_robust_bounded_lines(self):
+        x = np.linspace(-2, 6, 40)
+        y = 0.8 * x + 0.3 + self.rng.normal(0, 0.1, x.size)
+        y[[3, 30]] += 4
+        for name, free in (("BoundLinearFitBi_head", "BiLinearFit_head"), ("BoundLinearFitLAR_head",
+                                                                            "LARLinearFit_head")):
+            s, (a, c, e), fit = call_bounded_line(name, y, x, [-10, -10], [10, 10], tol=1e-6, limit=30)
+            s2, (fa, fc, fe), _, _ = call_line(free, y, x, [], 1e-6, 30)
+            self.assertEqual((s, s2), (0, 0))
+            np.testing.assert_allclose([a, c], [fa, fc], rtol=1e-12)
+            s, (a, c, e), fit = call_bounded_line(name, y, x, [0, -10], [0.7, 10], tol=1e-6, limit=30)
+            self.assertEqual((s, a), (0, 0.7))
+            np.testing.assert_allclose(fit, a * x + c, rtol=1e-15)
+            want = mae_of(y, fit) if "LAR" in name else np.mean((y - fit) ** 2)
+            self.assertAlmostEqual(e, want, delta=1e-13)
+            # Robust: the intercept comes from the inliers (least squares on all gives more).
+            inl = np.ones(x.size, bool)
+            inl[[3, 30]] = False
+            self.assertAlmostEqual(c, np.median(y[inl] - 0.7 * x[inl]), delta=0.1)
+
+    def test_damped_step_against_solve(self):
+        for k, lam in ((1, 0.0), (3, 0.0), (3, 0.5), (6, 2.0)):
+            j = self.rng.normal(size=(20, k))
+            alpha, beta = j.T @ j, self.rng.normal(size=k)
+            coef = self.rng.normal(size=k)
+            ch, st = tw.array(coef), tw.i32(99)
+            s = tw.lib.GetNewCoef_head(ch, tw.matrix(alpha), tw.array(beta), tw.f64(lam).ref, st.ref)
+            damped = alpha + np.diag(np.diag(alpha)) * lam
+            want = coef + np.linalg.solve(damped, beta)
+            self.assertEqual((s, st.value), (0, 0))
+            note("damped step", rel(ch.numpy(), want))
+            self.assertLess(rel(ch.numpy(), want), 1e-12)
 
 
 def tearDownModule():
