@@ -116,6 +116,8 @@ TEST_P(FitRobust, GeneralStatusesAndWeightHandback) {
         {rows, 5, 2, {1, 2, 3}, {}, EqSamplesErr},
         {rows, 5, 2, y, {1, 1}, EqSamplesErr},
         {V(rows.begin(), rows.begin() + 2), 1, 2, {1}, {}, PolyOrderErr},
+        // The wild third point is rejected, and n - k = 1 zero leaves nothing to fit.
+        {V(rows.begin(), rows.begin() + 6), 3, 2, {0, 1, 10}, {}, NoRootErr},
     };
     for (const Case& c : cases) {
         Array2D<double> h(c.n, c.k, c.h), cov;

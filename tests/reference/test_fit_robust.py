@@ -377,6 +377,7 @@ class Deterministic(unittest.TestCase):
         rc, _ = gen_lar(h, y, None, 1e-10, 1e-12, 40)
         self.assertEqual((s, it), (0, 40))
         self.assertLess(rel(c, rc), 1e-8)
+        np.testing.assert_allclose(fit, h @ c, rtol=1e-13, atol=1e-13)
         self.assertAlmostEqual(mae, mae_of(y, fit), delta=1e-13)
         # A fixed constant term: the robust core runs on y with it taken off.
         s, c, fit, mse, it = call_poly("BiPolyFit_head", x, y, 2, tol=1e-8, limit=100, powers=[0], values=[1.0])
@@ -466,6 +467,7 @@ class Models(unittest.TestCase):
         note("LAR log mae over L1 optimum", mae / opt - 1)
         self.assertLess(mae, opt * 1.02)
         np.testing.assert_allclose(fit, a * np.log(b * x), rtol=1e-12)
+        self.assertAlmostEqual(mae, mae_of(y, fit), delta=1e-13)
 
 
 # --- Bounded fits --------------------------------------------------------------------------------
