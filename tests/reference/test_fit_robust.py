@@ -109,18 +109,19 @@ def line(x, y, w):
     return c[0], c[1]
 
 
-def bisquare_line(x, y, w, tol, limit):
+def bisquare_line(x, y, w, tol, limit, params=lambda a, b: (a, b)):
+    """The loop of the line; params maps (slope, intercept) to the parameters tested for change."""
     a, b = line(x, y, w)
     adj = adjustment(np.c_[x, np.ones_like(x)], w)
-    pa, pb, count = a + 1e5, b + 1e5, 0
-    while count == 0 or not (count >= limit or abs(pa - a) <= abs(pa) * tol or abs(pb - b) <= abs(pb) * tol):
-        pa, pb = a, b
+    prev, count = [v + 1e5 for v in params(a, b)], 0
+    while count == 0 or not (count >= limit or any(abs(p - q) <= abs(p) * tol for p, q in zip(prev, params(a, b)))):
+        prev = params(a, b)
         rw, zeros = bisquare_weights((y - x * a - b) * adj, w)
         if rw is None or zeros >= len(x) - 1:
             break
         a, b = line(x, y, rw)
         count += 1
-    return a, b, count
+    return (*params(a, b), count)
 
 
 def gen_bisquare(h, y, w, tol, limit):
@@ -395,23 +396,9 @@ class Deterministic(unittest.TestCase):
             for w in (None, self.rng.uniform(0.5, 2, n)):
                 s, (a, b), fit, mse, it = call_model("BiLogFit_head", y, x, [] if w is None else w, 1e-7, limit=50,
                                                      base=base)
-                # Transcription: the line y = a t + c with robust weights, b = sign base^(c / a).
-                t = lg
-                ra, rc = line(t, y, w)
-                adj = adjustment(np.c_[t, np.ones(n)], w)
-                power = (lambda v: np.exp(v)) if base == 2.71828 else (lambda v: base**v)
-                rb = sign * power(rc / ra)
-                pa, pb, count = ra + 1e5, rb + 1e5, 0
-                while count == 0 or not (count >= 50 or abs(pa - ra) <= abs(pa) * 1e-7 or
-                                         abs(pb - rb) <= abs(pb) * 1e-7):
-                    pa, pb = ra, rb
-                    f = ra * np.log(x * rb) / (1.0 if base == 2.71828 else np.log(base))
-                    rw, zeros = bisquare_weights((y - f) * adj, w)
-                    if rw is None or zeros >= n - 1:
-                        break
-                    ra, rc = line(t, y, rw)
-                    rb = sign * power(rc / ra)
-                    count += 1
+                # The line y = a t + c with robust weights, b = sign base^(c / a).
+                power = np.exp if base == 2.71828 else (lambda v: base**v)
+                ra, rb, count = bisquare_line(lg, y, w, 1e-7, 50, lambda p, c: (p, sign * power(c / p)))
                 self.assertEqual((s, it), (0, count))
                 note("bisquare log", rel([a, b], [ra, rb]))
                 self.assertLess(rel([a, b], [ra, rb]), 1e-8)
