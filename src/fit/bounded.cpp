@@ -312,7 +312,8 @@ LmModel BoundedLogModel(const double* baseAndLog) {
 namespace {
 
 // Offset from the vertex of a parabola through (t, y), then a log-linear exponential in t on y
-// less that offset: q = (a, b, c).
+// less that offset: q = (a, b, c). Both fits take the caller's weights, so that samples of
+// weight 0 do not steer the start either.
 Status ExpLikeEstimate(const double* t, const double* y, const double* w, int32_t n, double* q) {
     Scratch<double> work;
     if (work.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;

@@ -200,6 +200,7 @@ Status GenBisquareCore(const double* h, int32_t n, int32_t k, const double* y, c
 Status GenLarCore(const double* h, int32_t n, int32_t k, const double* y, const double* w, uint32_t method,
                   double tolerance, double floor, int32_t limit, double* coef, double* fit, double* covariance,
                   double* mae) {
+    // The family's default floor applies here too: 0 or below means 1e-12.
     const double tol = IterationTolerance(tolerance), fl = MseFloor(floor);
     if (n < k) return PolyOrderErr;
     Status st = GeneralLeastSquares(h, n, k, y, w, method, coef, nullptr, nullptr, nullptr);
@@ -574,6 +575,8 @@ Status LarModel(const double* x, const double* y, const double* vw, int32_t n, c
 Status RobustModelFit(const double* x, const double* y, const double* w, int32_t n, RobustModelInputs in, double* p,
                       double* fit, double* err, int32_t* count) {
     const bool lar = in.kind == RobustKind::Lar;
+    // The plain exponential fit silently writes nothing for an unknown method; a loop around it
+    // would run on unset parameters, so the robust fits refuse it.
     if (in.model == RobustModel::Exp && (in.method < 0 || in.method > 1)) return InvalidSelectorErr;
     // The start fit vets the data and the weights in its own order.
     Status st = 0;
