@@ -31,6 +31,20 @@ Status ViewY(Frame& f, Handle& y, bool coefOnly, const double** ys, double** fit
 
 int32_t Limit(const int32_t* iterations) { return iterations != nullptr ? *iterations : 0; }
 
+// Whether the fixed terms name every power 0 .. order.
+bool AllFixed(const int32_t* powers, int32_t count, int32_t order) {
+    Scratch<uint8_t> seen;
+    if (count < order + 1 || seen.Allocate(static_cast<size_t>(order) + 1) != 0) return false;
+    std::memset(seen.get(), 0, static_cast<size_t>(order) + 1);
+    int32_t named = 0;
+    for (int32_t j = 0; j < count; ++j)
+        if (powers[j] >= 0 && powers[j] <= order && seen[static_cast<size_t>(powers[j])] == 0) {
+            seen[static_cast<size_t>(powers[j])] = 1;
+            ++named;
+        }
+    return named == order + 1;
+}
+
 Status LineFrame(bool lar, Handle& y, Handle x, Handle w, double tol, double* slope, double* intercept, double* err,
                  int32_t* iterations, double floor, int32_t coefOnly) {
     Frame f;
@@ -86,8 +100,9 @@ Status PolyFrame(int32_t kind, Handle x, Handle y, int32_t order, Handle w, int3
         VetWeights(ws, n, 1, &vw);  // passed inside the core already
         *err = kind == PolyLeastAbsolute ? MeanAbsResidual(ys, fit, vw, n) : mse;
     }
-    // The least-absolute-residual core reads its limit and leaves it.
-    if (s >= 0 && kind == PolyBisquare && iterations != nullptr) *iterations = it;
+    // The least-absolute-residual core reads its limit and leaves it. With every power fixed no
+    // robust fit runs, and no refit is counted.
+    if (s >= 0 && kind == PolyBisquare && iterations != nullptr) *iterations = AllFixed(ps, fixed, order) ? 0 : it;
     return f.Finish(s);
 }
 

@@ -202,6 +202,15 @@ TEST_P(FitRobust, PolynomialCoefficientsOnlyLeavesBestFit) {
     EXPECT_EQ(mse, -7.0);
     EXPECT_EQ(coef.vec().size(), 3u);
     EXPECT_GT(it, 0);
+    // Every power fixed: no robust fit runs and no refit is counted.
+    it = 10;
+    ASSERT_EQ(BiPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 1, Array1D<double>().h(), 0,
+                             Array1D<int32_t>({1, 0}).h(), Array1D<double>({2, 1}).h(), fit.h(), coef.h(), &mse, 1e-6,
+                             &it, 0),
+              0);
+    EXPECT_EQ(it, 0);
+    EXPECT_EQ(coef.vec(), (V{1, 2}));
+    EXPECT_EQ(fit.vec(), (V{1, 3, 5, 7, 9, 11}));
     // Order n is too high for six points in both kinds.
     EXPECT_EQ(LARPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 6, Array1D<double>().h(), 0,
                               Array1D<int32_t>().h(), Array1D<double>().h(), fit.h(), coef.h(), &mse, 1e-6, &it, -1,
