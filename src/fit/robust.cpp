@@ -326,19 +326,15 @@ Status LarLine(const double* x, const double* y, const double* w, int32_t n, dou
                const LineBounds* bounds) {
     const double tol = IterationTolerance(tolerance), fl = MseFloor(floor);
     if (bounds != nullptr && n <= 2) {
+        // fit may be y: the values go to a block of their own until the mae is taken.
         if (count != nullptr) *count = 0;
-        double e = 0;
-        double* f = fit;
-        Scratch<double> values;
-        if (f == nullptr && mae != nullptr && n > 0) {
-            if (values.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
-            f = values.get();
-        }
+        double f[2] = {0, 0}, e = 0;
         if (const Status s = BoundedLine(x, y, w, n, *bounds, slope, intercept, f, &e)) return s;
         const double* vw = w;
         if (n > 1) VetWeights(w, n, 1, &vw);
         if (mae != nullptr) *mae = n > 0 ? MeanAbsResidual(y, f, vw, n) : 0.0;
-        return values.Release();
+        if (fit != nullptr) std::copy(f, f + n, fit);
+        return 0;
     }
     const auto clampTo = [&](int32_t j, double v) {
         return bounds != nullptr ? std::clamp(v, bounds->lower[j], bounds->upper[j]) : v;

@@ -104,6 +104,18 @@ TEST_P(FitBounded, LineShortDataAndLogSigns) {
     EXPECT_EQ(a, 1.5);
     EXPECT_NEAR(b, 1.0, 1e-12);
     EXPECT_NEAR(mse, 0.0, 1e-20);
+    // Two points whose line the slope bound excludes: the least-absolute export takes the bounded
+    // least-squares line (slope 1, intercept the mean of y - x) and reports its mae, not 0.
+    Array1D<double> ty({1, 3}), tx({0, 1});
+    int32_t limit = 5;
+    double e = -1;
+    EXPECT_EQ(BoundLinearFitLAR_head(ty.h(), tx.h(), Array1D<double>().h(), 0, &limit, Array1D<double>({-1, -10}).h(),
+                                     Array1D<double>({1, 10}).h(), &a, &b, &e),
+              0);
+    EXPECT_EQ(a, 1.0);
+    EXPECT_NEAR(b, 1.5, 1e-9);
+    EXPECT_NEAR(e, 0.5, 1e-9);
+    EXPECT_NEAR(ty.vec()[1], 2.5, 1e-9);
     // The logarithm needs x of one sign.
     Array1D<double> ly({1, 2, 3});
     double la = 0, lb = 0, le = 0;
