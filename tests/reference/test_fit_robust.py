@@ -546,15 +546,16 @@ class Bounded(unittest.TestCase):
     def setUp(self):
         self.rng = np.random.default_rng(74)
 
-    CASES = {
-        "Exp": (np.linspace(0, 3, 40), [2.0, 0.5, 1.0], [1, 0.3, 0.5]),
-        "Power": (np.linspace(0.5, 4, 40), [1.5, 1.3, -0.5], [1, 1, 0]),
-        "Gaussian": (np.linspace(-3, 5, 60), [3.0, 1.0, 0.8, 0.5], [2.5, 0.8, 1.0, 0.3]),
-        "Log": (np.linspace(0.5, 6, 40), [1.5, 2.0], [1.0, 1.0]),
-    }
+    CASES = (
+        ("Exp", np.linspace(0, 3, 40), [2.0, 0.5, 1.0], [1, 0.3, 0.5]),
+        ("Power", np.linspace(0.5, 4, 40), [1.5, 1.3, -0.5], [1, 1, 0]),
+        ("Gaussian", np.linspace(-3, 5, 60), [3.0, 1.0, 0.8, 0.5], [2.5, 0.8, 1.0, 0.3]),
+        ("Gaussian", np.linspace(-3, 5, 60), [-2.0, 3.0, 1.5, 10.0], [-1.5, 2.8, 1.0, 9.0]),  # a dip
+        ("Log", np.linspace(0.5, 6, 40), [1.5, 2.0], [1.0, 1.0]),
+    )
 
     def test_models_against_least_squares(self):
-        for kind, (x, truth, start) in self.CASES.items():
+        for kind, x, truth, start in self.CASES:
             p = len(truth)
             y = bounded_values(kind, truth, x) + self.rng.normal(0, 0.03, x.size)
             free, _ = reference_fit(kind, x, y, [-INF] * p, [INF] * p, start)
