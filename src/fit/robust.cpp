@@ -383,12 +383,22 @@ Status LarLine(const double* x, const double* y, const double* w, int32_t n, dou
             }
             if (const Status s = SortAscendingPaired(q, v, m, stack)) return s;
             a = clampTo(0, WeightedMedian(q, v, m));
-            for (int32_t i = 0; i < n; ++i) {
-                q[i] = y[i] - x[i] * a;
-                v[i] = vw != nullptr ? std::fabs(vw[i]) : 1.0;
+            for (int32_t i = 0; i < n; ++i) q[i] = y[i] - x[i] * a;
+            if (vw != nullptr) {
+                for (int32_t i = 0; i < n; ++i) v[i] = std::fabs(vw[i]);
+                if (const Status s = SortAscendingPaired(q, v, n, stack)) return s;
+                b = clampTo(1, WeightedMedian(q, v, n));
+            } else {
+                // Unit weights: the running sum after i values is i + 1 exactly, so the median is
+                // the value of rank ceil(n / 2) - 1, which a selection finds without the sort.
+                const int32_t rank = (n + 1) / 2 - 1;
+                if (HasNonFinite(q, n)) {
+                    SortAscending(q, n);
+                } else {
+                    std::nth_element(q, q + rank, q + n);
+                }
+                b = clampTo(1, q[rank]);
             }
-            if (const Status s = SortAscendingPaired(q, v, n, stack)) return s;
-            b = clampTo(1, WeightedMedian(q, v, n));
             line[0][0] = a, line[0][1] = b;
             LineValues(x, n, a, b, f);
             current = MeanAbsResidual(y, f, vw, n);
