@@ -172,7 +172,7 @@ def gen_lar(h, y, w, tol, floor, limit):
         chosen = ("before", before)
     if mae0 <= prev and mae0 <= cur:
         chosen = ("start", w)
-    return wls(h, y, chosen[1]), count
+    return wls(h, y, chosen[1]), chosen[1]
 
 
 def weighted_median(q, v):
@@ -331,12 +331,15 @@ class Deterministic(unittest.TestCase):
             h = np.c_[np.ones(n), self.rng.uniform(-2, 2, size=(n, k - 1))]
             y = h @ np.arange(1.0, k + 1) + self.rng.laplace(0, 0.3, n)
             for w in (None, self.rng.uniform(0.5, 2, n)):
-                s, c, fit, mae, it, _, _ = call_general("GenLARFit_head", h, y, [] if w is None else w, 1e-10, 30,
-                                                        -1.0)
-                rc, _ = gen_lar(h, y, w, 1e-10, 1e-12, 30)
+                s, c, fit, mae, it, _, cov = call_general("GenLARFit_head", h, y, [] if w is None else w, 1e-10, 30,
+                                                          -1.0)
+                rc, wc = gen_lar(h, y, w, 1e-10, 1e-12, 30)
                 self.assertEqual((s, it), (0, 30))  # read, not written
                 note("general LAR", rel(c, rc))
                 self.assertLess(rel(c, rc), 1e-8)
+                # The covariance is that of the final refit, with the chosen weights.
+                wc = np.ones(n) if wc is None else np.abs(wc)
+                self.assertLess(rel(cov, np.linalg.inv(h.T @ (wc[:, None] * h))), 1e-8)
                 self.assertAlmostEqual(mae, mae_of(y, h @ c, w), delta=1e-13)
                 _, opt = lad(h, y, w)
                 note("general LAR mae over L1 optimum", mae / opt - 1)
@@ -603,6 +606,16 @@ class Bounded(unittest.TestCase):
         note("bounded exp kind 0 curve shift from clean fit", rel(plain, clean))
         self.assertLess(rel(fit, clean), 0.005)
         self.assertGreater(rel(plain, clean), 0.01)
+        # Every model and kind: the fit is the model at the returned parameters, the error its own.
+        for kind, x, truth, _ in self.CASES:
+            y = bounded_values(kind, truth, x) + self.rng.normal(0, 0.03, x.size)
+            w = self.rng.uniform(0.5, 2, x.size)
+            for err in (1, 2):
+                s, q, fit, e, _ = call_bounded(kind, y, x, w=w, err=err)
+                self.assertEqual(s, 0, (kind, err))
+                np.testing.assert_allclose(fit, bounded_values(kind, q, x), rtol=1e-13, atol=1e-13)
+                self.assertAlmostEqual(e, mae_of(y, fit, w) if err == 1 else mse_of(y, fit, w), delta=1e-12)
+                self.assertLess(rel(q, truth), 0.1, (kind, err))
 
     def test_line_against_lsq_linear_and_the_penalised_iteration(self):
         x = np.arange(12.0)
