@@ -191,7 +191,8 @@ void Mask(double* alpha, double* beta, const int32_t* state, int32_t p) {
 }
 
 // Solves the damped system; a non-finite system or solution is a zero step (*nonFinite set).
-Status DampedSolve(const double* alpha, const double* beta, int32_t p, double lambda, double* delta, bool* nonFinite) {
+Status DampedSolve(const double* alpha, const double* beta, int32_t p, double lambda, double* delta,
+                   bool* nonFinite) {
     double a[kMaxP * kMaxP], b[kMaxP];
     int32_t perm[kMaxP], parity = 0;
     std::memcpy(a, alpha, Cells(p, p) * sizeof(double));
@@ -227,8 +228,11 @@ Status LevenbergMarquardt(const double* x, const double* y, const double* w, int
     double lam = *lambda > 0 ? *lambda : 1.0;
     Scratch<double> work;
     if (work.Allocate(static_cast<size_t>(n) * (5 + static_cast<size_t>(p))) != 0) return OutOfMemoryErr;
-    const LmWork wk{work.get(), work.get() + n, work.get() + n * (1 + static_cast<size_t>(p)),
-                    work.get() + n * (2 + static_cast<size_t>(p)), work.get() + n * (3 + static_cast<size_t>(p)),
+    const LmWork wk{work.get(),
+                    work.get() + n,
+                    work.get() + n * (1 + static_cast<size_t>(p)),
+                    work.get() + n * (2 + static_cast<size_t>(p)),
+                    work.get() + n * (3 + static_cast<size_t>(p)),
                     work.get() + n * (4 + static_cast<size_t>(p))};
     for (int32_t i = 0; i < n; ++i) wk.kw[i] = w != nullptr ? std::fabs(w[i]) : 1.0;
     double alpha[kMaxP * kMaxP], beta[kMaxP], alpha2[kMaxP * kMaxP], beta2[kMaxP], trial[kMaxP], delta[kMaxP];
@@ -250,7 +254,8 @@ Status LevenbergMarquardt(const double* x, const double* y, const double* w, int
         Clamp(trial, lower, upper, p, trialState);
         if (kind == BoundBisquare) {
             double change = 0;
-            for (int32_t j = 0; j < p; ++j) change = std::max(change, std::fabs(q[j] - trial[j]) / std::fabs(q[j]));
+            for (int32_t j = 0; j < p; ++j)
+                change = std::max(change, std::fabs(q[j] - trial[j]) / std::fabs(q[j]));
             if (change <= tol) break;
         }
         if (const Status s = Evaluate(model, kind, x, y, w, n, trial, wk, alpha2, beta2, &e2)) {
@@ -318,8 +323,8 @@ Status ExpLikeEstimate(const double* t, const double* y, const double* w, int32_
     Scratch<double> work;
     if (work.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
     double c[3];
-    Status s = PolyFitCore(t, y, w, n, 2, 0, {nullptr, nullptr, 0}, PolyLeastSquares, kPlainTuning, c, nullptr,
-                           nullptr);
+    Status s = PolyFitCore(t, y, w, n, 2, 0, {nullptr, nullptr, 0}, PolyLeastSquares, kPlainTuning, c,
+                           nullptr, nullptr);
     if (s < 0) return s;
     double offset = 0;
     if (std::isfinite(c[2]) && !(std::fabs(c[2]) <= kUnitRound)) offset = c[0] - c[1] * c[1] / (4 * c[2]);
@@ -411,8 +416,8 @@ Status VetBoundWeights(const double* w, int32_t n, int32_t p, const double** vet
 
 // Short data repeated so that the solver sees at least p samples: one sample p times, two or
 // three twice. Returns the new count.
-int32_t Replicate(const double* x, const double* y, const double* w, int32_t n, int32_t p, double* rx, double* ry,
-                  double* rw) {
+int32_t Replicate(const double* x, const double* y, const double* w, int32_t n, int32_t p, double* rx,
+                  double* ry, double* rw) {
     const int32_t times = n == 1 ? p : 2;
     for (int32_t t = 0; t < times; ++t)
         for (int32_t i = 0; i < n; ++i) {
@@ -473,8 +478,8 @@ Status BoundedModelFit(BoundModel model, const double* x, const double* y, const
     std::fill(none[1], none[1] + kMaxP, kInf);
     int32_t it = l1;
     double lambda = 0.1, e = 0;
-    Status st = LevenbergMarquardt(sx, sy, sw, m, BoundLeastSquares, lm, q, none[1], none[0], &it, std::sqrt(tol),
-                                   &lambda, nullptr, &e);
+    Status st = LevenbergMarquardt(sx, sy, sw, m, BoundLeastSquares, lm, q, none[1], none[0], &it,
+                                   std::sqrt(tol), &lambda, nullptr, &e);
     if (st < 0 && st != NoConvergenceErr) return st;
     it = l2;
     lambda = 0.1;
@@ -515,8 +520,14 @@ Status BoundedLogFit(const double* x, const double* y, const double* w, int32_t 
         st = LogFitCore(sx, sy, sw, m, base, q, q + 1, nullptr, &e);
     } else {
         int32_t count = 0;
-        const RobustModelInputs in{RobustModel::Log, kind == BoundBisquare ? RobustKind::Bisquare : RobustKind::Lar,
-                                   0, nullptr, base, tolerance, 1e-12, iterations};
+        const RobustModelInputs in{RobustModel::Log,
+                                   kind == BoundBisquare ? RobustKind::Bisquare : RobustKind::Lar,
+                                   0,
+                                   nullptr,
+                                   base,
+                                   tolerance,
+                                   1e-12,
+                                   iterations};
         st = RobustModelFit(sx, sy, sw, m, in, q, nullptr, &e, &count);
     }
     if (st < 0) return st;
@@ -526,7 +537,8 @@ Status BoundedLogFit(const double* x, const double* y, const double* w, int32_t 
         const LmModel lm = BoundedLogModel(context);
         int32_t it = iterations;
         double lambda = 1.0;
-        st = LevenbergMarquardt(sx, sy, sw, m, kind, lm, q, upper, lower, &it, tolerance, &lambda, nullptr, &e);
+        st = LevenbergMarquardt(sx, sy, sw, m, kind, lm, q, upper, lower, &it, tolerance, &lambda, nullptr,
+                                &e);
         if (st < 0 && st != NoConvergenceErr) return st;
     }
     if (fit != nullptr)
@@ -537,8 +549,8 @@ Status BoundedLogFit(const double* x, const double* y, const double* w, int32_t 
 
 // --- Bounded straight line ----------------------------------------------------------------------
 
-Status BoundedLine(const double* x, const double* y, const double* w, int32_t n, const LineBounds& bd, double* slope,
-                   double* intercept, double* fit, double* mse) {
+Status BoundedLine(const double* x, const double* y, const double* w, int32_t n, const LineBounds& bd,
+                   double* slope, double* intercept, double* fit, double* mse) {
     const double* lo = bd.lower;
     const double* up = bd.upper;
     if (n < FreeCount(lo, up, 2)) return TooFewDataForModelErr;
@@ -638,7 +650,8 @@ Status BoundedLine(const double* x, const double* y, const double* w, int32_t n,
 Status DampedStep(double* coef, const double* alpha, const double* beta, int32_t k, double lambda) {
     Scratch<double> work;
     Scratch<int32_t> perm;
-    if (work.Allocate(Cells(k, k) + 2 * static_cast<size_t>(k)) != 0 || perm.Allocate(static_cast<size_t>(k)) != 0)
+    if (work.Allocate(Cells(k, k) + 2 * static_cast<size_t>(k)) != 0 ||
+        perm.Allocate(static_cast<size_t>(k)) != 0)
         return OutOfMemoryErr;
     double* a = work.get();
     double* b = a + Cells(k, k);

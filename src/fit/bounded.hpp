@@ -18,8 +18,8 @@ struct LmModel {
     double (*value)(double x, const double* q, const void* ctx);
     void (*gradient)(double x, const double* q, const void* ctx, double* g);
     // alpha (p by p, full), beta (p) and the mean of r^2 |v| over all samples, v null meaning 1.
-    void (*batch)(const double* x, const double* y, const double* v, int32_t n, const double* q, const void* ctx,
-                  double* alpha, double* beta, double* mse);
+    void (*batch)(const double* x, const double* y, const double* v, int32_t n, const double* q,
+                  const void* ctx, double* alpha, double* beta, double* mse);
     const void* ctx;
 };
 
@@ -38,9 +38,9 @@ LmModel BoundedModel(BoundModel m);
 LmModel BoundedLogModel(const double* baseAndLog);
 
 // Bounded exponential, power or Gaussian fit. guess (p, or null), iterations read only.
-Status BoundedModelFit(BoundModel m, const double* x, const double* y, const double* w, int32_t n, double tolerance,
-                       int32_t iterations, const double* guess, const double* lower, const double* upper,
-                       uint16_t kind, double* q, double* fit, double* mse);
+Status BoundedModelFit(BoundModel m, const double* x, const double* y, const double* w, int32_t n,
+                       double tolerance, int32_t iterations, const double* guess, const double* lower,
+                       const double* upper, uint16_t kind, double* q, double* fit, double* mse);
 // Bounded logarithm: a plain (or robust) fit first, the solver only when it leaves the box.
 Status BoundedLogFit(const double* x, const double* y, const double* w, int32_t n, double tolerance,
                      int32_t iterations, const double* lower, const double* upper, uint16_t kind, double base,
@@ -54,8 +54,8 @@ struct LineBounds {
 
 // Least-squares line held in the box by a penalised Newton iteration. fit may be y. mse is the
 // mean of (y - f)^2 |w|.
-Status BoundedLine(const double* x, const double* y, const double* w, int32_t n, const LineBounds& b, double* slope,
-                   double* intercept, double* fit, double* mse);
+Status BoundedLine(const double* x, const double* y, const double* w, int32_t n, const LineBounds& b,
+                   double* slope, double* intercept, double* fit, double* mse);
 
 // One damped step: coef += (alpha with diagonal times (lambda + 1))^-1 beta.
 Status DampedStep(double* coef, const double* alpha, const double* beta, int32_t k, double lambda);

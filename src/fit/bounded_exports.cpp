@@ -54,8 +54,9 @@ Status FinishStanding(Frame& f, Status s, bool warn) {
 
 enum class Which { Exp, Power, Gauss, Log };
 
-Status ModelFrame(Which which, Handle& y, Handle x, Handle w, double tol, int32_t* iterations, Handle guessHandle,
-                  Handle lower, Handle upper, uint16_t kind, double base, double* const* outs, double* mse) {
+Status ModelFrame(Which which, Handle& y, Handle x, Handle w, double tol, int32_t* iterations,
+                  Handle guessHandle, Handle lower, Handle upper, uint16_t kind, double base,
+                  double* const* outs, double* mse) {
     const int32_t p = which == Which::Gauss ? 4 : which == Which::Log ? 2 : 3;
     Frame f;
     for (int32_t j = 0; j < p; ++j) f.Result(outs[j]);
@@ -91,8 +92,8 @@ Status ModelFrame(Which which, Handle& y, Handle x, Handle w, double tol, int32_
     return FinishStanding(f, s, warn);
 }
 
-Status LineFrame(int kind, Handle& y, Handle x, Handle w, double tol, int32_t* iterations, Handle lower, Handle upper,
-                 double* slope, double* intercept, double* err) {
+Status LineFrame(int kind, Handle& y, Handle x, Handle w, double tol, int32_t* iterations, Handle lower,
+                 Handle upper, double* slope, double* intercept, double* err) {
     Frame f;
     f.Result(slope);
     f.Result(intercept);
@@ -119,56 +120,62 @@ Status LineFrame(int kind, Handle& y, Handle x, Handle w, double tol, int32_t* i
 }  // namespace
 
 TW_API int32_t BoundExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
-                                uint16_t errorKind, double* a, double* b, double* c, double* mse) {
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
+                                Array1DHandle upper, uint16_t errorKind, double* a, double* b, double* c,
+                                double* mse) {
     double* const outs[3] = {a, b, c};
-    return ModelFrame(Which::Exp, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0, outs, mse);
+    return ModelFrame(Which::Exp, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0,
+                      outs, mse);
 }
 
 TW_API int32_t BoundPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                  int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
-                                  uint16_t errorKind, double* a, double* b, double* c, double* mse) {
+                                  int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
+                                  Array1DHandle upper, uint16_t errorKind, double* a, double* b, double* c,
+                                  double* mse) {
     double* const outs[3] = {a, b, c};
-    return ModelFrame(Which::Power, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0, outs,
-                      mse);
+    return ModelFrame(Which::Power, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0,
+                      outs, mse);
 }
 
-TW_API int32_t BoundGaussianFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                     int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
-                                     Array1DHandle upper, uint16_t errorKind, double* amplitude, double* centre,
-                                     double* deviation, double* offset, double* mse) {
+TW_API int32_t BoundGaussianFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                     double tolerance, int32_t* iterations, Array1DHandle guess,
+                                     Array1DHandle lower, Array1DHandle upper, uint16_t errorKind,
+                                     double* amplitude, double* centre, double* deviation, double* offset,
+                                     double* mse) {
     double* const outs[4] = {amplitude, centre, deviation, offset};
-    return ModelFrame(Which::Gauss, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0, outs,
-                      mse);
+    return ModelFrame(Which::Gauss, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, 0,
+                      outs, mse);
 }
 
 TW_API int32_t BoundLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
-                                uint16_t errorKind, double base, double* a, double* b, double* mse) {
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
+                                Array1DHandle upper, uint16_t errorKind, double base, double* a, double* b,
+                                double* mse) {
     double* const outs[2] = {a, b};
-    return ModelFrame(Which::Log, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, base, outs,
-                      mse);
+    return ModelFrame(Which::Log, y, x, weights, tolerance, iterations, guess, lower, upper, errorKind, base,
+                      outs, mse);
 }
 
-TW_API int32_t BoundLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle lower,
-                                   Array1DHandle upper, double* slope, double* intercept, double* mse) {
+TW_API int32_t BoundLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                   Array1DHandle lower, Array1DHandle upper, double* slope, double* intercept,
+                                   double* mse) {
     return LineFrame(0, y, x, weights, 0, nullptr, lower, upper, slope, intercept, mse);
 }
 
-TW_API int32_t BoundLinearFitBi_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                     int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
-                                     double* intercept, double* mse) {
+TW_API int32_t BoundLinearFitBi_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                     double tolerance, int32_t* iterations, Array1DHandle lower,
+                                     Array1DHandle upper, double* slope, double* intercept, double* mse) {
     return LineFrame(1, y, x, weights, tolerance, iterations, lower, upper, slope, intercept, mse);
 }
 
-TW_API int32_t BoundLinearFitLAR_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                      int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
-                                      double* intercept, double* mae) {
+TW_API int32_t BoundLinearFitLAR_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights,
+                                      double tolerance, int32_t* iterations, Array1DHandle lower,
+                                      Array1DHandle upper, double* slope, double* intercept, double* mae) {
     return LineFrame(2, y, x, weights, tolerance, iterations, lower, upper, slope, intercept, mae);
 }
 
-TW_API int32_t GetNewCoef_head(Array1DHandle coefficients, Array2DHandle alpha, Array1DHandle beta, double* lambda,
-                               int32_t* status) {
+TW_API int32_t GetNewCoef_head(Array1DHandle coefficients, Array2DHandle alpha, Array1DHandle beta,
+                               double* lambda, int32_t* status) {
     Frame f;
     double* c = nullptr;
     const double *a = nullptr, *b = nullptr;

@@ -20,7 +20,7 @@ namespace {
 constexpr double kTuning = 4.685;
 constexpr double kConsistency = 0.6745;
 constexpr double kLeverageLimit = 0.9999;
-constexpr double kLeverageFactor = 10000.0000000011;  // 1 / (1 - limit), as used unweighted
+constexpr double kLeverageFactor = 10000.0000000011;    // 1 / (1 - limit), as used unweighted
 constexpr double kLeverageGap = 9.999999999998899e-05;  // 1 - limit, as used weighted
 constexpr double kFloorRatio = 0.01;
 constexpr double kFloorFallback = 1e-07;
@@ -63,7 +63,8 @@ void LineValues(const double* x, int32_t n, double a, double b, double* f) {
 
 }  // namespace
 
-Status InverseResidualWeights(const double* y, const double* f, const double* w, int32_t n, double* r, double* v) {
+Status InverseResidualWeights(const double* y, const double* f, const double* w, int32_t n, double* r,
+                              double* v) {
     for (int32_t i = 0; i < n; ++i) r[i] = std::fabs(y[i] - f[i]);
     double med = 0;
     if (const Status s = MedianOf(r, n, &med)) return s;
@@ -76,7 +77,8 @@ Status InverseResidualWeights(const double* y, const double* f, const double* w,
     return 0;
 }
 
-Status BisquarePass(const double* r, const double* w, int32_t n, double* rw, int32_t* zeros, bool* scaleZero) {
+Status BisquarePass(const double* r, const double* w, int32_t n, double* rw, int32_t* zeros,
+                    bool* scaleZero) {
     *zeros = 0;
     *scaleZero = false;
     Scratch<double> work;
@@ -110,7 +112,8 @@ Status BisquarePass(const double* r, const double* w, int32_t n, double* rw, int
     return work.Release();
 }
 
-Status LeverageAdjust(const double* j, const double* w, int32_t n, int32_t k, bool leverageByWeight, double* adj) {
+Status LeverageAdjust(const double* j, const double* w, int32_t n, int32_t k, bool leverageByWeight,
+                      double* adj) {
     Scratch<double> work;
     if (work.Allocate(2 * Cells(k, k)) != 0) return OutOfMemoryErr;
     double* g = work.get();
@@ -146,16 +149,18 @@ Status LeverageAdjust(const double* j, const double* w, int32_t n, int32_t k, bo
 
 double MeanAbsResidual(const double* y, const double* f, const double* w, int32_t n) {
     double sum = 0;
-    for (int32_t i = 0; i < n; ++i) sum += w != nullptr ? std::fabs((y[i] - f[i]) * w[i]) : std::fabs(y[i] - f[i]);
+    for (int32_t i = 0; i < n; ++i)
+        sum += w != nullptr ? std::fabs((y[i] - f[i]) * w[i]) : std::fabs(y[i] - f[i]);
     return sum / n;
 }
 
-Status GenBisquareCore(const double* h, int32_t n, int32_t k, const double* y, const double* w, double* weightsOut,
-                       uint32_t method, double tolerance, int32_t* iterations, double* coef, double* fit,
-                       double* covariance, double* mse) {
+Status GenBisquareCore(const double* h, int32_t n, int32_t k, const double* y, const double* w,
+                       double* weightsOut, uint32_t method, double tolerance, int32_t* iterations,
+                       double* coef, double* fit, double* covariance, double* mse) {
     const double tol = IterationTolerance(tolerance);
     if (n < k) return PolyOrderErr;
-    if (HasNonFinite(y, n) || HasNonFinite(h, static_cast<int32_t>(std::min<size_t>(Cells(n, k), INT32_MAX))) ||
+    if (HasNonFinite(y, n) ||
+        HasNonFinite(h, static_cast<int32_t>(std::min<size_t>(Cells(n, k), INT32_MAX))) ||
         (w != nullptr && HasNonFinite(w, n)))
         return NanInfErr;
     double e = 0;
@@ -175,7 +180,8 @@ Status GenBisquareCore(const double* h, int32_t n, int32_t k, const double* y, c
         if (count > 0) {
             if (count >= limit) break;
             bool settled = true;
-            for (int32_t j = 0; j < k; ++j) settled = settled && std::fabs(coef[j] - prev[j]) <= std::fabs(coef[j]) * tol;
+            for (int32_t j = 0; j < k; ++j)
+                settled = settled && std::fabs(coef[j] - prev[j]) <= std::fabs(coef[j]) * tol;
             if (settled) break;
         }
         if (e <= tol * 0.0001) break;
@@ -191,15 +197,16 @@ Status GenBisquareCore(const double* h, int32_t n, int32_t k, const double* y, c
         if (!std::isfinite(e)) return NoRootErr;
         ++count;
     }
-    if (weightsOut != nullptr && count > 0) std::memcpy(weightsOut, rw, static_cast<size_t>(n) * sizeof(double));
+    if (weightsOut != nullptr && count > 0)
+        std::memcpy(weightsOut, rw, static_cast<size_t>(n) * sizeof(double));
     if (iterations != nullptr) *iterations = count;
     if (mse != nullptr) *mse = e;
     return MergeRelease(st, work.Release());
 }
 
 Status GenLarCore(const double* h, int32_t n, int32_t k, const double* y, const double* w, uint32_t method,
-                  double tolerance, double floor, int32_t limit, double* coef, double* fit, double* covariance,
-                  double* mae) {
+                  double tolerance, double floor, int32_t limit, double* coef, double* fit,
+                  double* covariance, double* mae) {
     // The family's default floor applies here too: 0 or below means 1e-12.
     const double tol = IterationTolerance(tolerance), fl = MseFloor(floor);
     if (n < k) return PolyOrderErr;
@@ -215,7 +222,8 @@ Status GenLarCore(const double* h, int32_t n, int32_t k, const double* y, const 
     double prev = 2 * mae0, current = mae0;
     for (int32_t i = 0; i < n; ++i) latest[i] = w != nullptr ? w[i] : 1.0;
     int32_t count = 0;
-    while (count == 0 || (count < limit && std::fabs(prev - current) > prev * tol && fl < prev && fl < current)) {
+    while (count == 0 ||
+           (count < limit && std::fabs(prev - current) > prev * tol && fl < prev && fl < current)) {
         prev = current;
         std::swap(latest, before);
         if (const Status s = InverseResidualWeights(y, fit, w, n, r, latest)) return s;
@@ -240,26 +248,26 @@ Status GenLarCore(const double* h, int32_t n, int32_t k, const double* y, const 
     return MergeRelease(st, work.Release());
 }
 
-Status RobustPolySolve(int32_t kind, RobustTuning tuning, const double* h, int32_t n, int32_t k, const double* y,
-                       const double* w, uint32_t method, double* coef) {
+Status RobustPolySolve(int32_t kind, RobustTuning tuning, const double* h, int32_t n, int32_t k,
+                       const double* y, const double* w, uint32_t method, double* coef) {
     if (kind != PolyLeastAbsolute && kind != PolyBisquare) return InvalidSelectorErr;
     Scratch<double> work;
     if (work.Allocate(static_cast<size_t>(n)) != 0) return OutOfMemoryErr;
     double e = 0;
     Status st;
     if (kind == PolyBisquare) {
-        st = GenBisquareCore(h, n, k, y, w, nullptr, method, tuning.tolerance1, tuning.iterations, coef, work.get(),
-                             nullptr, &e);
+        st = GenBisquareCore(h, n, k, y, w, nullptr, method, tuning.tolerance1, tuning.iterations, coef,
+                             work.get(), nullptr, &e);
     } else {
         const int32_t limit = tuning.iterations != nullptr ? *tuning.iterations : 0;
-        st = GenLarCore(h, n, k, y, w, method, tuning.tolerance1, tuning.tolerance2, limit, coef, work.get(), nullptr,
-                        &e);
+        st = GenLarCore(h, n, k, y, w, method, tuning.tolerance1, tuning.tolerance2, limit, coef, work.get(),
+                        nullptr, &e);
     }
     return MergeRelease(st, work.Release());
 }
 
-Status BisquareLine(const double* x, const double* y, const double* w, int32_t n, double tolerance, int32_t limit,
-                    double* slope, double* intercept, double* fit, double* mse, int32_t* count,
+Status BisquareLine(const double* x, const double* y, const double* w, int32_t n, double tolerance,
+                    int32_t limit, double* slope, double* intercept, double* fit, double* mse, int32_t* count,
                     const LineBounds* bounds) {
     if (bounds != nullptr && n <= 2) {
         if (count != nullptr) *count = 0;
@@ -292,8 +300,8 @@ Status BisquareLine(const double* x, const double* y, const double* w, int32_t n
         double pa = a + kFirstPassOffset, pb = b + kFirstPassOffset;
         for (;;) {
             // One settled parameter is enough; the first pass always runs.
-            if (passes > 0 &&
-                (passes >= limit || std::fabs(pa - a) <= std::fabs(pa) * tol || std::fabs(pb - b) <= std::fabs(pb) * tol))
+            if (passes > 0 && (passes >= limit || std::fabs(pa - a) <= std::fabs(pa) * tol ||
+                               std::fabs(pb - b) <= std::fabs(pb) * tol))
                 break;
             pa = a, pb = b;
             for (int32_t i = 0; i < n; ++i) r[i] = (y[i] - x[i] * a - b) * adj[i];
@@ -312,7 +320,8 @@ Status BisquareLine(const double* x, const double* y, const double* w, int32_t n
     LineValues(x, n, a, b, f);
     if (mse != nullptr && bounds != nullptr) {
         double sum = 0;
-        for (int32_t i = 0; i < n; ++i) sum += (y[i] - f[i]) * (y[i] - f[i]) * (vw != nullptr ? std::fabs(vw[i]) : 1.0);
+        for (int32_t i = 0; i < n; ++i)
+            sum += (y[i] - f[i]) * (y[i] - f[i]) * (vw != nullptr ? std::fabs(vw[i]) : 1.0);
         *mse = sum / n;
     } else if (mse != nullptr) {
         *mse = FitMse(y, f, vw, n, MseWalk::Forward);
@@ -485,8 +494,8 @@ void ModelJacobian(RobustModel m, const double* p, const double* x, int32_t n, d
     }
 }
 
-Status BisquareModel(const double* x, const double* y, const double* vw, int32_t n, const RobustModelInputs& in,
-                     double* p, double* f, double* work, int32_t* count) {
+Status BisquareModel(const double* x, const double* y, const double* vw, int32_t n,
+                     const RobustModelInputs& in, double* p, double* f, double* work, int32_t* count) {
     const int32_t np = ParamCount(in.model);
     const bool gauss = in.model == RobustModel::Gauss;
     const double tol = IterationTolerance(in.tolerance);
@@ -506,7 +515,8 @@ Status BisquareModel(const double* x, const double* y, const double* vw, int32_t
     for (;;) {
         if (passes > 0) {
             bool settled = passes >= in.limit;
-            for (int32_t i = 0; i < np; ++i) settled = settled || std::fabs(prev[i] - p[i]) <= std::fabs(prev[i]) * tol;
+            for (int32_t i = 0; i < np; ++i)
+                settled = settled || std::fabs(prev[i] - p[i]) <= std::fabs(prev[i]) * tol;
             if (settled) break;
         }
         std::copy(p, p + np, prev);
@@ -578,8 +588,8 @@ Status LarModel(const double* x, const double* y, const double* vw, int32_t n, c
 
 }  // namespace
 
-Status RobustModelFit(const double* x, const double* y, const double* w, int32_t n, RobustModelInputs in, double* p,
-                      double* fit, double* err, int32_t* count) {
+Status RobustModelFit(const double* x, const double* y, const double* w, int32_t n, RobustModelInputs in,
+                      double* p, double* fit, double* err, int32_t* count) {
     const bool lar = in.kind == RobustKind::Lar;
     // The plain exponential fit silently writes nothing for an unknown method; a loop around it
     // would run on unset parameters, so the robust fits refuse it.

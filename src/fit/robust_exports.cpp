@@ -45,8 +45,8 @@ bool AllFixed(const int32_t* powers, int32_t count, int32_t order) {
     return named == order + 1;
 }
 
-Status LineFrame(bool lar, Handle& y, Handle x, Handle w, double tol, double* slope, double* intercept, double* err,
-                 int32_t* iterations, double floor, int32_t coefOnly) {
+Status LineFrame(bool lar, Handle& y, Handle x, Handle w, double tol, double* slope, double* intercept,
+                 double* err, int32_t* iterations, double floor, int32_t coefOnly) {
     Frame f;
     f.Result(slope);
     f.Result(intercept);
@@ -102,13 +102,14 @@ Status PolyFrame(int32_t kind, Handle x, Handle y, int32_t order, Handle w, int3
     }
     // The least-absolute-residual core reads its limit and leaves it. With every power fixed no
     // robust fit runs, and no refit is counted.
-    if (s >= 0 && kind == PolyBisquare && iterations != nullptr) *iterations = AllFixed(ps, fixed, order) ? 0 : it;
+    if (s >= 0 && kind == PolyBisquare && iterations != nullptr)
+        *iterations = AllFixed(ps, fixed, order) ? 0 : it;
     return f.Finish(s);
 }
 
-Status ModelFrame(RobustModel model, RobustKind kind, Handle& y, Handle x, Handle w, double tol, Handle guessHandle,
-                  int32_t method, double base, double* out0, double* out1, double* out2, double* err,
-                  int32_t* iterations, double floor, int32_t coefOnly) {
+Status ModelFrame(RobustModel model, RobustKind kind, Handle& y, Handle x, Handle w, double tol,
+                  Handle guessHandle, int32_t method, double base, double* out0, double* out1, double* out2,
+                  double* err, int32_t* iterations, double floor, int32_t coefOnly) {
     Frame f;
     f.Result(out0);
     f.Result(out1);
@@ -128,8 +129,8 @@ Status ModelFrame(RobustModel model, RobustKind kind, Handle& y, Handle x, Handl
     double p[3] = {0, 0, 0}, e = 0;
     int32_t count = 0;
     if (s == 0)
-        s = RobustModelFit(xs, ys, ws, n, {model, kind, method, guess, base, tol, floor, Limit(iterations)}, p, fit,
-                           coefOnly == 0 ? &e : nullptr, &count);
+        s = RobustModelFit(xs, ys, ws, n, {model, kind, method, guess, base, tol, floor, Limit(iterations)},
+                           p, fit, coefOnly == 0 ? &e : nullptr, &count);
     if (s >= 0) {
         double* outs[3] = {out0, out1, out2};
         for (int32_t i = 0; i < np; ++i)
@@ -142,8 +143,8 @@ Status ModelFrame(RobustModel model, RobustKind kind, Handle& y, Handle x, Handl
 }
 
 Status GeneralFrame(bool lar, Handle h, Handle y, Handle& w, bool weightsOut, int32_t method, int32_t wantCov,
-                    double tol, double floor, int32_t* iterations, Handle& coef, Handle& bestFit, Handle& covariance,
-                    double* err) {
+                    double tol, double floor, int32_t* iterations, Handle& coef, Handle& bestFit,
+                    Handle& covariance, double* err) {
     Frame f;
     f.Output<double>(coef);
     f.Output<double>(bestFit);
@@ -186,7 +187,8 @@ Status GeneralFrame(bool lar, Handle h, Handle y, Handle& w, bool weightsOut, in
         if (s >= 0) {
             *err = FitMse(ys, fit, ws, n, MseWalk::Forward);
             if (iterations != nullptr) *iterations = count;
-            if (weightsOut && count > 0) std::memcpy(wio, robust.get(), static_cast<size_t>(n) * sizeof(double));
+            if (weightsOut && count > 0)
+                std::memcpy(wio, robust.get(), static_cast<size_t>(n) * sizeof(double));
         }
     }
     return f.Finish(MergeRelease(s, robust.Release()));
@@ -201,96 +203,99 @@ TW_API int32_t BiLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle 
 }
 
 TW_API int32_t LARLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                                 double* slope, double* intercept, double* mae, int32_t* iterations, double floor,
-                                 int32_t coefficientsOnly) {
-    return LineFrame(true, y, x, weights, tolerance, slope, intercept, mae, iterations, floor, coefficientsOnly);
+                                 double* slope, double* intercept, double* mae, int32_t* iterations,
+                                 double floor, int32_t coefficientsOnly) {
+    return LineFrame(true, y, x, weights, tolerance, slope, intercept, mae, iterations, floor,
+                     coefficientsOnly);
 }
 
-TW_API int32_t BiPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
-                              Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
-                              Array1DHandle coefficients, double* mse, double tolerance, int32_t* iterations,
-                              int32_t coefficientsOnly) {
-    return PolyFrame(PolyBisquare, x, y, order, weights, method, fixedPowers, fixedValues, bestFit, coefficients, mse,
-                     tolerance, iterations, -1.0, coefficientsOnly);
+TW_API int32_t BiPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights,
+                              int32_t method, Array1DHandle fixedPowers, Array1DHandle fixedValues,
+                              Array1DHandle bestFit, Array1DHandle coefficients, double* mse,
+                              double tolerance, int32_t* iterations, int32_t coefficientsOnly) {
+    return PolyFrame(PolyBisquare, x, y, order, weights, method, fixedPowers, fixedValues, bestFit,
+                     coefficients, mse, tolerance, iterations, -1.0, coefficientsOnly);
 }
 
-TW_API int32_t LARPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
-                               Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
-                               Array1DHandle coefficients, double* mae, double tolerance, int32_t* iterations,
-                               double floor, int32_t coefficientsOnly) {
-    return PolyFrame(PolyLeastAbsolute, x, y, order, weights, method, fixedPowers, fixedValues, bestFit, coefficients,
-                     mae, tolerance, iterations, floor, coefficientsOnly);
+TW_API int32_t LARPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights,
+                               int32_t method, Array1DHandle fixedPowers, Array1DHandle fixedValues,
+                               Array1DHandle bestFit, Array1DHandle coefficients, double* mae,
+                               double tolerance, int32_t* iterations, double floor,
+                               int32_t coefficientsOnly) {
+    return PolyFrame(PolyLeastAbsolute, x, y, order, weights, method, fixedPowers, fixedValues, bestFit,
+                     coefficients, mae, tolerance, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t BiExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
                              Array1DHandle guess, uint16_t method, double* a, double* b, double* mse,
                              int32_t* iterations, double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Exp, RobustKind::Bisquare, y, x, weights, tolerance, guess, method, 0, a, b,
-                      nullptr, mse, iterations, floor, coefficientsOnly);
+    return ModelFrame(RobustModel::Exp, RobustKind::Bisquare, y, x, weights, tolerance, guess, method, 0, a,
+                      b, nullptr, mse, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t LARExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
                               Array1DHandle guess, uint16_t method, double* a, double* b, double* mae,
                               int32_t* iterations, double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Exp, RobustKind::Lar, y, x, weights, tolerance, guess, method, 0, a, b, nullptr,
-                      mae, iterations, floor, coefficientsOnly);
+    return ModelFrame(RobustModel::Exp, RobustKind::Lar, y, x, weights, tolerance, guess, method, 0, a, b,
+                      nullptr, mae, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t BiPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
                                Array1DHandle guess, double* a, double* b, double* mse, int32_t* iterations,
                                double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Power, RobustKind::Bisquare, y, x, weights, tolerance, guess, 1, 0, a, b, nullptr,
-                      mse, iterations, floor, coefficientsOnly);
+    return ModelFrame(RobustModel::Power, RobustKind::Bisquare, y, x, weights, tolerance, guess, 1, 0, a, b,
+                      nullptr, mse, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t LARPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
                                 Array1DHandle guess, double* a, double* b, double* mae, int32_t* iterations,
                                 double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Power, RobustKind::Lar, y, x, weights, tolerance, guess, 1, 0, a, b, nullptr, mae,
-                      iterations, floor, coefficientsOnly);
+    return ModelFrame(RobustModel::Power, RobustKind::Lar, y, x, weights, tolerance, guess, 1, 0, a, b,
+                      nullptr, mae, iterations, floor, coefficientsOnly);
 }
 
-TW_API int32_t BiLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
-                             double* a, double* b, double* mse, int32_t* iterations, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Log, RobustKind::Bisquare, y, x, weights, tolerance, nullptr, 0, base, a, b,
-                      nullptr, mse, iterations, -1.0, coefficientsOnly);
+TW_API int32_t BiLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base,
+                             double tolerance, double* a, double* b, double* mse, int32_t* iterations,
+                             int32_t coefficientsOnly) {
+    return ModelFrame(RobustModel::Log, RobustKind::Bisquare, y, x, weights, tolerance, nullptr, 0, base, a,
+                      b, nullptr, mse, iterations, -1.0, coefficientsOnly);
 }
 
-TW_API int32_t LARLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
-                              double* a, double* b, double* mae, int32_t* iterations, double floor,
-                              int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Log, RobustKind::Lar, y, x, weights, tolerance, nullptr, 0, base, a, b, nullptr,
-                      mae, iterations, floor, coefficientsOnly);
+TW_API int32_t LARLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base,
+                              double tolerance, double* a, double* b, double* mae, int32_t* iterations,
+                              double floor, int32_t coefficientsOnly) {
+    return ModelFrame(RobustModel::Log, RobustKind::Lar, y, x, weights, tolerance, nullptr, 0, base, a, b,
+                      nullptr, mae, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t BiGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
-                               Array1DHandle guess, double* amplitude, double* centre, double* deviation, double* mse,
-                               int32_t* iterations, double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Gauss, RobustKind::Bisquare, y, x, weights, tolerance, guess, 0, 0, amplitude,
-                      centre, deviation, mse, iterations, floor, coefficientsOnly);
+                               Array1DHandle guess, double* amplitude, double* centre, double* deviation,
+                               double* mse, int32_t* iterations, double floor, int32_t coefficientsOnly) {
+    return ModelFrame(RobustModel::Gauss, RobustKind::Bisquare, y, x, weights, tolerance, guess, 0, 0,
+                      amplitude, centre, deviation, mse, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t LARGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
                                 Array1DHandle guess, double* amplitude, double* centre, double* deviation,
                                 double* mae, int32_t* iterations, double floor, int32_t coefficientsOnly) {
-    return ModelFrame(RobustModel::Gauss, RobustKind::Lar, y, x, weights, tolerance, guess, 0, 0, amplitude, centre,
-                      deviation, mae, iterations, floor, coefficientsOnly);
+    return ModelFrame(RobustModel::Gauss, RobustKind::Lar, y, x, weights, tolerance, guess, 0, 0, amplitude,
+                      centre, deviation, mae, iterations, floor, coefficientsOnly);
 }
 
 TW_API int32_t GenBisquareFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
                                    int32_t covarianceWanted, double tolerance, int32_t* iterations,
-                                   Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
-                                   double* mse) {
-    return GeneralFrame(false, h, y, weights, false, method, covarianceWanted, tolerance, 0, iterations, coefficients,
-                        bestFit, covariance, mse);
+                                   Array1DHandle coefficients, Array1DHandle bestFit,
+                                   Array2DHandle covariance, double* mse) {
+    return GeneralFrame(false, h, y, weights, false, method, covarianceWanted, tolerance, 0, iterations,
+                        coefficients, bestFit, covariance, mse);
 }
 
-TW_API int32_t GenBisquareFit_Weight_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
-                                          int32_t covarianceWanted, double tolerance, int32_t* iterations,
-                                          Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
-                                          double* mse) {
-    return GeneralFrame(false, h, y, weights, true, method, covarianceWanted, tolerance, 0, iterations, coefficients,
-                        bestFit, covariance, mse);
+TW_API int32_t GenBisquareFit_Weight_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights,
+                                          int32_t method, int32_t covarianceWanted, double tolerance,
+                                          int32_t* iterations, Array1DHandle coefficients,
+                                          Array1DHandle bestFit, Array2DHandle covariance, double* mse) {
+    return GeneralFrame(false, h, y, weights, true, method, covarianceWanted, tolerance, 0, iterations,
+                        coefficients, bestFit, covariance, mse);
 }
 
 TW_API int32_t GenLARFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,

@@ -30,8 +30,8 @@ struct Result {
     V y;
 };
 
-Result Exp(bool power, const V& y, const V& x, const V& lo, const V& up, uint16_t kind = 0, const V& guess = {},
-           int32_t limit = 100) {
+Result Exp(bool power, const V& y, const V& x, const V& lo, const V& up, uint16_t kind = 0,
+           const V& guess = {}, int32_t limit = 100) {
     Array1D<double> yh(y);
     Result r{0, {0, 0, 0}, 0, limit, {}};
     const auto f = power ? BoundPowerFit_head : BoundExpFit_head;
@@ -98,9 +98,10 @@ TEST_P(FitBounded, LineShortDataAndLogSigns) {
     // One sample with a free intercept: the line passes through it at the fixed slope.
     Array1D<double> y({4});
     double a = 0, b = 0, mse = 1;
-    EXPECT_EQ(BoundLinearFit_head(y.h(), Array1D<double>({2}).h(), Array1D<double>().h(),
-                                  Array1D<double>({1.5, -10}).h(), Array1D<double>({1.5, 10}).h(), &a, &b, &mse),
-              0);
+    EXPECT_EQ(
+        BoundLinearFit_head(y.h(), Array1D<double>({2}).h(), Array1D<double>().h(),
+                            Array1D<double>({1.5, -10}).h(), Array1D<double>({1.5, 10}).h(), &a, &b, &mse),
+        0);
     EXPECT_EQ(a, 1.5);
     EXPECT_NEAR(b, 1.0, 1e-12);
     EXPECT_NEAR(mse, 0.0, 1e-20);
@@ -109,9 +110,10 @@ TEST_P(FitBounded, LineShortDataAndLogSigns) {
     Array1D<double> ty({1, 3}), tx({0, 1});
     int32_t limit = 5;
     double e = -1;
-    EXPECT_EQ(BoundLinearFitLAR_head(ty.h(), tx.h(), Array1D<double>().h(), 0, &limit, Array1D<double>({-1, -10}).h(),
-                                     Array1D<double>({1, 10}).h(), &a, &b, &e),
-              0);
+    EXPECT_EQ(
+        BoundLinearFitLAR_head(ty.h(), tx.h(), Array1D<double>().h(), 0, &limit,
+                               Array1D<double>({-1, -10}).h(), Array1D<double>({1, 10}).h(), &a, &b, &e),
+        0);
     EXPECT_EQ(a, 1.0);
     EXPECT_NEAR(b, 1.5, 1e-9);
     EXPECT_NEAR(e, 0.5, 1e-9);
@@ -121,8 +123,8 @@ TEST_P(FitBounded, LineShortDataAndLogSigns) {
     double la = 0, lb = 0, le = 0;
     int32_t it = 10;
     EXPECT_EQ(BoundLogFit_head(ly.h(), Array1D<double>({-1, 1, 2}).h(), Array1D<double>().h(), 0, &it,
-                               Array1D<double>().h(), Array1D<double>().h(), Array1D<double>().h(), 0, 10.0, &la, &lb,
-                               &le),
+                               Array1D<double>().h(), Array1D<double>().h(), Array1D<double>().h(), 0, 10.0,
+                               &la, &lb, &le),
               NonPositiveDataErr);
     EXPECT_TRUE(ly.vec().empty());
 }
@@ -148,8 +150,8 @@ TEST_P(FitBounded, DampedStep) {
         Array1D<double> coef(c.coef);
         int32_t status = 99;
         double lambda = c.lambda;
-        EXPECT_EQ(GetNewCoef_head(coef.h(), Array2D<double>(c.k, c.k, c.alpha).h(), Array1D<double>(c.beta).h(),
-                                  &lambda, &status),
+        EXPECT_EQ(GetNewCoef_head(coef.h(), Array2D<double>(c.k, c.k, c.alpha).h(),
+                                  Array1D<double>(c.beta).h(), &lambda, &status),
                   c.status);
         EXPECT_EQ(status, c.status);
         EXPECT_EQ(coef.vec(), c.want);

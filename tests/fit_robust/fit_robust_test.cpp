@@ -124,8 +124,8 @@ TEST_P(FitRobust, GeneralStatusesAndWeightHandback) {
         Array1D<double> coef, fit, w(c.w);
         double mse = 0;
         int32_t it = 5;
-        EXPECT_EQ(GenBisquareFit_Weight_head(h.h(), Array1D<double>(c.y).h(), w.h(), 0, 1, 1e-6, &it, coef.h(),
-                                             fit.h(), cov.h(), &mse),
+        EXPECT_EQ(GenBisquareFit_Weight_head(h.h(), Array1D<double>(c.y).h(), w.h(), 0, 1, 1e-6, &it,
+                                             coef.h(), fit.h(), cov.h(), &mse),
                   c.status);
         EXPECT_TRUE(coef.vec().empty() && fit.vec().empty() && cov.rows() == 0 && w.vec().empty());
         EXPECT_TRUE(twtest::IsFailureNaN(mse));
@@ -149,8 +149,8 @@ TEST_P(FitRobust, GeneralStatusesAndWeightHandback) {
     Array1D<double> coef, fit;
     double mae = 0;
     int32_t it = 40;
-    EXPECT_EQ(GenLARFit_head(h.h(), Array1D<double>({1, 3, 5, 7, 19}).h(), Array1D<double>().h(), 0, 0, 1e-9, -1,
-                             &it, coef.h(), fit.h(), cov.h(), &mae),
+    EXPECT_EQ(GenLARFit_head(h.h(), Array1D<double>({1, 3, 5, 7, 19}).h(), Array1D<double>().h(), 0, 0, 1e-9,
+                             -1, &it, coef.h(), fit.h(), cov.h(), &mae),
               0);
     EXPECT_EQ(it, 40);
     EXPECT_NEAR(coef.vec()[1], 2.0, 2e-3);  // the wild last point is discounted (least squares: 4)
@@ -177,9 +177,10 @@ TEST_P(FitRobust, ModelStatusesAndGuessLength) {
         int32_t it = 20;
         const Array1D<double> xh(c.x), w, g(c.guess);
         const int32_t s =
-            c.which == 0   ? BiExpFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), c.method, &a, &b, &e, &it, -1, 0)
-            : c.which == 1 ? LARExpFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), c.method, &a, &b, &e, &it, -1, 0)
-                           : BiPowerFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), &a, &b, &e, &it, -1, 0);
+            c.which == 0 ? BiExpFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), c.method, &a, &b, &e, &it, -1, 0)
+            : c.which == 1
+                ? LARExpFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), c.method, &a, &b, &e, &it, -1, 0)
+                : BiPowerFit_head(yh.h(), xh.h(), w.h(), 1e-6, g.h(), &a, &b, &e, &it, -1, 0);
         EXPECT_EQ(s, c.status);
         if (s < 0) {
             EXPECT_TRUE(yh.vec().empty() && twtest::IsFailureNaN(a) && twtest::IsFailureNaN(e));
@@ -195,9 +196,10 @@ TEST_P(FitRobust, PolynomialCoefficientsOnlyLeavesBestFit) {
     Array1D<double> fit(V{9, 9}), coef;
     double mse = -7;
     int32_t it = 10;
-    ASSERT_EQ(BiPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 2, Array1D<double>().h(), 0,
-                             Array1D<int32_t>().h(), Array1D<double>().h(), fit.h(), coef.h(), &mse, 1e-6, &it, 1),
-              0);
+    ASSERT_EQ(
+        BiPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 2, Array1D<double>().h(), 0,
+                       Array1D<int32_t>().h(), Array1D<double>().h(), fit.h(), coef.h(), &mse, 1e-6, &it, 1),
+        0);
     EXPECT_EQ(fit.vec(), (V{9, 9}));
     EXPECT_EQ(mse, -7.0);
     EXPECT_EQ(coef.vec().size(), 3u);
@@ -205,16 +207,16 @@ TEST_P(FitRobust, PolynomialCoefficientsOnlyLeavesBestFit) {
     // Every power fixed: no robust fit runs and no refit is counted.
     it = 10;
     ASSERT_EQ(BiPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 1, Array1D<double>().h(), 0,
-                             Array1D<int32_t>({1, 0}).h(), Array1D<double>({2, 1}).h(), fit.h(), coef.h(), &mse, 1e-6,
-                             &it, 0),
+                             Array1D<int32_t>({1, 0}).h(), Array1D<double>({2, 1}).h(), fit.h(), coef.h(),
+                             &mse, 1e-6, &it, 0),
               0);
     EXPECT_EQ(it, 0);
     EXPECT_EQ(coef.vec(), (V{1, 2}));
     EXPECT_EQ(fit.vec(), (V{1, 3, 5, 7, 9, 11}));
     // Order n is too high for six points in both kinds.
     EXPECT_EQ(LARPolyFit_head(Array1D<double>(x).h(), Array1D<double>(y).h(), 6, Array1D<double>().h(), 0,
-                              Array1D<int32_t>().h(), Array1D<double>().h(), fit.h(), coef.h(), &mse, 1e-6, &it, -1,
-                              0),
+                              Array1D<int32_t>().h(), Array1D<double>().h(), fit.h(), coef.h(), &mse, 1e-6,
+                              &it, -1, 0),
               PolyOrderErr);
     EXPECT_TRUE(fit.vec().empty() && coef.vec().empty() && twtest::IsFailureNaN(mse));
 }

@@ -26,10 +26,12 @@ TEST(FitSolver, DifferenceGradientAgreesWithClosedDerivatives) {
         plain.batch = nullptr;
         double q1[3] = {1.5, 0.4, 0.5}, q2[3] = {1.5, 0.4, 0.5}, e1 = 0, e2 = 0, l1 = 0.1, l2 = 0.1;
         int32_t it1 = 200, it2 = 200;
-        const tw::Status s1 = tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 40, kind, closed, q1, upper.data(),
-                                                     lower.data(), &it1, 1e-10, &l1, nullptr, &e1);
-        const tw::Status s2 = tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 40, kind, plain, q2, upper.data(),
-                                                     lower.data(), &it2, 1e-10, &l2, nullptr, &e2);
+        const tw::Status s1 =
+            tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 40, kind, closed, q1, upper.data(),
+                                   lower.data(), &it1, 1e-10, &l1, nullptr, &e1);
+        const tw::Status s2 =
+            tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 40, kind, plain, q2, upper.data(),
+                                   lower.data(), &it2, 1e-10, &l2, nullptr, &e2);
         EXPECT_TRUE(s1 == 0 || s1 == NoConvergenceErr) << s1;
         EXPECT_TRUE(s2 == 0 || s2 == NoConvergenceErr) << s2;
         EXPECT_EQ(q1[1], 0.45);  // held at the bound
@@ -48,8 +50,8 @@ TEST(FitSolver, LambdaAbove10000EndsQuietly) {
     const tw::LmModel m{1, OnlyAtOne, Slope, nullptr, nullptr};
     double q = 1.0, lambda = 1.0, e = 0;
     int32_t it = 100;
-    EXPECT_EQ(tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 4, 0, m, &q, upper.data(), lower.data(), &it, 0,
-                                     &lambda, nullptr, &e),
+    EXPECT_EQ(tw::LevenbergMarquardt(x.data(), y.data(), nullptr, 4, 0, m, &q, upper.data(), lower.data(),
+                                     &it, 0, &lambda, nullptr, &e),
               0);
     EXPECT_EQ(q, 1.0);
     EXPECT_EQ(lambda, 100000.0);
