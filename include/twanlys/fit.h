@@ -118,4 +118,95 @@ TW_API int32_t PredBndGauss_head(Array1DHandle y, Array1DHandle x, Array1DHandle
 TW_API int32_t PredBndPoly_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle coefficients,
                                 double level, Array1DHandle upper, Array1DHandle lower);
 
+/* Robust fits. Bisquare (Bi..., GenBisquareFit...): reweighted least squares with Tukey's biweight
+ * on leverage-adjusted residuals; the error output is the mse at the final parameters with the
+ * caller's |w|. Least absolute residual (LAR..., GenLARFit_head): the error output is the mean of
+ * |(y - f) w|. tolerance (not above 0: 1e-4) ends the loop on a relative change, floor (not above
+ * 0: 1e-12) ends a least-absolute-residual loop, iterations is the limit in and the completed
+ * refits out (GenLARFit_head and LARPolyFit_head only read it). coefficientsOnly non-zero: y stays
+ * as passed, no error output, and the polynomial exports leave the best fit as passed. */
+TW_API int32_t BiLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                double* slope, double* intercept, double* mse, int32_t* iterations,
+                                int32_t coefficientsOnly);
+TW_API int32_t LARLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                 double* slope, double* intercept, double* mae, int32_t* iterations, double floor,
+                                 int32_t coefficientsOnly);
+TW_API int32_t BiPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
+                              Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
+                              Array1DHandle coefficients, double* mse, double tolerance, int32_t* iterations,
+                              int32_t coefficientsOnly);
+TW_API int32_t LARPolyFit_head(Array1DHandle x, Array1DHandle y, int32_t order, Array1DHandle weights, int32_t method,
+                               Array1DHandle fixedPowers, Array1DHandle fixedValues, Array1DHandle bestFit,
+                               Array1DHandle coefficients, double* mae, double tolerance, int32_t* iterations,
+                               double floor, int32_t coefficientsOnly);
+TW_API int32_t BiExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                             Array1DHandle guess, uint16_t method, double* a, double* b, double* mse,
+                             int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t LARExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                              Array1DHandle guess, uint16_t method, double* a, double* b, double* mae,
+                              int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t BiPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                               Array1DHandle guess, double* a, double* b, double* mse, int32_t* iterations,
+                               double floor, int32_t coefficientsOnly);
+TW_API int32_t LARPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                Array1DHandle guess, double* a, double* b, double* mae, int32_t* iterations,
+                                double floor, int32_t coefficientsOnly);
+TW_API int32_t BiLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
+                             double* a, double* b, double* mse, int32_t* iterations, int32_t coefficientsOnly);
+TW_API int32_t LARLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double base, double tolerance,
+                              double* a, double* b, double* mae, int32_t* iterations, double floor,
+                              int32_t coefficientsOnly);
+TW_API int32_t BiGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                               Array1DHandle guess, double* amplitude, double* centre, double* deviation, double* mse,
+                               int32_t* iterations, double floor, int32_t coefficientsOnly);
+TW_API int32_t LARGaussFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                Array1DHandle guess, double* amplitude, double* centre, double* deviation,
+                                double* mae, int32_t* iterations, double floor, int32_t coefficientsOnly);
+/* h is n by k; weights of length 0 or n. GenBisquareFit_Weight_head hands back the last refit's
+ * weights (robust times |w|) in weights, filled with 1.0 first when it came empty. */
+TW_API int32_t GenBisquareFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                                   int32_t covarianceWanted, double tolerance, int32_t* iterations,
+                                   Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                                   double* mse);
+TW_API int32_t GenBisquareFit_Weight_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                                          int32_t covarianceWanted, double tolerance, int32_t* iterations,
+                                          Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                                          double* mse);
+TW_API int32_t GenLARFit_head(Array2DHandle h, Array1DHandle y, Array1DHandle weights, int32_t method,
+                              int32_t covarianceWanted, double tolerance, double floor, int32_t* iterations,
+                              Array1DHandle coefficients, Array1DHandle bestFit, Array2DHandle covariance,
+                              double* mae);
+
+/* Bounded fits: each parameter between lower and upper (arrays of equal length, at least the
+ * parameter count, or both empty for no bounds; infinities mean no bound, equal bounds fix the
+ * parameter). Models a exp(b x) + c, a x^b + c, a exp(-0.5 ((x - m) / s)^2) + o, a log_base(b x)
+ * and a x + b. errorKind: 0 least squares, 1 least absolute residual, 2 bisquare. y in, fit out.
+ * iterations is read only (0 is written for empty data). A limit reached without convergence
+ * returns -20062 with the outputs standing. */
+TW_API int32_t BoundExpFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                uint16_t errorKind, double* a, double* b, double* c, double* mse);
+TW_API int32_t BoundPowerFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                  int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                  uint16_t errorKind, double* a, double* b, double* c, double* mse);
+TW_API int32_t BoundGaussianFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                     int32_t* iterations, Array1DHandle guess, Array1DHandle lower,
+                                     Array1DHandle upper, uint16_t errorKind, double* amplitude, double* centre,
+                                     double* deviation, double* offset, double* mse);
+TW_API int32_t BoundLogFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                int32_t* iterations, Array1DHandle guess, Array1DHandle lower, Array1DHandle upper,
+                                uint16_t errorKind, double base, double* a, double* b, double* mse);
+TW_API int32_t BoundLinearFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle lower,
+                                   Array1DHandle upper, double* slope, double* intercept, double* mse);
+TW_API int32_t BoundLinearFitBi_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                     int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
+                                     double* intercept, double* mse);
+TW_API int32_t BoundLinearFitLAR_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, double tolerance,
+                                      int32_t* iterations, Array1DHandle lower, Array1DHandle upper, double* slope,
+                                      double* intercept, double* mae);
+/* One damped step for a host-side iteration: coefficients += (alpha with its diagonal times
+ * (lambda + 1))^-1 beta; alpha k by k, beta k. The status is stored through status and returned. */
+TW_API int32_t GetNewCoef_head(Array1DHandle coefficients, Array2DHandle alpha, Array1DHandle beta, double* lambda,
+                               int32_t* status);
+
 #endif
