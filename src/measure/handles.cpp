@@ -24,7 +24,8 @@ Status FetchMeasurement(int32_t selector, References refs, const LevelSettings& 
                             ls.strict, nullptr);
         // Peak and histogram selectors run low, high, amplitude; the automatic ones high, low, amplitude.
         const double peak[3] = {low, high, amplitude}, automatic[3] = {high, low, amplitude};
-        v = (selector >= 6 ? automatic : peak)[selector % 3];
+        const double* row = selector >= 6 ? automatic : peak;
+        v = row[selector % 3];
     } else if (selector >= 9 && selector <= 12) {
         double h = 0;
         s = ReferenceLevels(x, n, t0, dt, &refs, ls, &h);
