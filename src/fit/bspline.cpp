@@ -113,6 +113,11 @@ Status BSplineFitCore(double* data, int32_t n, int32_t c, const double* w, const
             if (w[i] == 0) return DegenerateDataErr;
     const size_t nn = static_cast<size_t>(n), mm = static_cast<size_t>(m), cc = static_cast<size_t>(c),
                  dd = static_cast<size_t>(degree) + 1;
+    // Sizes beyond any memory are refused before the byte counts could overflow.
+    if (8.0 * (static_cast<double>(nn) * static_cast<double>(dd) +
+               static_cast<double>(mm) * static_cast<double>(mm)) >
+        0x1p60)
+        return OutOfMemoryErr;
     Scratch<double> block, gram;
     Scratch<int32_t> spans;
     if (block.Allocate(nn + mm + dd + nn * dd + 2 * dd + mm * cc + cc) != 0 || gram.Allocate(mm * mm) != 0 ||
