@@ -209,4 +209,44 @@ TW_API int32_t BoundLinearFitLAR_head(Array1DHandle y, Array1DHandle x, Array1DH
 TW_API int32_t GetNewCoef_head(Array1DHandle coefficients, Array2DHandle alpha, Array1DHandle beta, double* lambda,
                                int32_t* status);
 
+/* ---- Splines, interpolation and outlier removal -----------------------------------------------
+ * Interpolating cubic spline: Spline_head gives the second derivatives y2 of the spline through
+ * (x, y), x ascending or descending without repeats; an end slope at or above 9.9e29 makes that
+ * end natural. SpInterp_head evaluates the table at xi (end intervals extrapolate); it takes
+ * pointers to the three handles. Status through the last argument, result 0; the f64 results are
+ * NaN on failure. */
+TW_API int32_t Spline_head(Array1DHandle y, Array1DHandle x, double* startSlope, double* endSlope, Array1DHandle y2,
+                           int32_t* status);
+TW_API int32_t SpInterp_head(Array1DHandle* y, Array1DHandle* x, Array1DHandle* y2, double* xi, double* yi,
+                             int32_t* status);
+/* The polynomial (Neville) or diagonal rational function (Bulirsch-Stoer) through all points at
+ * xi, with the last tableau correction as error estimate. */
+TW_API int32_t PolyInterp_head(Array1DHandle y, Array1DHandle x, double* xi, double* yi, double* errorEstimate,
+                               int32_t* status);
+TW_API int32_t RatInterp_head(Array1DHandle y, Array1DHandle x, double* xi, double* yi, double* errorEstimate,
+                              int32_t* status);
+/* Cubic smoothing spline; y in, fit out. smoothness 1 interpolates, 0 gives the least-squares
+ * line, outside 0..1 means 8 / (8 + ((x[n-1] - x[0]) / n)^3). weights of length n or 0, balance
+ * (per interval) of n - 1 or 0. error is p sum (y - f)^2, unweighted, plus (1 - p) times the
+ * integral of the squared second derivative of the fit (each interval's share times |balance|). */
+TW_API int32_t CubicSplineFit_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle balance,
+                                   double smoothness, double* error);
+/* Least-squares B-spline curve of the given degree with m control points through the n by c data
+ * (in, fit out). parameters (n, non-descending) or parameterisation 0 uniform, 1 chord length,
+ * 2 centripetal; clamped knots averaged over the parameters. control points m by c out. */
+TW_API int32_t BSplineFit_head(Array2DHandle data, Array1DHandle weights, Array1DHandle parameters, int32_t degree,
+                               int32_t controlCount, uint16_t parameterisation, Array2DHandle controlPoints,
+                               double* mse);
+/* Outlier removal. Range selector 0 limits y, 1 limits x, 2 both (range x pair then y pair); the
+ * limits of a pair in either order. Only values strictly between the limits stay, except that a y
+ * equal to the high limit of selector 2 stays; NaN samples leave. The kept samples are copied in
+ * order (weights kept empty without weights); the removed sample numbers (0-based) or the mask
+ * (u8, 1 = removed) come out too. */
+TW_API int32_t RmvOutlierRng_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle range,
+                                  uint16_t selector, Array1DHandle yKept, Array1DHandle xKept, Array1DHandle weightsKept,
+                                  Array1DHandle removed);
+TW_API int32_t RmvOutlierIndx_head(Array1DHandle y, Array1DHandle x, Array1DHandle weights, Array1DHandle indices,
+                                   Array1DHandle yKept, Array1DHandle xKept, Array1DHandle weightsKept,
+                                   Array1DHandle mask);
+
 #endif
