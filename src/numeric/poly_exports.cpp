@@ -18,6 +18,12 @@ void CopyOut(T* dst, const T* src, int32_t count) {
     if (count > 0) std::memcpy(static_cast<void*>(dst), src, Sz(count) * sizeof(T));
 }
 
+// Any failed resize, the host's own status or a failed staging copy, is out of memory.
+template <class T>
+Status Out(Frame& f, Handle& h, int32_t n, T** data) {
+    return f.Resize(h, n, data) != 0 ? OutOfMemoryErr : 0;
+}
+
 template <bool TwoD>
 Status Evaluate(Handle& x, Handle c) {
     Frame f;
@@ -43,7 +49,7 @@ Status Multiply(Handle a, Handle b, Handle& product) {
     if (s == 0) s = f.In(a, &pa);
     if (s == 0) s = f.In(b, &pb);
     cdouble* out = nullptr;
-    if (s == 0) s = f.Resize(product, na + nb - 1, &out);
+    if (s == 0) s = Out(f, product, na + nb - 1, &out);
     if (s == 0) PolyMultiply<T>(pa, na, pb, nb, reinterpret_cast<T*>(out));
     return f.Finish(s);
 }
@@ -55,7 +61,7 @@ Status Refine(Handle c, Handle real, int32_t newtonLimit, double newtonTol, Hand
     const int32_t n = Count(c), nr = std::max(Count(real), 0), nx = std::max(Count(cx), 0);
     cdouble* out = nullptr;
     if (n < 1) {
-        const Status s = f.Resize(roots, 0, &out);
+        const Status s = Out(f, roots, 0, &out);
         return f.Finish(s != 0 ? s : EmptyInputWarn);
     }
     const double *pc = nullptr, *pr = nullptr;
@@ -63,7 +69,7 @@ Status Refine(Handle c, Handle real, int32_t newtonLimit, double newtonTol, Hand
     Status s = f.In(c, &pc);
     if (s == 0) s = f.In(real, &pr);
     if (s == 0) s = f.In(cx, &px);
-    if (s == 0) s = f.Resize(roots, nr + nx, &out);
+    if (s == 0) s = Out(f, roots, nr + nx, &out);
     if (s == 0)
         s = PolyRootsRefine(pc, n, pr, nr, newtonLimit, newtonTol, px, nx, bairstowLimit, bairstowTol, out);
     return f.Finish(s);
@@ -83,7 +89,7 @@ Status AllRoots(Handle& c, const int32_t* option) {
         s = CxPolyRoots(work.get(), n, option != nullptr ? *option : 100, &count);
     }
     cdouble* out = nullptr;
-    if (s == 0) s = f.Resize(c, count, &out);
+    if (s == 0) s = Out(f, c, count, &out);
     if (s == 0) CopyOut(out, work.get(), count);
     return f.Finish(MergeRelease(s, work.Release()));
 }
@@ -106,8 +112,8 @@ Status MultipleRoots(Handle c, int32_t option, double tol, Handle& roots, double
     if (s == 0) s = MultPolyRoots<T>(pc, n, option, tol, r.get(), m.get(), &count, &res);
     cdouble* pr = nullptr;
     int32_t* pm = nullptr;
-    if (s == 0) s = f.Resize(roots, count, &pr);
-    if (s == 0) s = f.Resize(mult, count, &pm);
+    if (s == 0) s = Out(f, roots, count, &pr);
+    if (s == 0) s = Out(f, mult, count, &pm);
     if (s == 0) {
         CopyOut(pr, r.get(), count);
         CopyOut(pm, m.get(), count);
@@ -136,9 +142,9 @@ Status Divisor(Handle a, Handle b, double tol, Handle& gcd, Handle& qa, Handle& 
     T* v = u + na;
     if (s == 0) s = PolyGcd<T>(pa, na, pb, nb, tol, g, &ng, u, &nu, v, &nv, &res);
     T *pg = nullptr, *pu = nullptr, *pv = nullptr;
-    if (s == 0) s = f.Resize(gcd, ng, &pg);
-    if (s == 0) s = f.Resize(qa, nu, &pu);
-    if (s == 0) s = f.Resize(qb, nv, &pv);
+    if (s == 0) s = Out(f, gcd, ng, &pg);
+    if (s == 0) s = Out(f, qa, nu, &pu);
+    if (s == 0) s = Out(f, qb, nv, &pv);
     if (s == 0) {
         CopyOut(pg, g, ng);
         CopyOut(pu, u, nu);
