@@ -22,10 +22,17 @@ inline cdouble Mul(cdouble a, cdouble b) {
     return {a.real() * b.real() - a.imag() * b.imag(), a.real() * b.imag() + a.imag() * b.real()};
 }
 
+// Magnitudes safe from overflow and underflow of the squares: coefficients may span the range.
+inline double Abs(double x) { return std::fabs(x); }
+inline double Abs(cdouble z) { return std::abs(z); }
+
 template <class T> double Norm(const T* x, int32_t n) {
+    double big = 0;
+    for (int32_t i = 0; i < n; ++i) big = std::max(big, Abs(x[i]));
+    if (!(big > 0) || !std::isfinite(big)) return big;
     double s = 0;
-    for (int32_t i = 0; i < n; ++i) s += Abs2(x[i]);
-    return std::sqrt(s);
+    for (int32_t i = 0; i < n; ++i) s += Abs2(x[i] / big);
+    return big * std::sqrt(s);
 }
 
 // Index of the highest non-zero coefficient, -1 when all are 0.
@@ -34,19 +41,19 @@ template <class T> int32_t Degree(const T* c, int32_t n) {
     return n - 1;
 }
 
-// p(z), p'(z) and sum |a_k| |z|^k by Horner's rule on the degree-d polynomial a.
+// p(z), p'(z) and sum |a_k| |z|^k by Horner's rule on the degree-d polynomial a; mag holds |a_k|.
 struct Value {
     cdouble p, dp;
     double bound;
 };
-Value Horner(const cdouble* a, int32_t d, cdouble z) {
-    const double az = Magnitude(z);
+Value Horner(const cdouble* a, const double* mag, int32_t d, cdouble z) {
+    const double az = Abs(z);
     cdouble p = a[d], dp = 0;
-    double e = Magnitude(a[d]);
+    double e = mag[d];
     for (int32_t k = d - 1; k >= 0; --k) {
         dp = Mul(dp, z) + p;
         p = Mul(p, z) + a[k];
-        e = e * az + Magnitude(a[k]);
+        e = e * az + mag[k];
     }
     return {p, dp, e};
 }
@@ -62,7 +69,7 @@ double HornerReal(const double* a, int32_t n, double x) {
 // from the product, with Smith's division throughout.
 void Quadratic(cdouble a0, cdouble a1, cdouble a2, cdouble* r) {
     const cdouble h = Divide(a1, a2) * -0.5, c = Divide(a0, a2);
-    const double s = std::max(Magnitude(h), std::sqrt(Magnitude(c)));
+    const double s = std::max(Abs(h), std::sqrt(Abs(c)));
     if (s == 0) {
         r[0] = r[1] = 0;
         return;
@@ -78,24 +85,25 @@ void Quadratic(cdouble a0, cdouble a1, cdouble a2, cdouble* r) {
 // the start lies inside the smallest root magnitude, steps grow by at most 3, a step that does
 // not lower |p| is halved, then turned by (-0.3, 0.4). Only improving iterates are taken, so the
 // one returned has the least |p| met.
-cdouble SearchRoot(const cdouble* a, int32_t d, int32_t limit) {
-    const double l0 = std::log(Magnitude(a[0]));
+cdouble SearchRoot(const cdouble* a, int32_t d, int32_t limit, double* mag) {
+    for (int32_t k = 0; k <= d; ++k) mag[k] = Abs(a[k]);
+    const double l0 = std::log(mag[0]);
     double radius = kInf;
     for (int32_t k = 1; k <= d; ++k)
-        if (a[k] != 0.0) radius = std::min(radius, std::exp((l0 - std::log(Magnitude(a[k]))) / k));
+        if (mag[k] != 0) radius = std::min(radius, std::exp((l0 - std::log(mag[k])) / k));
     radius *= 0.5;
     cdouble dz = a[1] != 0.0 ? Divide(-a[0], a[1]) : cdouble(1.0);
-    dz *= radius / Magnitude(dz);
-    if (!std::isfinite(Magnitude(dz))) dz = 1.0;
+    dz = dz / Abs(dz) * radius;
+    if (!std::isfinite(Abs(dz)) || dz == 0.0) dz = 1.0;
     const double accept = 16.0 * d * kEps;
     cdouble z0 = 0;
-    double f0 = Magnitude(a[0]);
+    double f0 = mag[0];
     int32_t rejects = 0;
     for (int32_t it = 0; it < limit; ++it) {
         const cdouble z = z0 + dz;
         if (z == z0) break;
-        const Value v = Horner(a, d, z);
-        const double f = Magnitude(v.p);
+        const Value v = Horner(a, mag, d, z);
+        const double f = Abs(v.p);
         if (f < f0) {
             z0 = z;
             f0 = f;
@@ -103,7 +111,7 @@ cdouble SearchRoot(const cdouble* a, int32_t d, int32_t limit) {
             if (f <= accept * v.bound) break;
             if (v.dp != 0.0) {
                 cdouble step = -Divide(v.p, v.dp);
-                const double ms = Magnitude(step), md = Magnitude(dz);
+                const double ms = Abs(step), md = Abs(dz);
                 if (ms > 3 * md) step *= 3 * md / ms;
                 dz = step;
             } else {
@@ -308,7 +316,7 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
                 g[0] = -Mul(roots[r], g[0]);
                 ++len;
             }
-        for (int32_t k = 0; k < e; ++k) w[k] = (g[k] - target[k]) / std::max(1.0, Magnitude(target[k]));
+        for (int32_t k = 0; k < e; ++k) w[k] = (g[k] - target[k]) / std::max(1.0, Abs(target[k]));
         const double now = Norm(w, e);
         if (!std::isfinite(now)) return NoConvergenceErr;
         if (!(now < bestRes)) break;
@@ -318,7 +326,7 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
         for (int32_t r = 0; r < distinct; ++r) {
             cdouble carry = g[e];
             for (int32_t k = e - 1; k >= 0; --k) {
-                jac[Sz(k) * Sz(distinct) + Sz(r)] = -static_cast<double>(mult[r]) * carry / std::max(1.0, Magnitude(target[k]));
+                jac[Sz(k) * Sz(distinct) + Sz(r)] = -static_cast<double>(mult[r]) * carry / std::max(1.0, Abs(target[k]));
                 carry = g[k] + Mul(roots[r], carry);
             }
         }
@@ -490,15 +498,19 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
     while (c[zeros] == 0.0) ++zeros;
     const int32_t d = n - 1 - zeros;
     Scratch<cdouble> work;
-    if (work.Allocate(2 * Sz(d + 1) + Sz(d)) != 0) return OutOfMemoryErr;
+    Scratch<double> mags;
+    if (work.Allocate(2 * Sz(d + 1) + Sz(d)) != 0 || mags.Allocate(2 * Sz(d + 1)) != 0) return OutOfMemoryErr;
     cdouble* a = work.get();
     cdouble* orig = a + (d + 1);
     cdouble* r = orig + (d + 1);
+    double* mag = mags.get();
+    double* origMag = mag + (d + 1);
     std::copy(c + zeros, c + n, a);
     std::copy(c + zeros, c + n, orig);
+    for (int32_t k = 0; k <= d; ++k) origMag[k] = Abs(orig[k]);
     int32_t deg = d, found = 0;
     for (; deg > 2; --deg) {
-        const cdouble z = a[0] == 0.0 ? cdouble(0) : SearchRoot(a, deg, limit);
+        const cdouble z = a[0] == 0.0 ? cdouble(0) : SearchRoot(a, deg, limit, mag);
         r[found++] = z;
         Deflate(a, deg, z);
     }
@@ -511,11 +523,11 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
     // Polish on the undeflated polynomial, each step kept only while |p| falls.
     for (int32_t i = 0; i < found; ++i) {
         cdouble z = r[i];
-        Value v = Horner(orig, d, z);
+        Value v = Horner(orig, origMag, d, z);
         for (int32_t s = 0; s < 2 && v.dp != 0.0; ++s) {
             const cdouble next = z - Divide(v.p, v.dp);
-            const Value w = Horner(orig, d, next);
-            if (!(Magnitude(w.p) < Magnitude(v.p))) break;
+            const Value w = Horner(orig, origMag, d, next);
+            if (!(Abs(w.p) < Abs(v.p))) break;
             z = next;
             v = w;
         }
@@ -582,9 +594,8 @@ Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g,
         const T* x = side == 0 ? a : b;
         const int32_t dx = side == 0 ? da : db;
         PolyMultiply(g, *ng, side == 0 ? u : v, side == 0 ? *nu : *nv, prod.get());
-        double diff = 0;
-        for (int32_t i = 0; i <= dx; ++i) diff += Abs2(x[i] - prod[Sz(i)]);
-        worst = std::max(worst, std::sqrt(diff) / Norm(x, dx + 1));
+        for (int32_t i = 0; i <= dx; ++i) prod[Sz(i)] = x[i] - prod[Sz(i)];
+        worst = std::max(worst, Norm(prod.get(), dx + 1) / Norm(x, dx + 1));
     }
     *residual = worst;
     return 0;
@@ -637,11 +648,16 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
         Status st = NoConvergenceErr;
         int32_t found = 0;
         for (int32_t attempt = 0; attempt < 2 && st != 0; ++attempt) {
-            double t = std::exp((std::log(Magnitude(p[0])) - std::log(Magnitude(p[e]))) / e);
+            // Magnitudes through logarithms, so that no intermediate overflows.
+            const double l0 = std::log(Abs(p[0])), lt = (l0 - std::log(Abs(p[e]))) / e;
+            double t = std::exp(lt);
             bool ok = attempt == 0 && std::isfinite(t) && t > 0;
+            const cdouble phase0 = p[0] / Abs(p[0]);
             if (ok)
                 for (int32_t i = 0; i <= e; ++i) {
-                    q[i] = Divide(p[i], p[0]) * std::pow(t, i);
+                    const double mag = Abs(p[i]);
+                    q[i] = mag == 0 ? cdouble(0)
+                                    : Divide(p[i] / mag, phase0) * std::exp(std::log(mag) - l0 + i * lt);
                     ok = ok && std::isfinite(q[i].real()) && std::isfinite(q[i].imag());
                 }
             if (!ok) {
@@ -676,7 +692,7 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
             int32_t pick = -1;
             double best = im;
             for (int32_t j = i + 1; j < s; ++j) {
-                if (mult[j] != mult[i] || roots[j].imag() * roots[i].imag() >= 0) continue;
+                if (mult[j] != mult[i] || roots[j].imag() == 0 || (roots[j].imag() < 0) == (roots[i].imag() < 0)) continue;
                 const double dist = std::abs(roots[j] - std::conj(roots[i]));
                 if (dist < best) {
                     best = dist;
@@ -708,10 +724,9 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
             g[0] = -Mul(roots[r], g[0]);
             ++len;
         }
-    double diff = 0;
     const cdouble lead = c[d];
-    for (int32_t i = 0; i <= d; ++i) diff += Abs2(cdouble(c[i]) - Mul(lead, g[i]));
-    *residual = std::sqrt(diff) / Norm(c, d + 1);
+    for (int32_t i = 0; i <= d; ++i) g[i] = cdouble(c[i]) - Mul(lead, g[i]);
+    *residual = Norm(g, d + 1) / Norm(c, d + 1);
     *count = s;
     return 0;
 }
