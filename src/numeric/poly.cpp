@@ -6,6 +6,7 @@
 #include <limits>
 
 #include "matrix/decompose.hpp"
+#include "matrix/eigen.hpp"
 #include "matrix/solve.hpp"
 
 namespace tw {
@@ -256,6 +257,7 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
     cdouble* target = jac + n1 * n1;
     cdouble* step = target + n1;
     std::copy(q, q + e + 1, f);
+    const double gcdTol = 100 * tol;
     int32_t deg = e, distinct = 0, total = 0;
     for (int32_t j = 1; deg >= 1; ++j) {
         for (int32_t i = 1; i <= deg; ++i) fd[i - 1] = f[i] * static_cast<double>(i);
@@ -266,7 +268,7 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
             ng = 1;
             std::copy(f, f + 2, u);
             nu = 2;
-        } else if (const Status st = PolyGcd<cdouble>(f, deg + 1, fd, deg, 100 * tol, g, &ng, u, &nu, v, &nv, &res);
+        } else if (const Status st = PolyGcd<cdouble>(f, deg + 1, fd, deg, gcdTol, g, &ng, u, &nu, v, &nv, &res);
                    st < 0) {
             return st;
         }
@@ -304,18 +306,21 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
     if (total != e) return NoConvergenceErr;
     // Gauss-Newton: weighted coefficients of prod (x - z_i)^{m_i} against the monic target.
     for (int32_t k = 0; k < e; ++k) target[k] = q[k] / q[e];
-    double bestRes = kInf;
-    for (int32_t it = 0; it < 20; ++it) {
-        // g = the product, w = its residual.
+    target[e] = 1.0;
+    const auto product = [&](const cdouble* z) {
         g[0] = 1.0;
         int32_t len = 1;
         for (int32_t r = 0; r < distinct; ++r)
             for (int32_t t = 0; t < mult[r]; ++t) {
                 g[len] = 0;
-                for (int32_t k = len; k >= 1; --k) g[k] = g[k - 1] - Mul(roots[r], g[k]);
-                g[0] = -Mul(roots[r], g[0]);
+                for (int32_t k = len; k >= 1; --k) g[k] = g[k - 1] - Mul(z[r], g[k]);
+                g[0] = -Mul(z[r], g[0]);
                 ++len;
             }
+    };
+    double bestRes = kInf;
+    for (int32_t it = 0; it < 20; ++it) {
+        product(roots);
         for (int32_t k = 0; k < e; ++k) w[k] = (g[k] - target[k]) / std::max(1.0, Abs(target[k]));
         const double now = Norm(w, e);
         if (!std::isfinite(now)) return NoConvergenceErr;
@@ -343,6 +348,11 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
             break;
         }
     }
+    // A structure whose best fit misses the polynomial by more than the divisor tolerance is
+    // not the polynomial's: close simple roots had passed for a multiple one.
+    product(v);
+    for (int32_t k = 0; k <= e; ++k) w[k] = g[k] - target[k];
+    if (!(Norm(w, e + 1) <= gcdTol * Norm(target, e + 1))) return NoConvergenceErr;
     std::copy(v, v + distinct, roots);
     *s = distinct;
     return 0;
@@ -675,10 +685,16 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
             if (st == OutOfMemoryErr) return st;
         }
         if (st != 0) {
-            // No consistent structure: all roots as simple ones.
-            std::copy(p, p + e + 1, q);
-            if (const Status s2 = CxPolyRoots(q, e + 1, limit, &found); s2 < 0) return s2;
-            std::copy(q, q + found, rs);
+            // No consistent structure: all roots as simple ones, the eigenvalues of the companion
+            // matrix, which split a cluster evenly about its centre.
+            Scratch<cdouble> comp;
+            if (comp.Allocate(Sz(e) * Sz(e)) != 0) return OutOfMemoryErr;
+            cdouble* m = comp.get();
+            std::fill(m, m + Sz(e) * Sz(e), cdouble(0));
+            for (int32_t j = 0; j < e; ++j) m[Sz(j)] = -Divide(p[e - 1 - j], p[e]);
+            for (int32_t i = 1; i < e; ++i) m[Sz(i) * Sz(e) + Sz(i - 1)] = 1.0;
+            if (const Status s2 = CxGeneralEigen(m, e, 0, rs, nullptr); s2 < 0) return s2;
+            found = e;
             std::fill(ms, ms + found, 1);
         }
         s += found;

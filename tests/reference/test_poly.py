@@ -223,6 +223,17 @@ class MultipleRoots(unittest.TestCase):
                     self.assertEqual(r[i + 1], np.conj(r[i]))
                 self.assertTrue(np.all((r.imag >= 0) | (np.roll(r.imag, 1) > 0)))
 
+    def test_clustered_roots_keep_a_small_residual(self):
+        # Doubles among close simple roots: whatever structure is found must reproduce the polynomial.
+        rng = np.random.default_rng(0)
+        for deg in (10, 20, 30):
+            roots = np.concatenate([np.repeat(rng.uniform(-2, 2, deg // 3), 2), rng.uniform(-2, 2, deg - 2 * (deg // 3))])
+            c = npp.polyfromroots(roots)
+            st, r, m, res = mult_roots(c)
+            self.assertEqual((st, m.sum()), (0, deg))
+            own = np.linalg.norm(c - c[-1] * npp.polyfromroots(np.repeat(r, m))) / np.linalg.norm(c)
+            self.assertLess(max(res, own), 1e-10, deg)
+
     def test_statuses(self):
         for c, want in (([], -20003), ([1.0, np.inf], -20063), ([0.0, 0], -20111), ([5.0, 0], -20021)):
             st, r, m, res = mult_roots(np.array(c))
