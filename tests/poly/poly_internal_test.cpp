@@ -1,5 +1,5 @@
-// The polynomial cores as filter design calls them: denominators of fourth-order sections split
-// into their two conjugate pairs, and all roots of a real polynomial over its coefficients.
+// The multiple-root core as filter design calls it: denominators of fourth-order sections split
+// into their two conjugate pairs, listed side by side.
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -42,32 +42,6 @@ TEST(PolyCores, QuarticSectionsSplitIntoPairs) {
             EXPECT_GT(std::abs(roots[0] - roots[2]), 1e-3);
         }
     }
-}
-
-TEST(PolyCores, AllRootsOverTheCoefficients) {
-    // x^2 (x - 0.5)(x + 4)(x^2 + 2x + 5), padded with two zero high coefficients.
-    std::vector<double> p{1}, f1{-0.5, 1}, f2{4, 1}, f3{5, 2, 1};
-    std::vector<double> t(3), u(5);
-    tw::PolyMultiply(f1.data(), 2, f2.data(), 2, t.data());
-    tw::PolyMultiply(t.data(), 3, f3.data(), 3, u.data());
-    cdouble c[9] = {0, 0, u[0], u[1], u[2], u[3], u[4], 0, 0};
-    int32_t count = 0;
-    ASSERT_EQ(tw::CxPolyRoots(c, 9, 100, &count), 0);
-    ASSERT_EQ(count, 6);
-    EXPECT_EQ(c[0], 0.0);
-    EXPECT_EQ(c[1], 0.0);
-    const cdouble want[4] = {0.5, -4.0, {-1, 2}, {-1, -2}};
-    for (const cdouble& w : want) {
-        double best = 1;
-        for (int32_t i = 2; i < 6; ++i) best = std::min(best, std::abs(c[i] - w));
-        EXPECT_LT(best, 1e-13) << w;
-    }
-    for (int32_t i = 2; i < 6; ++i)
-        if (std::abs(c[i].imag()) < 1) {
-            EXPECT_LT(std::abs(c[i].imag()), 1e-8);
-        }
-    cdouble constant[3] = {3, 0, 0};
-    EXPECT_EQ(tw::CxPolyRoots(constant, 3, 100, &count), TermsBelowOneErr);
 }
 
 }  // namespace
