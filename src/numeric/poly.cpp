@@ -36,6 +36,27 @@ template <class T> double Norm(const T* x, int32_t n) {
     return big * std::sqrt(s);
 }
 
+// Exact scaling by powers of two: b_k = a_k 2^(k s - shift), with s making |b_0| and |b_d| of one
+// size and shift bringing the largest |b_k| near 1, so that none overflows (what underflows is
+// negligible beside it). Roots scale back by 2^s without rounding.
+struct PowerScale {
+    int32_t s, shift;
+};
+PowerScale Balance(const cdouble* a, int32_t d) {
+    const int e0 = std::ilogb(Abs(a[0])), ed = std::ilogb(Abs(a[d]));
+    const auto s = static_cast<int32_t>(std::lround(static_cast<double>(e0 - ed) / d));
+    int64_t top = INT32_MIN;
+    for (int32_t k = 0; k <= d; ++k)
+        if (a[k] != 0.0) top = std::max(top, std::ilogb(Abs(a[k])) + int64_t{k} * s);
+    return {s, static_cast<int32_t>(std::clamp<int64_t>(top, -100000, 100000))};
+}
+int Exponent(int64_t e) { return static_cast<int>(std::clamp<int64_t>(e, -100000, 100000)); }
+cdouble Ldexp(cdouble z, int64_t e) { return {std::ldexp(z.real(), Exponent(e)), std::ldexp(z.imag(), Exponent(e))}; }
+cdouble ScaledCoefficient(cdouble a, int32_t k, PowerScale ps) {
+    return Ldexp(a, int64_t{k} * ps.s - ps.shift);
+}
+bool Finite(cdouble z) { return std::isfinite(z.real()) && std::isfinite(z.imag()); }
+
 // Index of the highest non-zero coefficient, -1 when all are 0.
 template <class T> int32_t Degree(const T* c, int32_t n) {
     while (n > 0 && c[n - 1] == T(0)) --n;
@@ -515,8 +536,9 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
     cdouble* r = orig + (d + 1);
     double* mag = mags.get();
     double* origMag = mag + (d + 1);
-    std::copy(c + zeros, c + n, a);
-    std::copy(c + zeros, c + n, orig);
+    // The search runs on an exactly rescaled copy, so that no coefficient range overflows it.
+    const PowerScale ps = Balance(c + zeros, d);
+    for (int32_t k = 0; k <= d; ++k) a[k] = orig[k] = ScaledCoefficient(c[zeros + k], k, ps);
     for (int32_t k = 0; k <= d; ++k) origMag[k] = Abs(orig[k]);
     int32_t deg = d, found = 0;
     for (; deg > 2; --deg) {
@@ -541,7 +563,8 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
             z = next;
             v = w;
         }
-        r[i] = z;
+        r[i] = Ldexp(z, ps.s);
+        if (!Finite(r[i])) return NoConvergenceErr;
     }
     std::fill(c, c + zeros, cdouble(0));
     std::copy(r, r + found, c + zeros);
@@ -592,24 +615,104 @@ Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g,
                               : GcdCore(pa, ea, pb, eb, tol, core.get(), &dg, u, v);
         if (s < 0) return s;
     }
-    std::fill(g, g + low, T(0));
-    std::copy(core.get(), core.get() + dg + 1, g + low);
-    *ng = low + dg + 1;
-    *nu = ea - dg + 1;
-    *nv = eb - dg + 1;
     Scratch<T> prod;
     if (prod.Allocate(Sz(std::max(da, db) + 1)) != 0) return OutOfMemoryErr;
-    double worst = 0;
-    for (int32_t side = 0; side < 2; ++side) {
-        const T* x = side == 0 ? a : b;
-        const int32_t dx = side == 0 ? da : db;
-        PolyMultiply(g, *ng, side == 0 ? u : v, side == 0 ? *nu : *nv, prod.get());
-        for (int32_t i = 0; i <= dx; ++i) prod[Sz(i)] = x[i] - prod[Sz(i)];
-        worst = std::max(worst, Norm(prod.get(), dx + 1) / Norm(x, dx + 1));
+    for (int32_t pass = 0; pass < 2; ++pass) {
+        std::fill(g, g + low, T(0));
+        std::copy(core.get(), core.get() + dg + 1, g + low);
+        *ng = low + dg + 1;
+        *nu = ea - dg + 1;
+        *nv = eb - dg + 1;
+        double worst = 0;
+        for (int32_t side = 0; side < 2; ++side) {
+            const T* x = side == 0 ? a : b;
+            const int32_t dx = side == 0 ? da : db;
+            PolyMultiply(g, *ng, side == 0 ? u : v, side == 0 ? *nu : *nv, prod.get());
+            for (int32_t i = 0; i <= dx; ++i) prod[Sz(i)] = x[i] - prod[Sz(i)];
+            worst = std::max(worst, Norm(prod.get(), dx + 1) / Norm(x, dx + 1));
+        }
+        *residual = worst;
+        // A divisor found on the normalised pair that does not divide the caller's operands (their
+        // coefficient ranges hid it) gives way to the trivial one.
+        if (worst <= 100 * tol) break;
+        dg = 0;
+        core[0] = 1.0;
+        std::copy(pa, pa + ea + 1, u);
+        std::copy(pb, pb + eb + 1, v);
     }
-    *residual = worst;
     return 0;
 }
+
+namespace {
+
+// All roots as simple ones: the eigenvalues of the companion matrix of the rescaled copy, which
+// split a cluster evenly about its centre.
+Status CompanionRoots(const cdouble* p, int32_t e, PowerScale ps, cdouble* roots) {
+    Scratch<cdouble> work;
+    if (work.Allocate(Sz(e) * Sz(e) + Sz(e + 1)) != 0) return OutOfMemoryErr;
+    cdouble* m = work.get();
+    cdouble* q = m + Sz(e) * Sz(e);
+    for (int32_t i = 0; i <= e; ++i) q[i] = ScaledCoefficient(p[i], i, ps);
+    std::fill(m, m + Sz(e) * Sz(e), cdouble(0));
+    for (int32_t j = 0; j < e; ++j) m[Sz(j)] = -Divide(q[e - 1 - j], q[e]);
+    for (int32_t i = 1; i < e; ++i) m[Sz(i) * Sz(e) + Sz(i - 1)] = 1.0;
+    if (const Status s = CxGeneralEigen(m, e, 0, roots, nullptr); s < 0) return s == OutOfMemoryErr ? s : NoConvergenceErr;
+    for (int32_t i = 0; i < e; ++i) roots[i] = Ldexp(roots[i], ps.s);
+    return 0;
+}
+
+// Conjugate pairs side by side, positive imaginary part first, exactly conjugate; a root without
+// a closer conjugate partner than its own distance from the axis is real.
+void PairConjugates(cdouble* roots, int32_t* mult, int32_t s) {
+    for (int32_t i = 0; i < s; ++i) {
+        const double im = std::fabs(roots[i].imag());
+        int32_t pick = -1;
+        double best = im;
+        for (int32_t j = i + 1; j < s; ++j) {
+            if (mult[j] != mult[i] || roots[j].imag() == 0 || (roots[j].imag() < 0) == (roots[i].imag() < 0)) continue;
+            const double dist = std::abs(roots[j] - std::conj(roots[i]));
+            if (dist < best) {
+                best = dist;
+                pick = j;
+            }
+        }
+        if (pick < 0) {
+            roots[i] = roots[i].real();
+            continue;
+        }
+        const cdouble avg = (roots[i] + std::conj(roots[pick])) * 0.5;
+        const cdouble upper(avg.real(), std::fabs(avg.imag()));
+        for (int32_t j = pick; j > i + 1; --j) std::swap(roots[j], roots[j - 1]), std::swap(mult[j], mult[j - 1]);
+        roots[i] = upper;
+        roots[i + 1] = std::conj(upper);
+        ++i;
+    }
+}
+
+// ||c - c[d] prod (x - r)^m|| / ||c||, formed on the exactly rescaled coefficients and roots (ps
+// as c's own) and each difference scaled back, so that it overflows only where the true one does.
+// g holds d + 1 elements.
+template <class T>
+double RootResidual(const T* c, int32_t d, const cdouble* roots, const int32_t* mult, int32_t s, PowerScale ps,
+                    cdouble* g) {
+    g[0] = 1.0;
+    int32_t len = 1;
+    for (int32_t r = 0; r < s; ++r) {
+        const cdouble z = Ldexp(roots[r], -int64_t{ps.s});
+        for (int32_t t = 0; t < mult[r] && len <= d; ++t) {
+            g[len] = 0;
+            for (int32_t j = len; j >= 1; --j) g[j] = g[j - 1] - Mul(z, g[j]);
+            g[0] = -Mul(z, g[0]);
+            ++len;
+        }
+    }
+    const cdouble lead = ScaledCoefficient(c[d], d, ps);
+    for (int32_t i = 0; i <= d; ++i)
+        g[i] = Ldexp(ScaledCoefficient(c[i], i, ps) - Mul(lead, g[i]), int64_t{ps.shift} - int64_t{i} * ps.s);
+    return Norm(g, d + 1) / Norm(c, d + 1);
+}
+
+}  // namespace
 
 template <class T>
 Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* roots, int32_t* mult, int32_t* count,
@@ -632,118 +735,80 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
         mult[0] = k;
         s = 1;
     }
-    cdouble* rs = roots + s;
-    int32_t* ms = mult + s;
     Scratch<cdouble> work;
-    if (work.Allocate(2 * Sz(d + 1)) != 0) return OutOfMemoryErr;
+    Scratch<int32_t> trialMult;
+    if (work.Allocate(4 * Sz(d + 1)) != 0 || trialMult.Allocate(Sz(d + 1)) != 0) return OutOfMemoryErr;
     cdouble* p = work.get();
+    cdouble* q = p + (d + 1);
+    cdouble* g = q + (d + 1);
+    cdouble* trial = g + (d + 1);
+    int32_t* tm = trialMult.get();
     for (int32_t i = 0; i <= e; ++i) p[i] = c[k + i];
+    const PowerScale ps = e >= 1 ? Balance(p, e) : PowerScale{0, 0};
+    const PowerScale cps{ps.s, static_cast<int32_t>(std::clamp<int64_t>(ps.shift + int64_t{k} * ps.s, -100000, 100000))};
+    std::copy(roots, roots + s, trial);
+    std::copy(mult, mult + s, tm);
+    cdouble* rs = trial + s;
+    int32_t* ms = tm + s;
+    // Each candidate set of roots is judged by its residual against the caller's polynomial.
+    double res = kInf;
+    int32_t found = 0;
+    const auto consider = [&](int32_t f) {
+        if constexpr (!kIsComplex<T>) PairConjugates(rs, ms, f);
+        for (int32_t i = 0; i < f; ++i)
+            if (!Finite(rs[i])) return;
+        const double r = RootResidual(c, d, trial, tm, s + f, cps, g);
+        if (!(r < res)) return;
+        res = r;
+        found = f;
+        std::copy(rs, rs + f, roots + s);
+        std::copy(ms, ms + f, mult + s);
+    };
     if (e == 1) {
         rs[0] = Divide(-p[0], p[1]);
         ms[0] = 1;
-        s += 1;
+        consider(1);
     } else if (e == 2) {
         Quadratic(p[0], p[1], p[2], rs);
         ms[0] = ms[1] = 1;
-        if (rs[0] == rs[1]) {
-            ms[0] = 2;
-            s += 1;
-        } else {
-            s += 2;
-        }
+        if (rs[0] == rs[1]) ms[0] = 2;
+        consider(rs[0] == rs[1] ? 1 : 2);
     } else if (e >= 3) {
-        // The variable is scaled so that the normalised polynomial starts and ends with
-        // coefficients of size 1; if that overflows the plain copy is used.
-        cdouble* q = work.get() + (d + 1);
         Status st = NoConvergenceErr;
-        int32_t found = 0;
+        int32_t f = 0;
         for (int32_t attempt = 0; attempt < 2 && st != 0; ++attempt) {
-            // Magnitudes through logarithms, so that no intermediate overflows.
-            const double l0 = std::log(Abs(p[0])), lt = (l0 - std::log(Abs(p[e]))) / e;
-            double t = std::exp(lt);
-            bool ok = attempt == 0 && std::isfinite(t) && t > 0;
-            const cdouble phase0 = p[0] / Abs(p[0]);
-            if (ok)
-                for (int32_t i = 0; i <= e; ++i) {
-                    const double mag = Abs(p[i]);
-                    q[i] = mag == 0 ? cdouble(0)
-                                    : Divide(p[i] / mag, phase0) * std::exp(std::log(mag) - l0 + i * lt);
-                    ok = ok && std::isfinite(q[i].real()) && std::isfinite(q[i].imag());
-                }
-            if (!ok) {
-                if (attempt == 0) ++attempt;
-                t = 1;
-                for (int32_t i = 0; i <= e; ++i) q[i] = Divide(p[i], p[e]);
-            }
-            st = MultRootCore(q, e, limit, tol, rs, ms, &found);
-            if (st == 0) {
-                for (int32_t i = 0; i < found; ++i) {
-                    rs[i] *= t;
-                    if (!std::isfinite(rs[i].real()) || !std::isfinite(rs[i].imag())) st = NoConvergenceErr;
-                }
-            }
+            // First on the exactly rescaled copy; a non-finite intermediate there is retried once
+            // on the plain monic copy.
+            for (int32_t i = 0; i <= e; ++i) q[i] = attempt == 0 ? ScaledCoefficient(p[i], i, ps) : Divide(p[i], p[e]);
+            bool ok = q[0] != 0.0;
+            for (int32_t i = 0; i <= e; ++i) ok = ok && Finite(q[i]);
+            if (!ok) continue;
+            st = MultRootCore(q, e, limit, tol, rs, ms, &f);
+            for (int32_t i = 0; st == 0 && i < f; ++i) rs[i] = Ldexp(rs[i], attempt == 0 ? ps.s : 0);
             if (st == OutOfMemoryErr) return st;
         }
-        if (st != 0) {
-            // No consistent structure: all roots as simple ones, the eigenvalues of the companion
-            // matrix, which split a cluster evenly about its centre.
-            Scratch<cdouble> comp;
-            if (comp.Allocate(Sz(e) * Sz(e)) != 0) return OutOfMemoryErr;
-            cdouble* m = comp.get();
-            std::fill(m, m + Sz(e) * Sz(e), cdouble(0));
-            for (int32_t j = 0; j < e; ++j) m[Sz(j)] = -Divide(p[e - 1 - j], p[e]);
-            for (int32_t i = 1; i < e; ++i) m[Sz(i) * Sz(e) + Sz(i - 1)] = 1.0;
-            if (const Status s2 = CxGeneralEigen(m, e, 0, rs, nullptr); s2 < 0) return s2;
-            found = e;
-            std::fill(ms, ms + found, 1);
-        }
-        s += found;
-    }
-    if constexpr (!kIsComplex<T>) {
-        // Conjugate pairs side by side, positive imaginary part first, exactly conjugate; a root
-        // without a closer conjugate partner than its own distance from the axis is real.
-        const int32_t first = k > 0 ? 1 : 0;
-        for (int32_t i = first; i < s; ++i) {
-            const double im = std::fabs(roots[i].imag());
-            int32_t pick = -1;
-            double best = im;
-            for (int32_t j = i + 1; j < s; ++j) {
-                if (mult[j] != mult[i] || roots[j].imag() == 0 || (roots[j].imag() < 0) == (roots[i].imag() < 0)) continue;
-                const double dist = std::abs(roots[j] - std::conj(roots[i]));
-                if (dist < best) {
-                    best = dist;
-                    pick = j;
-                }
+        if (st == 0) consider(f);
+        if (!(res <= 100 * tol)) {
+            // No structure, or one that misses the polynomial: simple roots, from the companion
+            // matrix (clusters split evenly) and from the root finder (wide coefficient ranges).
+            if (const Status s2 = CompanionRoots(p, e, ps, rs); s2 == OutOfMemoryErr) return s2;
+            else if (s2 == 0) {
+                std::fill(ms, ms + e, 1);
+                consider(e);
             }
-            if (pick < 0) {
-                roots[i] = roots[i].real();
-                continue;
+            std::copy(p, p + e + 1, rs);
+            if (const Status s2 = CxPolyRoots(rs, e + 1, limit, &f); s2 == OutOfMemoryErr) return s2;
+            else if (s2 == 0) {
+                std::fill(ms, ms + e, 1);
+                consider(f);
             }
-            const cdouble avg = (roots[i] + std::conj(roots[pick])) * 0.5;
-            const cdouble upper(avg.real(), std::fabs(avg.imag()));
-            for (int32_t j = pick; j > i + 1; --j) std::swap(roots[j], roots[j - 1]), std::swap(mult[j], mult[j - 1]);
-            roots[i] = upper;
-            roots[i + 1] = std::conj(upper);
-            ++i;
         }
+    } else {
+        res = RootResidual(c, d, roots, mult, s, PowerScale{0, 0}, g);
     }
-    // Residual against the caller's coefficients.
-    Scratch<cdouble> prod;
-    if (prod.Allocate(Sz(d + 1)) != 0) return OutOfMemoryErr;
-    cdouble* g = prod.get();
-    g[0] = 1.0;
-    int32_t len = 1;
-    for (int32_t r = 0; r < s; ++r)
-        for (int32_t t = 0; t < mult[r] && len <= d; ++t) {
-            g[len] = 0;
-            for (int32_t j = len; j >= 1; --j) g[j] = g[j - 1] - Mul(roots[r], g[j]);
-            g[0] = -Mul(roots[r], g[0]);
-            ++len;
-        }
-    const cdouble lead = c[d];
-    for (int32_t i = 0; i <= d; ++i) g[i] = cdouble(c[i]) - Mul(lead, g[i]);
-    *residual = Norm(g, d + 1) / Norm(c, d + 1);
-    *count = s;
+    if (!std::isfinite(res)) return NoConvergenceErr;
+    *residual = res;
+    *count = s + found;
     return 0;
 }
 
