@@ -552,18 +552,27 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
     } else if (deg == 1) {
         r[found++] = Divide(-a[0], a[1]);
     }
-    // Polish on the undeflated polynomial, each step kept only while |p| falls.
+    // Polish on the undeflated polynomial, each step kept only while |p| falls and while it stays
+    // within half the distance to the nearest other root (at a multiple root p' is noise, and a
+    // wild step can land where |p| is smaller only because another root is there).
     for (int32_t i = 0; i < found; ++i) {
         cdouble z = r[i];
+        double reach = kInf;
+        for (int32_t j = 0; j < found; ++j)
+            if (j != i) reach = std::min(reach, 0.5 * Abs(r[j] - z));
         Value v = Horner(orig, origMag, d, z);
         for (int32_t s = 0; s < 2 && v.dp != 0.0; ++s) {
             const cdouble next = z - Divide(v.p, v.dp);
+            if (!(Abs(next - r[i]) <= reach)) break;
             const Value w = Horner(orig, origMag, d, next);
             if (!(Abs(w.p) < Abs(v.p))) break;
             z = next;
             v = w;
         }
-        r[i] = Ldexp(z, ps.s);
+        r[i] = z;
+    }
+    for (int32_t i = 0; i < found; ++i) {
+        r[i] = Ldexp(r[i], ps.s);
         if (!Finite(r[i])) return NoConvergenceErr;
     }
     std::fill(c, c + zeros, cdouble(0));

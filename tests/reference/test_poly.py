@@ -174,6 +174,15 @@ class AllRoots(unittest.TestCase):
             if not cx:
                 self.assertEqual(np.sum(np.abs(r.imag) < 1e-8) - low, np.sum(np.abs(np.roots(c[::-1]).imag) < 1e-8))
 
+    def test_wide_coefficient_ranges(self):
+        # Known roots far apart in magnitude (np.roots loses them all here): each within 1e-13.
+        for rts in ([7e-120 + 1e-120j, 7e-120 - 1e-120j, 3, -5], [1e-100, 2e-100, 1e100, -3e100], [1e-150, -2, 5e149],
+                    [1e-30, 2e-30, 1, 1e30, 3e30]):
+            want = np.array(rts, complex)
+            st, r = all_roots(npp.polyfromroots(want).real * 1e-10)
+            self.assertEqual(st, 0)
+            self.assertLess(max(np.abs(r - w).min() / abs(w) for w in want), 1e-13, rts)
+
     def test_bessel_search_polynomials(self):
         for n in range(1, 26):
             q = bessel_search(n)
