@@ -34,12 +34,13 @@ Status PolyRootsRefine(const double* c, int32_t n, const double* real, int32_t n
 // All roots of the n coefficients c, written over c; *count gets their number (zero roots first,
 // exactly 0). limit is the iteration limit per root (below 1: 100); past it the iterate of least
 // |p| is taken. -20063 when fewer than 2 coefficients remain after zero high ones, or for a
-// non-finite coefficient.
+// non-finite coefficient; -20062 should a root not be representable.
 Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count);
 
 // Monic numerical greatest common divisor g of a and b, with a = g u and b = g v. g holds
 // max(na, nb) elements, u na and v nb; the counts come back in ng, nu, nv. residual is
-// max(||a - g u|| / ||a||, ||b - g v|| / ||b||). tol <= 0 means 1e-8.
+// max(||a - g u|| / ||a||, ||b - g v|| / ||b||). tol <= 0 means 1e-8. gcd(0, b) is b made monic;
+// both zero: -20111. A divisor whose residual exceeds 100 tol gives way to 1.
 template <class T>
 Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g, int32_t* ng, T* u, int32_t* nu, T* v,
                int32_t* nv, double* residual);
@@ -47,7 +48,8 @@ Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g,
 // Distinct roots and their multiplicities of the n coefficients c. roots and mult hold n entries;
 // *count gets the number of distinct roots. limit is the inner root finder's limit (below 1: 100),
 // tol <= 0 means 1e-10. For real c a complex pair is listed side by side, positive imaginary part
-// first, as exact conjugates. residual is ||c - lead prod (x - r)^m|| / ||c||.
+// first, as exact conjugates. residual is ||c - lead prod (x - r)^m|| / ||c||. When the structure
+// found does not reproduce c within 100 tol, the simple roots of least residual are returned.
 template <class T>
 Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* roots, int32_t* mult, int32_t* count,
                      double* residual);
