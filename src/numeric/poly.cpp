@@ -499,6 +499,8 @@ Status PolyRootsRefine(const double* c, int32_t n, const double* real, int32_t n
     for (int32_t i = 1; i < n; ++i) d[i - 1] = c[i] * i;
     for (int32_t i = 0; i < nr; ++i) roots[i] = NewtonRefine(c, d, n, real[i], newtonLimit, newtonTol);
     cdouble* out = roots + nr;
+    // Zero high coefficients change no synthetic division; they only hide a short polynomial.
+    n = Degree(c, n) + 1;
     if (n < 4) {
         std::copy(cx, cx + nx, out);
         return 0;
