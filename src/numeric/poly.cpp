@@ -103,10 +103,10 @@ void Quadratic(cdouble a0, cdouble a1, cdouble a2, cdouble* r) {
     r[1] = big == 0.0 ? cdouble(0) : Divide(c, big);
 }
 
-// One root of the degree-d polynomial a (a[0] != 0) by Newton's method with a guarded search:
-// the start lies inside the smallest root magnitude, steps grow by at most 3, a step that does
-// not lower |p| is halved, then turned by (-0.3, 0.4). Only improving iterates are taken, so the
-// one returned has the least |p| met.
+// One root of the degree-d polynomial a (a[0] != 0) by Newton's method with a guarded search,
+// after Madsen (BIT 1973) and Madsen-Reid: the start lies inside the smallest root magnitude,
+// steps grow by at most 3, a step that does not lower |p| is halved, then turned by (-0.3, 0.4).
+// Only improving iterates are taken, so the one returned has the least |p| met.
 cdouble SearchRoot(const cdouble* a, int32_t d, int32_t limit, double* mag) {
     for (int32_t k = 0; k <= d; ++k) mag[k] = Abs(a[k]);
     const double l0 = std::log(mag[0]);
@@ -258,7 +258,7 @@ Status GcdCore(const T* p, int32_t m, const T* q, int32_t n, double tol, T* g, i
     return 0;
 }
 
-// Zeng's MultRoot on the degree-e polynomial q (q[0] != 0, e >= 3): the multiplicity structure
+// Zeng's MultRoot (2005) on the degree-e polynomial q (q[0] != 0, e >= 3): the multiplicity structure
 // from the chain of divisors f_{j+1} = gcd(f_j, f_j'), the roots of the square-free quotients,
 // then Gauss-Newton on the manifold of polynomials with that structure. roots and mult get the
 // s distinct roots.
@@ -447,6 +447,7 @@ double NewtonRefine(const double* c, const double* d, int32_t n, double x, int32
     return best;
 }
 
+// The two synthetic divisions in Chapra's recurrences, for the factor x^2 - u x - v.
 void BairstowRefine(const double* a, int32_t n, cdouble p, cdouble q, int32_t limit, double tol, double* work,
                     cdouble* roots) {
     const int32_t d = n - 1;
