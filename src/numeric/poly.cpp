@@ -171,7 +171,7 @@ void ConvColumns(const T* p, int32_t n, int32_t k, T* c, int32_t ld, int32_t col
 }
 
 // The greatest common divisor of p (degree m) and q (degree n), 1 <= n <= m, both with non-zero
-// leading coefficient. g (monic, *dg + 1 coefficients), up = p / g and uq = q / g in the callers'
+// leading coefficient. g (monic, *dg + 1 coefficients), up = p / g and uq = q / g in the caller's
 // scaling. Zeng-Dayton: the first Sylvester subresultant whose smallest singular value falls below
 // sqrt(2 j + 2) tol gives the degree and the cofactors, Gauss-Newton refines all three together.
 template <class T>
@@ -300,6 +300,7 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
             for (int32_t i = 0; i < cnt; ++i) {
                 roots[i] = u[i];
                 mult[i] = 1;
+                level[Sz(i)] = 1;
             }
             distinct = cnt;
         } else {
@@ -319,8 +320,6 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
             }
         }
         total += cnt;
-        for (int32_t i = 0; i < distinct; ++i)
-            if (j == 1) level[Sz(i)] = 1;
         deg = ng - 1;
         std::copy(g, g + ng, f);
     }
