@@ -27,7 +27,8 @@ inline cdouble Mul(cdouble a, cdouble b) {
 inline double Abs(double x) { return std::fabs(x); }
 inline double Abs(cdouble z) { return std::abs(z); }
 
-template <class T> double Norm(const T* x, int32_t n) {
+template <class T>
+double Norm(const T* x, int32_t n) {
     double big = 0;
     for (int32_t i = 0; i < n; ++i) big = std::max(big, Abs(x[i]));
     if (!(big > 0) || !std::isfinite(big)) return big;
@@ -51,14 +52,17 @@ PowerScale Balance(const cdouble* a, int32_t d) {
     return {s, static_cast<int32_t>(std::clamp<int64_t>(top, -100000, 100000))};
 }
 int Exponent(int64_t e) { return static_cast<int>(std::clamp<int64_t>(e, -100000, 100000)); }
-cdouble Ldexp(cdouble z, int64_t e) { return {std::ldexp(z.real(), Exponent(e)), std::ldexp(z.imag(), Exponent(e))}; }
+cdouble Ldexp(cdouble z, int64_t e) {
+    return {std::ldexp(z.real(), Exponent(e)), std::ldexp(z.imag(), Exponent(e))};
+}
 cdouble ScaledCoefficient(cdouble a, int32_t k, PowerScale ps) {
     return Ldexp(a, int64_t{k} * ps.s - ps.shift);
 }
 bool Finite(cdouble z) { return std::isfinite(z.real()) && std::isfinite(z.imag()); }
 
 // Index of the highest non-zero coefficient, -1 when all are 0.
-template <class T> int32_t Degree(const T* c, int32_t n) {
+template <class T>
+int32_t Degree(const T* c, int32_t n) {
     while (n > 0 && c[n - 1] == T(0)) --n;
     return n - 1;
 }
@@ -289,7 +293,8 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
             ng = 1;
             std::copy(f, f + 2, u);
             nu = 2;
-        } else if (const Status st = PolyGcd<cdouble>(f, deg + 1, fd, deg, gcdTol, g, &ng, u, &nu, v, &nv, &res);
+        } else if (const Status st =
+                       PolyGcd<cdouble>(f, deg + 1, fd, deg, gcdTol, g, &ng, u, &nu, v, &nv, &res);
                    st < 0) {
             return st;
         }
@@ -351,7 +356,8 @@ Status MultRootCore(const cdouble* q, int32_t e, int32_t limit, double tol, cdou
         for (int32_t r = 0; r < distinct; ++r) {
             cdouble carry = g[e];
             for (int32_t k = e - 1; k >= 0; --k) {
-                jac[Sz(k) * Sz(distinct) + Sz(r)] = -static_cast<double>(mult[r]) * carry / std::max(1.0, Abs(target[k]));
+                jac[Sz(k) * Sz(distinct) + Sz(r)] =
+                    -static_cast<double>(mult[r]) * carry / std::max(1.0, Abs(target[k]));
                 carry = g[k] + Mul(roots[r], carry);
             }
         }
@@ -490,8 +496,8 @@ void BairstowRefine(const double* a, int32_t n, cdouble p, cdouble q, int32_t li
 }
 
 Status PolyRootsRefine(const double* c, int32_t n, const double* real, int32_t nr, int32_t newtonLimit,
-                       double newtonTol, const cdouble* cx, int32_t nx, int32_t bairstowLimit, double bairstowTol,
-                       cdouble* roots) {
+                       double newtonTol, const cdouble* cx, int32_t nx, int32_t bairstowLimit,
+                       double bairstowTol, cdouble* roots) {
     if (n < 1) return EmptyInputWarn;
     Scratch<double> work;
     if (work.Allocate(Sz(2 * n)) != 0) return OutOfMemoryErr;
@@ -584,8 +590,8 @@ Status CxPolyRoots(cdouble* c, int32_t n, int32_t limit, int32_t* count) {
 }
 
 template <class T>
-Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g, int32_t* ng, T* u, int32_t* nu, T* v,
-               int32_t* nv, double* residual) {
+Status PolyGcd(const T* a, int32_t na, const T* b, int32_t nb, double tol, T* g, int32_t* ng, T* u,
+               int32_t* nu, T* v, int32_t* nv, double* residual) {
     *ng = *nu = *nv = 0;
     *residual = std::numeric_limits<double>::quiet_NaN();
     if (na < 1 || nb < 1) return EmptyArrayErr;
@@ -667,7 +673,8 @@ Status CompanionRoots(const cdouble* p, int32_t e, PowerScale ps, cdouble* roots
     std::fill(m, m + Sz(e) * Sz(e), cdouble(0));
     for (int32_t j = 0; j < e; ++j) m[Sz(j)] = -Divide(q[e - 1 - j], q[e]);
     for (int32_t i = 1; i < e; ++i) m[Sz(i) * Sz(e) + Sz(i - 1)] = 1.0;
-    if (const Status s = CxGeneralEigen(m, e, 0, roots, nullptr); s < 0) return s == OutOfMemoryErr ? s : NoConvergenceErr;
+    if (const Status s = CxGeneralEigen(m, e, 0, roots, nullptr); s < 0)
+        return s == OutOfMemoryErr ? s : NoConvergenceErr;
     for (int32_t i = 0; i < e; ++i) roots[i] = Ldexp(roots[i], ps.s);
     return 0;
 }
@@ -680,7 +687,8 @@ void PairConjugates(cdouble* roots, int32_t* mult, int32_t s) {
         int32_t pick = -1;
         double best = im;
         for (int32_t j = i + 1; j < s; ++j) {
-            if (mult[j] != mult[i] || roots[j].imag() == 0 || (roots[j].imag() < 0) == (roots[i].imag() < 0)) continue;
+            if (mult[j] != mult[i] || roots[j].imag() == 0 || (roots[j].imag() < 0) == (roots[i].imag() < 0))
+                continue;
             const double dist = std::abs(roots[j] - std::conj(roots[i]));
             if (dist < best) {
                 best = dist;
@@ -693,7 +701,8 @@ void PairConjugates(cdouble* roots, int32_t* mult, int32_t s) {
         }
         const cdouble avg = (roots[i] + std::conj(roots[pick])) * 0.5;
         const cdouble upper(avg.real(), std::fabs(avg.imag()));
-        for (int32_t j = pick; j > i + 1; --j) std::swap(roots[j], roots[j - 1]), std::swap(mult[j], mult[j - 1]);
+        for (int32_t j = pick; j > i + 1; --j)
+            std::swap(roots[j], roots[j - 1]), std::swap(mult[j], mult[j - 1]);
         roots[i] = upper;
         roots[i + 1] = std::conj(upper);
         ++i;
@@ -704,8 +713,8 @@ void PairConjugates(cdouble* roots, int32_t* mult, int32_t s) {
 // as c's own) and each difference scaled back, so that it overflows only where the true one does.
 // g holds d + 1 elements.
 template <class T>
-double RootResidual(const T* c, int32_t d, const cdouble* roots, const int32_t* mult, int32_t s, PowerScale ps,
-                    cdouble* g) {
+double RootResidual(const T* c, int32_t d, const cdouble* roots, const int32_t* mult, int32_t s,
+                    PowerScale ps, cdouble* g) {
     g[0] = 1.0;
     int32_t len = 1;
     for (int32_t r = 0; r < s; ++r) {
@@ -726,8 +735,8 @@ double RootResidual(const T* c, int32_t d, const cdouble* roots, const int32_t* 
 }  // namespace
 
 template <class T>
-Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* roots, int32_t* mult, int32_t* count,
-                     double* residual) {
+Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* roots, int32_t* mult,
+                     int32_t* count, double* residual) {
     *count = 0;
     *residual = std::numeric_limits<double>::quiet_NaN();
     if (n < 1) return EmptyArrayErr;
@@ -756,7 +765,8 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
     int32_t* tm = trialMult.get();
     for (int32_t i = 0; i <= e; ++i) p[i] = c[k + i];
     const PowerScale ps = e >= 1 ? Balance(p, e) : PowerScale{0, 0};
-    const PowerScale cps{ps.s, static_cast<int32_t>(std::clamp<int64_t>(ps.shift + int64_t{k} * ps.s, -100000, 100000))};
+    const PowerScale cps{
+        ps.s, static_cast<int32_t>(std::clamp<int64_t>(ps.shift + int64_t{k} * ps.s, -100000, 100000))};
     std::copy(roots, roots + s, trial);
     std::copy(mult, mult + s, tm);
     cdouble* rs = trial + s;
@@ -790,7 +800,8 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
         for (int32_t attempt = 0; attempt < 2 && st != 0; ++attempt) {
             // First on the exactly rescaled copy; a non-finite intermediate there is retried once
             // on the plain monic copy.
-            for (int32_t i = 0; i <= e; ++i) q[i] = attempt == 0 ? ScaledCoefficient(p[i], i, ps) : Divide(p[i], p[e]);
+            for (int32_t i = 0; i <= e; ++i)
+                q[i] = attempt == 0 ? ScaledCoefficient(p[i], i, ps) : Divide(p[i], p[e]);
             bool ok = q[0] != 0.0;
             for (int32_t i = 0; i <= e; ++i) ok = ok && Finite(q[i]);
             if (!ok) continue;
@@ -802,13 +813,15 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
         if (!(res <= 100 * tol)) {
             // No structure, or one that misses the polynomial: simple roots, from the companion
             // matrix (clusters split evenly) and from the root finder (wide coefficient ranges).
-            if (const Status s2 = CompanionRoots(p, e, ps, rs); s2 == OutOfMemoryErr) return s2;
+            if (const Status s2 = CompanionRoots(p, e, ps, rs); s2 == OutOfMemoryErr)
+                return s2;
             else if (s2 == 0) {
                 std::fill(ms, ms + e, 1);
                 consider(e);
             }
             std::copy(p, p + e + 1, rs);
-            if (const Status s2 = CxPolyRoots(rs, e + 1, limit, &f); s2 == OutOfMemoryErr) return s2;
+            if (const Status s2 = CxPolyRoots(rs, e + 1, limit, &f); s2 == OutOfMemoryErr)
+                return s2;
             else if (s2 == 0) {
                 std::fill(ms, ms + e, 1);
                 consider(f);
@@ -825,11 +838,12 @@ Status MultPolyRoots(const T* c, int32_t n, int32_t limit, double tol, cdouble* 
 
 template void PolyMultiply<double>(const double*, int32_t, const double*, int32_t, double*);
 template void PolyMultiply<cdouble>(const cdouble*, int32_t, const cdouble*, int32_t, cdouble*);
-template Status PolyGcd<double>(const double*, int32_t, const double*, int32_t, double, double*, int32_t*, double*,
-                                int32_t*, double*, int32_t*, double*);
+template Status PolyGcd<double>(const double*, int32_t, const double*, int32_t, double, double*, int32_t*,
+                                double*, int32_t*, double*, int32_t*, double*);
 template Status PolyGcd<cdouble>(const cdouble*, int32_t, const cdouble*, int32_t, double, cdouble*, int32_t*,
                                  cdouble*, int32_t*, cdouble*, int32_t*, double*);
-template Status MultPolyRoots<double>(const double*, int32_t, int32_t, double, cdouble*, int32_t*, int32_t*, double*);
+template Status MultPolyRoots<double>(const double*, int32_t, int32_t, double, cdouble*, int32_t*, int32_t*,
+                                      double*);
 template Status MultPolyRoots<cdouble>(const cdouble*, int32_t, int32_t, double, cdouble*, int32_t*, int32_t*,
                                        double*);
 

@@ -27,7 +27,10 @@ Status Out(Frame& f, Handle& h, int32_t n, T** data) {
 template <bool TwoD>
 Status Evaluate(Handle& x, Handle c) {
     Frame f;
-    if constexpr (TwoD) f.Output2D<double>(x); else f.Output<double>(x);
+    if constexpr (TwoD)
+        f.Output2D<double>(x);
+    else
+        f.Output<double>(x);
     const int32_t n = TwoD ? Elements(Dims(x)) : Count(x), nc = Count(c);
     Status s = (n < 1 || nc < 1) ? EmptyArrayErr : 0;
     const double* pc = nullptr;
@@ -172,19 +175,20 @@ TW_API int32_t CxMultiplyPolyH(Array1DHandle a, Array1DHandle b, Array1DHandle p
     return Multiply<cdouble>(a, b, product);
 }
 
-TW_API int32_t PolyRootsNtBst_head(Array1DHandle coefficients, Array1DHandle realStarts, int32_t newtonIterations,
-                                   double newtonTolerance, Array1DHandle complexStarts, int32_t bairstowIterations,
+TW_API int32_t PolyRootsNtBst_head(Array1DHandle coefficients, Array1DHandle realStarts,
+                                   int32_t newtonIterations, double newtonTolerance,
+                                   Array1DHandle complexStarts, int32_t bairstowIterations,
                                    double bairstowTolerance, Array1DHandle roots) {
-    return Refine(coefficients, realStarts, newtonIterations, newtonTolerance, complexStarts, bairstowIterations,
-                  bairstowTolerance, roots);
+    return Refine(coefficients, realStarts, newtonIterations, newtonTolerance, complexStarts,
+                  bairstowIterations, bairstowTolerance, roots);
 }
 
 TW_API int32_t CxPolyRoots_head(Array1DHandle coefficients, int32_t* option, int32_t* status) {
     return ToPointer(status, AllRoots(coefficients, option));
 }
 
-TW_API int32_t MultPolyRoots_head(Array1DHandle coefficients, int32_t option, double tolerance, Array1DHandle roots,
-                                  double* residual, Array1DHandle multiplicities) {
+TW_API int32_t MultPolyRoots_head(Array1DHandle coefficients, int32_t option, double tolerance,
+                                  Array1DHandle roots, double* residual, Array1DHandle multiplicities) {
     return MultipleRoots<double>(coefficients, option, tolerance, roots, residual, multiplicities);
 }
 

@@ -33,27 +33,54 @@ TEST_P(Poly, FailedResizeEmptiesEveryOutput) {
     };
     using Call = std::function<Outcome()>;
     const Call calls[] = {
-        [&] { Array1D<double> a(quartic), b{1, 2}; Array1D<C> p{1};
-              return Outcome{MultiplyPolyH(a.h(), b.h(), p.h()), {p.size()}, {}}; },
-        [&] { Array1D<C> a(cquartic), b{1, 2}, p{1};
-              return Outcome{CxMultiplyPolyH(a.h(), b.h(), p.h()), {p.size()}, {}}; },
-        [&] { Array1D<double> a(quartic), r{0.9}; Array1D<C> z{C(1.8, 0), C(2.1, 0)}, out{1};
-              return Outcome{PolyRootsNtBst_head(a.h(), r.h(), 50, 1e-12, z.h(), 50, 1e-12, out.h()), {out.size()},
-                             {}}; },
-        [&] { Array1D<C> a(cquartic); int32_t opt = 0, st = 0; CxPolyRoots_head(a.h(), &opt, &st);
-              return Outcome{st, {a.size()}, {}}; },
-        [&] { Array1D<double> a(quartic); Array1D<C> r{1}; Array1D<int32_t> m{1}; double res = 0;
-              const int32_t st = MultPolyRoots_head(a.h(), 0, 0, r.h(), &res, m.h());
-              return Outcome{st, {r.size(), m.size()}, res}; },
-        [&] { Array1D<C> a(cquartic), r{1}; Array1D<int32_t> m{1}; double res = 0;
-              const int32_t st = CxMultPolyRoots_head(a.h(), 0, 0, r.h(), &res, m.h());
-              return Outcome{st, {r.size(), m.size()}, res}; },
-        [&] { Array1D<double> a(quartic), b{-1, 0, 1}, g{1}, u{1}, v{1}; double res = 0;
-              const int32_t st = PolyGCD_H(a.h(), b.h(), 0, g.h(), u.h(), v.h(), &res);
-              return Outcome{st, {g.size(), u.size(), v.size()}, res}; },
-        [&] { Array1D<C> a(cquartic), b{-1, 0, 1}, g{1}, u{1}, v{1}; double res = 0;
-              const int32_t st = CxPolyGCD_H(a.h(), b.h(), 0, g.h(), u.h(), v.h(), &res);
-              return Outcome{st, {g.size(), u.size(), v.size()}, res}; },
+        [&] {
+            Array1D<double> a(quartic), b{1, 2};
+            Array1D<C> p{1};
+            return Outcome{MultiplyPolyH(a.h(), b.h(), p.h()), {p.size()}, {}};
+        },
+        [&] {
+            Array1D<C> a(cquartic), b{1, 2}, p{1};
+            return Outcome{CxMultiplyPolyH(a.h(), b.h(), p.h()), {p.size()}, {}};
+        },
+        [&] {
+            Array1D<double> a(quartic), r{0.9};
+            Array1D<C> z{C(1.8, 0), C(2.1, 0)}, out{1};
+            return Outcome{
+                PolyRootsNtBst_head(a.h(), r.h(), 50, 1e-12, z.h(), 50, 1e-12, out.h()), {out.size()}, {}};
+        },
+        [&] {
+            Array1D<C> a(cquartic);
+            int32_t opt = 0, st = 0;
+            CxPolyRoots_head(a.h(), &opt, &st);
+            return Outcome{st, {a.size()}, {}};
+        },
+        [&] {
+            Array1D<double> a(quartic);
+            Array1D<C> r{1};
+            Array1D<int32_t> m{1};
+            double res = 0;
+            const int32_t st = MultPolyRoots_head(a.h(), 0, 0, r.h(), &res, m.h());
+            return Outcome{st, {r.size(), m.size()}, res};
+        },
+        [&] {
+            Array1D<C> a(cquartic), r{1};
+            Array1D<int32_t> m{1};
+            double res = 0;
+            const int32_t st = CxMultPolyRoots_head(a.h(), 0, 0, r.h(), &res, m.h());
+            return Outcome{st, {r.size(), m.size()}, res};
+        },
+        [&] {
+            Array1D<double> a(quartic), b{-1, 0, 1}, g{1}, u{1}, v{1};
+            double res = 0;
+            const int32_t st = PolyGCD_H(a.h(), b.h(), 0, g.h(), u.h(), v.h(), &res);
+            return Outcome{st, {g.size(), u.size(), v.size()}, res};
+        },
+        [&] {
+            Array1D<C> a(cquartic), b{-1, 0, 1}, g{1}, u{1}, v{1};
+            double res = 0;
+            const int32_t st = CxPolyGCD_H(a.h(), b.h(), 0, g.h(), u.h(), v.h(), &res);
+            return Outcome{st, {g.size(), u.size(), v.size()}, res};
+        },
     };
     for (size_t i = 0; i < std::size(calls); ++i) {
         const Outcome ok = calls[i]();

@@ -237,7 +237,8 @@ class MultipleRoots(unittest.TestCase):
         # Doubles among close simple roots: whatever structure is found must reproduce the polynomial.
         rng = np.random.default_rng(0)
         for deg in (10, 20, 30):
-            roots = np.concatenate([np.repeat(rng.uniform(-2, 2, deg // 3), 2), rng.uniform(-2, 2, deg - 2 * (deg // 3))])
+            doubles = rng.uniform(-2, 2, deg // 3)
+            roots = np.concatenate([np.repeat(doubles, 2), rng.uniform(-2, 2, deg - 2 * len(doubles))])
             c = npp.polyfromroots(roots)
             st, r, m, res = mult_roots(c)
             self.assertEqual((st, m.sum()), (0, deg))
