@@ -1,6 +1,7 @@
 // Frames of the polynomial exports: evaluation, products, root refinement, all roots, the
 // multiple-root finder and the greatest common divisor.
 #include <algorithm>
+#include <cstdint>
 #include <cstring>
 
 #include "frame/frame.hpp"
@@ -47,7 +48,7 @@ Status Multiply(Handle a, Handle b, Handle& product) {
     Frame f;
     f.Output<cdouble>(product);
     const int32_t na = Count(a), nb = Count(b);
-    Status s = (na < 1 || nb < 1) ? EmptyArrayErr : 0;
+    Status s = (na < 1 || nb < 1) ? EmptyArrayErr : int64_t{na} + nb - 1 > INT32_MAX ? OutOfMemoryErr : 0;
     const T *pa = nullptr, *pb = nullptr;
     if (s == 0) s = f.In(a, &pa);
     if (s == 0) s = f.In(b, &pb);
@@ -72,6 +73,7 @@ Status Refine(Handle c, Handle real, int32_t newtonLimit, double newtonTol, Hand
     Status s = f.In(c, &pc);
     if (s == 0) s = f.In(real, &pr);
     if (s == 0) s = f.In(cx, &px);
+    if (s == 0 && int64_t{nr} + nx > INT32_MAX) s = OutOfMemoryErr;
     if (s == 0) s = Out(f, roots, nr + nx, &out);
     if (s == 0)
         s = PolyRootsRefine(pc, n, pr, nr, newtonLimit, newtonTol, px, nx, bairstowLimit, bairstowTol, out);
