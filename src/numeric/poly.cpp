@@ -197,7 +197,19 @@ Status GcdCore(const T* p, int32_t m, const T* q, int32_t n, double tol, T* g, i
     T* r = step + rowsMax;
     for (int32_t i = 0; i <= m; ++i) pn[i] = p[i] / np;
     for (int32_t i = 0; i <= n; ++i) qn[i] = q[i] / nq;
-    for (int32_t j = 1; j <= n; ++j) {
+    // Every subresultant is a column subset of the full Sylvester matrix (the last trial), so its
+    // smallest singular value is no smaller than the full one's, and its bound no larger: when
+    // the full matrix passes no trial can, and the operands are coprime after one decomposition.
+    int32_t first = 1;
+    {
+        const int32_t size = m + n;
+        std::fill(mat, mat + Sz(size) * Sz(size), T(0));
+        ConvColumns(pn, m + 1, n, mat, size, 0);
+        ConvColumns(qn, n + 1, m, mat, size, n);
+        if (const Status s = SingularValues<T>(mat, size, size, sv.get())) return s;
+        if (!(sv[Sz(size - 1)] < std::sqrt(2.0 * n + 2.0) * tol)) first = n + 1;
+    }
+    for (int32_t j = first; j <= n; ++j) {
         const int32_t k = n - j + 1, c1 = n - k + 1, c2 = m - k + 1, rows = m + n - k + 1, cols = c1 + c2;
         const double bound = std::sqrt(2.0 * j + 2.0) * tol;
         std::fill(mat, mat + Sz(rows) * Sz(cols), T(0));
