@@ -1,4 +1,4 @@
-/* Numerical utilities: integration of sampled data, coordinates, scaling and vector norms. */
+/* Numerical utilities: integration of sampled data, coordinates, scaling and vector norms, polynomials. */
 #ifndef TWANLYS_NUMERIC_H
 #define TWANLYS_NUMERIC_H
 
