@@ -475,7 +475,7 @@ void BairstowRefine(const double* a, int32_t n, cdouble p, cdouble q, int32_t li
     double r1 = 0.1, r2 = 0.1;
     if (std::fabs(v) > 1e12 * std::fabs(u)) r1 = 1.2;
     if (std::fabs(v) < 1e-12 * std::fabs(u)) r2 = 1.2;
-    for (int32_t it = 1;; ++it) {
+    for (int32_t it = 1; it <= limit; ++it) {
         b[d] = a[d];
         b[d - 1] = a[d - 1] + u * b[d];
         for (int32_t i = d - 2; i >= 0; --i) b[i] = a[i] + u * b[i + 1] + v * b[i + 2];
@@ -495,7 +495,7 @@ void BairstowRefine(const double* a, int32_t n, cdouble p, cdouble q, int32_t li
         v += dv;
         r1 = n1;
         r2 = n2;
-        if ((n1 < tol && n2 < tol) || it >= limit) break;
+        if (n1 < tol && n2 < tol) break;
     }
     const double disc = 4 * v + u * u;
     if (disc >= 0) {
