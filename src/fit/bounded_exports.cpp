@@ -3,6 +3,7 @@
 
 #include "fit/bounded.hpp"
 #include "fit/robust.hpp"
+#include "fit/fit_frame.hpp"
 #include "frame/frame.hpp"
 #include "twanlys/fit.h"
 
@@ -11,17 +12,6 @@ using namespace tw;
 namespace {
 
 constexpr double kInf = std::numeric_limits<double>::infinity();
-
-// x of n samples and weights of n or none.
-Status ReadSamples(Frame& f, Handle x, Handle w, int32_t n, const double** xs, const double** ws) {
-    *ws = nullptr;
-    if (Count(x) != n) return EqSamplesErr;
-    const int32_t nw = Count(w);
-    if (nw != 0 && nw != n) return EqSamplesErr;
-    Status s = f.In(x, xs);
-    if (s == 0 && nw != 0) s = f.In(w, ws);
-    return s;
-}
 
 // The first p bounds, or no bounds at all when both arrays are empty.
 Status ReadBounds(Frame& f, Handle lower, Handle upper, int32_t p, double* lo, double* up) {

@@ -2,32 +2,13 @@
 
 #include "fit/fit_core.hpp"
 #include "fit/robust.hpp"
+#include "fit/fit_frame.hpp"
 #include "frame/frame.hpp"
 #include "twanlys/fit.h"
 
 using namespace tw;
 
 namespace {
-
-// x of n samples and weights of n or none; the views come back aligned.
-Status ReadSamples(Frame& f, Handle x, Handle w, int32_t n, const double** xs, const double** ws) {
-    *ws = nullptr;
-    if (Count(x) != n) return EqSamplesErr;
-    const int32_t nw = Count(w);
-    if (nw != 0 && nw != n) return EqSamplesErr;
-    Status s = f.In(x, xs);
-    if (s == 0 && nw != 0) s = f.In(w, ws);
-    return s;
-}
-
-// y as input only (coefficients only), or as input and best-fit output.
-Status ViewY(Frame& f, Handle& y, bool coefOnly, const double** ys, double** fit) {
-    *fit = nullptr;
-    if (coefOnly) return f.In(y, ys);
-    const Status s = f.InPlace(y, fit);
-    *ys = *fit;
-    return s;
-}
 
 int32_t Limit(const int32_t* iterations) { return iterations != nullptr ? *iterations : 0; }
 
@@ -58,7 +39,7 @@ Status LineFrame(bool lar, Handle& y, Handle x, Handle w, double tol, double* sl
     const double *xs = nullptr, *ws = nullptr, *ys = nullptr;
     double* fit = nullptr;
     Status s = ReadSamples(f, x, w, n, &xs, &ws);
-    if (s == 0) s = ViewY(f, y, coefOnly != 0, &ys, &fit);
+    if (s == 0) s = ViewY(f, y, coefOnly == 0, &ys, &fit);
     int32_t count = 0;
     double* e = coefOnly == 0 ? err : nullptr;
     if (s == 0)
@@ -125,7 +106,7 @@ Status ModelFrame(RobustModel model, RobustKind kind, Handle& y, Handle x, Handl
     const int32_t ng = Count(guessHandle);
     const bool warn = ng != 0 && ng != np;
     if (s == 0 && ng >= np) s = f.In(guessHandle, &guess);
-    if (s == 0) s = ViewY(f, y, coefOnly != 0, &ys, &fit);
+    if (s == 0) s = ViewY(f, y, coefOnly == 0, &ys, &fit);
     double p[3] = {0, 0, 0}, e = 0;
     int32_t count = 0;
     if (s == 0)
