@@ -447,7 +447,7 @@ void SpecialMatrix(int32_t type, const T* x, int32_t nx, const T* y, int32_t row
             break;
         case 4:
             for (int32_t i = 1; i < rows; ++i) out[at(i, i - 1)] = T(1);
-            for (int32_t j = 0; j < cols && j + 1 < nx; ++j) out[at(0, j)] = -x[j + 1] / x[0];
+            for (int32_t j = 0; j < cols && j + 1 < nx; ++j) out[at(0, j)] = Divide(-x[j + 1], x[0]);
             break;
         default: break;
     }
