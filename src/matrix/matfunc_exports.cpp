@@ -102,8 +102,6 @@ template <class T, class C> Status CharPoly(Handle a, Handle& c, int32_t* host) 
             else
                 pc[i] = poly[i].real();
         }
-        // The product is monic by construction.
-        pc[n] = 1.0;
     }
     return f.Finish(MergeRelease(s, poly.Release()));
 }
@@ -171,8 +169,8 @@ Status AutoCorr(Handle x, Handle& prev, Handle& r, Handle& xm, int32_t m, int32_
         }
     }
     if (s == 0) s = Out2D(f, xm, fresh ? rows : n, m + 1, &pxm, &host);
+    if (s == 0) s = AutoCorrMatrix(px, n, tail.get(), m, type, fresh ? 0 : *count, pr, pxm);
     if (s == 0) {
-        AutoCorrMatrix(px, n, tail.get(), m, type, fresh ? 0 : *count, pr, pxm);
         *count = fresh ? n : *count + n;
         if (m > 0) std::memcpy(static_cast<unsigned char*>(*prev) + 4, tail.get(), static_cast<size_t>(m) * sizeof(T));
     }

@@ -465,8 +465,10 @@ int32_t AutoCorrRows(int32_t type, int32_t n, int32_t m) {
 }
 
 template <class T>
-void AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm) {
+Status AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm) {
     const int32_t w = m + 1;
+    Scratch<T> back, tail;
+    if (back.Allocate(static_cast<size_t>(w)) != 0 || tail.Allocate(static_cast<size_t>(w)) != 0) return OutOfMemoryErr;
     const auto at = [w](int32_t i, int32_t j) { return static_cast<size_t>(i) * w + j; };
     // Sample k of the joined record: prev before x on a continuing block, zeros on a first one.
     const auto sample = [&](int32_t k) -> T {
@@ -497,19 +499,16 @@ void AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int
         for (int32_t i = 0; i < n; ++i) fill(i, i, false, f);
         weight = static_cast<double>(count) / (static_cast<double>(count) + n);
         if (type == 4) {
-            Scratch<T> back;
-            if (back.Allocate(static_cast<size_t>(w)) == 0) {
+            for (int32_t i = 0; i < w; ++i)
+                for (int32_t j = 0; j < w; ++j) r[at(i, j)] *= weight;
+            const double h = std::sqrt(0.5);
+            for (int32_t t = 0; t < n; ++t) {
+                for (int32_t j = 0; j < w; ++j) back[j] = Conj(sample(t - m + j)) * f * h;
                 for (int32_t i = 0; i < w; ++i)
-                    for (int32_t j = 0; j < w; ++j) r[at(i, j)] *= weight;
-                const double h = std::sqrt(0.5);
-                for (int32_t t = 0; t < n; ++t) {
-                    for (int32_t j = 0; j < w; ++j) back[j] = Conj(sample(t - m + j)) * f * h;
-                    for (int32_t i = 0; i < w; ++i)
-                        for (int32_t j = 0; j < w; ++j) {
-                            const T fi = xm[at(t, i)] * h, fj = xm[at(t, j)] * h;
-                            r[at(i, j)] += Conj(fi) * fj + Conj(back[i]) * back[j];
-                        }
-                }
+                    for (int32_t j = 0; j < w; ++j) {
+                        const T fi = xm[at(t, i)] * h, fj = xm[at(t, j)] * h;
+                        r[at(i, j)] += Conj(fi) * fj + Conj(back[i]) * back[j];
+                    }
             }
             weight = -1;
         }
@@ -523,13 +522,9 @@ void AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int
             }
     }
     // prev keeps the last m samples of the joined record.
-    if (m > 0) {
-        Scratch<T> tail;
-        if (tail.Allocate(static_cast<size_t>(m)) == 0) {
-            for (int32_t k = 0; k < m; ++k) tail[k] = n - m + k >= 0 ? x[n - m + k] : (count > 0 ? prev[n + k] : T(0));
-            std::copy(tail.get(), tail.get() + m, prev);
-        }
-    }
+    for (int32_t k = 0; k < m; ++k) tail[k] = n - m + k >= 0 ? x[n - m + k] : (count > 0 ? prev[n + k] : T(0));
+    std::copy(tail.get(), tail.get() + m, prev);
+    return MergeRelease(back.Release(), tail.Release());
 }
 
 template <class T>
@@ -656,7 +651,7 @@ template <class T> Status CheckPositiveSemiDefinite(const T* a, int32_t n, doubl
     template Status CharacteristicPoly<T>(const T*, int32_t, cdouble*);                                     \
     template void KroneckerProduct<T>(const T*, int32_t, int32_t, const T*, int32_t, int32_t, T*);          \
     template void SpecialMatrix<T>(int32_t, const T*, int32_t, const T*, int32_t, int32_t, T*);             \
-    template void AutoCorrMatrix<T>(const T*, int32_t, T*, int32_t, int32_t, int32_t, T*, T*);              \
+    template Status AutoCorrMatrix<T>(const T*, int32_t, T*, int32_t, int32_t, int32_t, T*, T*);            \
     template Status CheckSymmetric<T>(const T*, int32_t, double, int32_t, int32_t, int32_t*);               \
     template Status CheckPositiveDefinite<T>(const T*, int32_t, int32_t*);                                  \
     template Status CheckPositiveSemiDefinite<T>(const T*, int32_t, double, int32_t*, int32_t*);

@@ -42,7 +42,7 @@ int32_t AutoCorrRows(int32_t type, int32_t n, int32_t m);
 // gets the n rows of the new times, scaled so that r becomes (count r + their sum) / (count + n).
 // prev holds the m samples before x and receives the last m of the joined record.
 template <class T>
-void AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm);
+Status AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm);
 
 // Symmetry (complex: hermitian non-zero compares with the conjugate) within the threshold of tol
 // and relative; *result 1 or 0.
