@@ -195,15 +195,25 @@ Status CxMatrixSqrt(const cdouble* a, int32_t n, cdouble* out, int32_t realInput
     if (s >= 0) {
         std::fill(r, r + nn, cdouble(0));
         const auto at = [n](int32_t i, int32_t j) { return static_cast<size_t>(i) * n + j; };
+        // Column j of R is built upwards in col, so that the inner products run over contiguous
+        // memory; the products are written out in real arithmetic, rounding as num -= a b does.
+        cdouble* col = qr;
         for (int32_t j = 0; j < n; ++j) {
-            r[at(j, j)] = std::sqrt(OnUpperSide(t[at(j, j)], realInput));
+            col[j] = std::sqrt(OnUpperSide(t[at(j, j)], realInput));
+            r[at(j, j)] = col[j];
             for (int32_t i = j - 1; i >= 0; --i) {
-                cdouble num = t[at(i, j)];
-                for (int32_t k = i + 1; k < j; ++k) num -= r[at(i, k)] * r[at(k, j)];
-                const cdouble d = r[at(i, i)] + r[at(j, j)];
+                double sr = t[at(i, j)].real(), si = t[at(i, j)].imag();
+                const cdouble* ri = r + at(i, 0);
+                for (int32_t k = i + 1; k < j; ++k) {
+                    const double ar = ri[k].real(), ai = ri[k].imag(), br = col[k].real(), bi = col[k].imag();
+                    sr -= ar * br - ai * bi;
+                    si -= ar * bi + ai * br;
+                }
+                const cdouble num(sr, si), d = r[at(i, i)] + col[j];
                 const bool tiny = std::fabs(d.real()) + std::fabs(d.imag()) < 1e-12 &&
                                   std::fabs(num.real()) + std::fabs(num.imag()) < 1e-12;
-                r[at(i, j)] = tiny ? cdouble(0) : Divide(num, d);
+                col[i] = tiny ? cdouble(0) : Divide(num, d);
+                r[at(i, j)] = col[i];
             }
         }
         const Status p = CxMatMul(q, r, n, n, n, qr, 0);
@@ -399,11 +409,12 @@ template <class T> void KroneckerProduct(const T* a, int32_t m, int32_t n, const
     const size_t cols = static_cast<size_t>(n) * static_cast<size_t>(q);
     for (int32_t i = 0; i < m; ++i)
         for (int32_t r = 0; r < p; ++r) {
-            T* row = c + (static_cast<size_t>(i) * p + r) * cols;
+            T* __restrict row = c + (static_cast<size_t>(i) * p + r) * cols;
+            const T* __restrict brow = b + static_cast<size_t>(r) * q;
             for (int32_t j = 0; j < n; ++j) {
                 const T aij = a[static_cast<size_t>(i) * n + j];
-                const T* brow = b + static_cast<size_t>(r) * q;
-                for (int32_t s = 0; s < q; ++s) row[static_cast<size_t>(j) * q + s] = aij * brow[s];
+                T* __restrict dst = row + static_cast<size_t>(j) * q;
+                for (int32_t s = 0; s < q; ++s) dst[s] = aij * brow[s];
             }
         }
 }
