@@ -374,6 +374,20 @@ def op(z, t):
     return z.conj().T if t else z
 
 
+def quasi_triangular(rng, n, first, cx, shift=0.0):
+    """Schur form with the given leading eigenvalues, then (real) 2 by 2 blocks of complex pairs
+    or (complex) a triangle, the rest of the spectrum shifted clear of the leading values."""
+    a = np.triu(rnd(rng, (n, n), cx), 1) * 0.3
+    k = len(first)
+    a[np.arange(k), np.arange(k)] = first
+    for i in range(k, n - 1, 2):
+        re, im = 3.0 + i + shift, 1.0 + 0.1 * i
+        a[i:i + 2, i:i + 2] = [[re, im], [0.0 if cx else -im, re]]
+    if (n - k) % 2:
+        a[n - 1, n - 1] = 3.5 + n + shift
+    return a
+
+
 def min_norm(k, b, rcond):
     """Minimum-norm least squares; a complex system goes through its real embedding, as the
     library does (the rank decision at the cut-off can differ from the complex one)."""
@@ -422,13 +436,12 @@ class Equations(unittest.TestCase):
 
     def test_close_eigenvalues(self):
         # Exactly coinciding eigenvalues (lA + lB = 0): the Kronecker route gives the minimum-norm
-        # least-squares solution; the column method (larger sizes) a solution of the consistent system.
+        # least-squares solution; the column method (larger sizes, 1 by 1 and 2 by 2 blocks) a
+        # solution of the consistent system.
         rng = np.random.default_rng(19)
         for cx in (False, True):
             for n in (4, 26 if cx else 41):
-                d = np.arange(1.0, n + 1)
-                d[1] = -1.0
-                a = np.triu(rnd(rng, (n, n), cx), 1) * 0.3 + np.diag(d)
+                a = quasi_triangular(rng, n, [1.0, -1.0], cx)
                 x0 = rnd(rng, (n, n), cx)
                 x0 = x0 + x0.conj().T
                 q = a @ x0 + x0 @ a.conj().T
@@ -447,9 +460,8 @@ class Equations(unittest.TestCase):
             for m, n in ((3, 5), (5, 3), (20, 40) if cx else (40, 40), (21, 40) if cx else (40, 41)):
                 dense = m * n < (801 if cx else 1601)
                 for case, (ta, tb, sign) in enumerate(small if m * n < 100 else large):
-                    ea = np.r_[-sign * 2.0, np.arange(50.0, 50 + m - 1)]
-                    a = np.triu(rnd(rng, (m, m), cx), 1) * 0.3 + np.diag(ea)
-                    b = np.triu(rnd(rng, (n, n), cx), 1) * 0.3 + np.diag(np.r_[2.0, np.arange(3.5, n + 2.5)])
+                    a = quasi_triangular(rng, m, [-sign * 2.0], cx)
+                    b = quasi_triangular(rng, n, [2.0], cx, shift=100.0)
                     x0 = rnd(rng, (m, n), cx)
                     c = op(a, ta) @ x0 + sign * x0 @ op(b, tb)
                     rc, x, s, pt = sylvester(a, b, c, ta, tb, sign, 1)
