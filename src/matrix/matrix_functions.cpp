@@ -65,6 +65,8 @@ int32_t PadeOrder(double norm) {
 // Pade approximation with scaling and squaring (Golub and Van Loan).
 template <class T> Status MatrixExp(T* a, int32_t n) {
     if (n < 1) return EmptyArrayErr;
+    // An infinite norm would make the number of squarings undefined.
+    if (Screen(a, n * n)) return NanInfErr;
     const size_t nn = Square(n);
     if (OffDiagonalZero(a, n)) {
         for (int32_t i = 0; i < n; ++i) a[static_cast<size_t>(i) * n + i] = ExpOf(a[static_cast<size_t>(i) * n + i]);

@@ -65,6 +65,11 @@ TEST(Exp, RotationAndComplexDiagonal) {
     EXPECT_NEAR(z.at(0, 0).real(), -1, 1e-15);
     EXPECT_NEAR(z.at(0, 0).imag(), 0, 1e-15);
     EXPECT_NEAR(z.at(1, 1).real(), 2, 4e-16);
+    // An infinite element would leave the number of squarings undefined.
+    D2 inf(2, 2, {1, INFINITY, 0, 1});
+    MatrixExp_head(inf.h(), &status);
+    EXPECT_EQ(status, NanInfErr);
+    EXPECT_EQ(inf.rows(), 0);
 }
 
 TEST(SpecialMatrix, Statuses) {
