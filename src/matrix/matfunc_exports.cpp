@@ -148,7 +148,7 @@ Status AutoCorr(Handle x, Handle& prev, Handle& r, Handle& xm, int32_t m, int32_
     Status s = n < 1 ? EmptyArrayErr : m < 0 ? NegativeArgumentErr : 0;
     if (s == 0 && (type == 3 || type == 4) && n <= m) s = PolyOrderErr;
     if (s == 0 && Count(prev) != m) s = InternalErr;
-    const int32_t rows = AutoCorrRows(type, n, m);
+    const int32_t rows = s == 0 ? AutoCorrRows(type, n, m) : 0;
     if (s == 0 && rows < 0) s = InvalidSelectorErr;
     const bool fresh = *count <= 0 || (reset != nullptr && *reset != 0);
     if (s == 0 && !fresh && (Dims(r).rows != m + 1 || Dims(r).cols != m + 1)) s = SizeMismatchErr;

@@ -2,8 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstring>
-#include <limits>
 
 #include "matrix/decompose.hpp"
 #include "matrix/eigen.hpp"
@@ -468,11 +468,11 @@ void SpecialMatrix(int32_t type, const T* x, int32_t nx, const T* y, int32_t row
 
 int32_t AutoCorrRows(int32_t type, int32_t n, int32_t m) {
     switch (type) {
-        case 0: return n + m;
+        case 0: return static_cast<int32_t>(std::min<int64_t>(int64_t{n} + m, INT32_MAX));
         case 1:
         case 2: return n;
         case 3: return n - m;
-        case 4: return 2 * (n - m);
+        case 4: return static_cast<int32_t>(std::min<int64_t>(2 * (int64_t{n} - m), INT32_MAX));
         default: return -1;
     }
 }
