@@ -480,8 +480,8 @@ int32_t AutoCorrRows(int32_t type, int32_t n, int32_t m) {
 template <class T>
 Status AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm) {
     const int32_t w = m + 1;
-    Scratch<T> back, tail;
-    if (back.Allocate(static_cast<size_t>(w)) != 0 || tail.Allocate(static_cast<size_t>(w)) != 0) return OutOfMemoryErr;
+    Scratch<T> tail;
+    if (tail.Allocate(static_cast<size_t>(w)) != 0) return OutOfMemoryErr;
     const auto at = [w](int32_t i, int32_t j) { return static_cast<size_t>(i) * w + j; };
     // Sample k of the joined record: prev before x on a continuing block, zeros on a first one.
     const auto sample = [&](int32_t k) -> T {
@@ -493,51 +493,36 @@ Status AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, i
         for (int32_t j = 0; j < w; ++j)
             xm[at(row, j)] = backward ? Conj(sample(t - m + j)) * f : sample(t - j) * f;
     };
-    int32_t rows;
-    double weight;
     if (count == 0) {
-        rows = AutoCorrRows(type, n, m);
+        const int32_t rows = AutoCorrRows(type, n, m);
         const double f = 1.0 / std::sqrt(static_cast<double>(rows));
         const int32_t first = (type == 0 || type == 1) ? 0 : m;
         const int32_t forward = type == 4 ? rows / 2 : rows;
         for (int32_t i = 0; i < forward; ++i) fill(i, first + i, false, f);
         if (type == 4)
             for (int32_t i = 0; i < forward; ++i) fill(forward + i, first + i, true, f);
-        weight = 0;
-    } else {
-        // The new times of the joined record; the modified covariance adds each time's forward
-        // and backward rows with half weight.
-        rows = n;
-        const double f = 1.0 / std::sqrt(static_cast<double>(count) + n);
-        for (int32_t i = 0; i < n; ++i) fill(i, i, false, f);
-        weight = static_cast<double>(count) / (static_cast<double>(count) + n);
-        if (type == 4) {
-            for (int32_t i = 0; i < w; ++i)
-                for (int32_t j = 0; j < w; ++j) r[at(i, j)] *= weight;
-            const double h = std::sqrt(0.5);
-            for (int32_t t = 0; t < n; ++t) {
-                for (int32_t j = 0; j < w; ++j) back[j] = Conj(sample(t - m + j)) * f * h;
-                for (int32_t i = 0; i < w; ++i)
-                    for (int32_t j = 0; j < w; ++j) {
-                        const T fi = xm[at(t, i)] * h, fj = xm[at(t, j)] * h;
-                        r[at(i, j)] += Conj(fi) * fj + Conj(back[i]) * back[j];
-                    }
-            }
-            weight = -1;
-        }
-    }
-    if (weight >= 0) {
         for (int32_t i = 0; i < w; ++i)
             for (int32_t j = 0; j < w; ++j) {
-                T s = r[at(i, j)] * weight;
+                T s = 0;
                 for (int32_t k = 0; k < rows; ++k) s += Conj(xm[at(k, i)]) * xm[at(k, j)];
                 r[at(i, j)] = s;
+            }
+    } else {
+        // The rows of the new times of the joined record, whatever the type: count R plus their
+        // products, divided by the new count. xm gets the rows scaled to that count.
+        const double total = static_cast<double>(count) + n, f = 1.0 / std::sqrt(total);
+        for (int32_t i = 0; i < n; ++i) fill(i, i, false, f);
+        for (int32_t i = 0; i < w; ++i)
+            for (int32_t j = 0; j < w; ++j) {
+                T s = r[at(i, j)] * static_cast<double>(count);
+                for (int32_t t = 0; t < n; ++t) s += Conj(sample(t - i)) * sample(t - j);
+                r[at(i, j)] = s / total;
             }
     }
     // prev keeps the last m samples of the joined record.
     for (int32_t k = 0; k < m; ++k) tail[k] = n - m + k >= 0 ? x[n - m + k] : (count > 0 ? prev[n + k] : T(0));
     std::copy(tail.get(), tail.get() + m, prev);
-    return MergeRelease(back.Release(), tail.Release());
+    return tail.Release();
 }
 
 template <class T>

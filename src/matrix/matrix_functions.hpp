@@ -38,9 +38,10 @@ void SpecialMatrix(int32_t type, const T* x, int32_t nx, const T* y, int32_t row
 
 // Rows of the data matrix of an autocorrelation type, or -1 for an unknown type.
 int32_t AutoCorrRows(int32_t type, int32_t n, int32_t m);
-// First block (count 0): the scaled data matrix into xm and r = xm^H xm. Continuing block: xm
-// gets the n rows of the new times, scaled so that r becomes (count r + their sum) / (count + n).
-// prev holds the m samples before x and receives the last m of the joined record.
+// First block (count 0): the scaled data matrix into xm and r = xm^H xm. Continuing block: r
+// becomes (count r + the products of the rows of the new times) / (count + n), those rows (of
+// every type, forward only) scaled by 1/sqrt(count + n) into xm. prev holds the m samples before
+// x and receives the last m of the joined record.
 template <class T>
 Status AutoCorrMatrix(const T* x, int32_t n, T* prev, int32_t m, int32_t type, int32_t count, T* r, T* xm);
 
