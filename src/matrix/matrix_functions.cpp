@@ -31,6 +31,8 @@ template <class T> bool OffDiagonalZero(const T* a, int32_t n) {
 template <class T> Status Product(const T* a, const T* b, int32_t n, T* c) { return MatMul<T>(a, b, n, n, n, c, 0); }
 
 double ExpOf(double x) { return std::exp(x); }
+double ScaleByPowerOf2(double x, int32_t e) { return std::ldexp(x, e); }
+cdouble ScaleByPowerOf2(cdouble z, int32_t e) { return {std::ldexp(z.real(), e), std::ldexp(z.imag(), e)}; }
 cdouble ExpOf(cdouble z) {
     const double e = std::exp(z.real());
     return {e * std::cos(z.imag()), e * std::sin(z.imag())};
@@ -85,8 +87,8 @@ template <class T> Status MatrixExp(T* a, int32_t n) {
     int32_t s = 0;
     if (norm >= 0.5) {
         s = static_cast<int32_t>(std::log(norm) / std::log(2.0) + 1.0);
-        const double scaleBy = std::ldexp(1.0, s);
-        for (size_t i = 0; i < nn; ++i) a[i] /= scaleBy;
+        // Division by 2^s through the exponent, so that s = 1025 (2^s not representable) still scales.
+        for (size_t i = 0; i < nn; ++i) a[i] = ScaleByPowerOf2(a[i], -s);
     }
     for (size_t i = 0; i < nn; ++i) {
         num[i] = a[i] / 2.0;
@@ -116,7 +118,7 @@ template <class T> Status MatrixExp(T* a, int32_t n) {
         const Status inv = LuInverse(den, perm.get(), n, den);
         if constexpr (kIsComplex<T>) st = lu == SingularPivotWarn ? SingularMatrixErr : lu != 0 ? lu : inv;
     }
-    // R = D^-1 N, then s squarings, two per pass through the spare block.
+    // R = D^-1 N, then s squarings alternating between two blocks.
     if (st == 0) st = Product(den, num, n, x);
     for (int32_t k = 0; k < s && st == 0; ++k) {
         st = Product(x, x, n, spare);

@@ -65,6 +65,13 @@ TEST(Exp, RotationAndComplexDiagonal) {
     EXPECT_NEAR(z.at(0, 0).real(), -1, 1e-15);
     EXPECT_NEAR(z.at(0, 0).imag(), 0, 1e-15);
     EXPECT_NEAR(z.at(1, 1).real(), 2, 4e-16);
+    // A nilpotent matrix of norm 1e308 needs 1025 halvings, more than one power of 2 can hold.
+    D2 big(2, 2, {0, 1e308, 0, 0});
+    MatrixExp_head(big.h(), &status);
+    ASSERT_EQ(status, 0);
+    EXPECT_EQ(big.at(0, 0), 1);
+    EXPECT_NEAR(big.at(0, 1), 1e308, 1e293);
+    EXPECT_EQ(big.at(1, 0), 0);
     // An infinite element would leave the number of squarings undefined.
     D2 inf(2, 2, {1, INFINITY, 0, 1});
     MatrixExp_head(inf.h(), &status);
