@@ -296,8 +296,8 @@ Status CxMatrixLog(const cdouble* a, int32_t n, cdouble* out, int32_t realInput)
     if (s != 0) return s;
 
     Scratch<cdouble> work;
-    if (work.Allocate(4 * nn) != 0) return OutOfMemoryErr;
-    cdouble *e = work.get(), *best = e + nn, *l = best + nn, *c = l + nn;
+    if (work.Allocate(5 * nn) != 0) return OutOfMemoryErr;
+    cdouble *e = work.get(), *best = e + nn, *l = best + nn, *c = l + nn, *inv = c + nn;
     double err = 0;
     s = ExpError(a, out, n, e, &err);
     if (s == 0 && err < 1e-12) return MergeRelease(0, work.Release());
@@ -328,12 +328,10 @@ Status CxMatrixLog(const cdouble* a, int32_t n, cdouble* out, int32_t realInput)
     std::copy(best, best + nn, l);
     bool done = ExpError(a, l, n, e, &err) != 0;
     for (int32_t pass = 0; pass < 2 && !done; ++pass) {
-        Scratch<cdouble> inv;
-        if (inv.Allocate(nn) != 0) break;
-        std::copy(e, e + nn, inv.get());
-        if (InvertByLu(inv.get(), n) != 0) break;
+        std::copy(e, e + nn, inv);
+        if (InvertByLu(inv, n) != 0) break;
         for (size_t i = 0; i < nn; ++i) e[i] -= a[i];
-        if (Product(e, inv.get(), n, c) != 0 || CxHasNonFinite(c, static_cast<int32_t>(nn))) break;
+        if (Product(e, inv, n, c) != 0 || CxHasNonFinite(c, static_cast<int32_t>(nn))) break;
         bool small = true;
         for (size_t i = 0; i < nn; ++i) {
             l[i] -= c[i];
