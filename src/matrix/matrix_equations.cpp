@@ -91,7 +91,8 @@ Status ColumnSolve(const T* a, const T* b, int32_t m, int32_t n, bool lowerB, in
     int32_t j = lowerB ? n - 1 : 0;
     while (s == 0 && j >= 0 && j < n) {
         const int32_t other = lowerB ? j - 1 : j + 1;
-        const bool pair = other >= 0 && other < n && Magnitude(lowerB ? B(other, j) : B(other, j)) >= threshold;
+        // The coupling element of a 2 by 2 block: below the diagonal of an upper B, above it in a lower one.
+        const bool pair = other >= 0 && other < n && Magnitude(B(other, j)) >= threshold;
         if (!pair) {
             const int32_t order = m;
             for (int32_t q = 0; q < m; ++q)
