@@ -51,4 +51,19 @@ TW_API int32_t CxSpectrumH_IDP(Array1DHandle x, Array1DHandle y, void** cell);
 TW_API int32_t CrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
 TW_API int32_t CxCrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
 
+/* Hartley, Hilbert, chirp-Z and Zak transforms. */
+
+/* Fast Hartley transform of x (f64) in place: H[k] = Re X[k] - Im X[k] of its DFT X. The inverse
+ * is the same transform times 1/n; a failure to get its table leaves x as it is. */
+TW_API int32_t FHTH(Array1DHandle x, void** cell);
+TW_API int32_t InvFHTH(Array1DHandle x, void** cell);
+/* Hilbert transform of x (f64) in place: the spectrum times -i with DC and Nyquist cleared, so a
+ * cosine at a bin becomes the sine. The inverse is its negation. */
+TW_API int32_t FastHilbertTransformH(Array1DHandle x, void** cell);
+TW_API int32_t InvFastHilbertTransformH(Array1DHandle x, void** cell);
+TW_API int32_t FHTH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t InvFHTH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t FastHilbertTransformH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t InvFastHilbertTransformH_IDP(Array1DHandle x, void** cell);
+
 #endif
