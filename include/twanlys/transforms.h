@@ -66,4 +66,19 @@ TW_API int32_t InvFHTH_IDP(Array1DHandle x, void** cell);
 TW_API int32_t FastHilbertTransformH_IDP(Array1DHandle x, void** cell);
 TW_API int32_t InvFastHilbertTransformH_IDP(Array1DHandle x, void** cell);
 
+/* Discrete Zak transform into outLength complex values of y: for each phase m below M the
+ * length-N DFT H_m of x[m + j M] (zeros past the end of x), summed as
+ * y[q] = sum over m of H_m[(p + q) mod N] exp(-2 pi i m (q0 + q) / (M N)), with p = offset mod N
+ * and q0 = offset mod M N, both taken non-negative. A record longer than M N is first folded into
+ * its first M N samples in place (x is changed): the samples from x[N] on are added to x[0], x[1],
+ * ... pass by pass. An empty x gives an empty y and status 0. */
+TW_API int32_t ReDZTH(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                      Array1DHandle y, void** cell);
+TW_API int32_t CxDZTH(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                      Array1DHandle y, void** cell);
+TW_API int32_t ReDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                          Array1DHandle y, void** cell);
+TW_API int32_t CxDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                          Array1DHandle y, void** cell);
+
 #endif
