@@ -81,4 +81,19 @@ TW_API int32_t ReDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset,
 TW_API int32_t CxDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
                           Array1DHandle y, void** cell);
 
+/* Chirp-Z transform of x (f64, or complex for the Cx form): y[j] = sum over k of x[k] A^(-k) W^(jk)
+ * for j below m (below 1: the count of x), the powers z^t taken as (|z|^2)^(t/2) times
+ * (cos t theta, sin t theta) with theta the principal argument of z. method 0 sums directly,
+ * method 1 runs Bluestein's convolution (fast; its chirps W^(-t^2/2) suit |W| = 1). A and W must be
+ * finite and not zero (a null pointer reads as NaN). */
+TW_API int32_t ChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                            int32_t method, Array1DHandle y);
+TW_API int32_t CxChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                              int32_t method, Array1DHandle y);
+/* The m samples y (m at most the count n of x; below 1: n) whose chirp-Z with A and W gives x at
+ * its first m points: the Vandermonde system of the nodes W^j solved exactly. Nodes that coincide
+ * (W a root of unity of order below m) give DivideByZeroErr. */
+TW_API int32_t InvChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                               Array1DHandle y);
+
 #endif
