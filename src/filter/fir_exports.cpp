@@ -238,17 +238,18 @@ TW_API int32_t Parks(int32_t* taps, double* fs, Array1DHandle bands, int32_t* ki
 TW_API int32_t FIRNarrowCoef_head(double* fs, double* firstEdge, double* secondEdge, double* centre,
                                   double* ripple, double* attenuation, int32_t* type, NarrowFilterSpec* spec,
                                   int32_t* status) {
+    if (spec == nullptr) return ToPointer(status, DesignParameterErr);
     return ToPointer(status, DesignNarrowband(*fs, *firstEdge, *secondEdge, *centre, *ripple, *attenuation, *type,
                                               spec));
 }
 
 TW_API int32_t FIRnarrowFilter_head(Array1DHandle x, NarrowFilterSpec* spec, Array1DHandle y, int32_t* status) {
-    return ToPointer(status, RunNarrowband<double>(x, spec, y));
+    return ToPointer(status, spec == nullptr ? EmptyArrayErr : RunNarrowband<double>(x, spec, y));
 }
 
 TW_API int32_t CxSigFIRnarrowFilter_head(Array1DHandle x, NarrowFilterSpec* spec, Array1DHandle y,
                                          int32_t* status) {
-    return ToPointer(status, RunNarrowband<cdouble>(x, spec, y));
+    return ToPointer(status, spec == nullptr ? EmptyArrayErr : RunNarrowband<cdouble>(x, spec, y));
 }
 
 TW_API int32_t ppMultiRateFIRH_DBL(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t mode, int32_t L,

@@ -129,23 +129,6 @@ TEST_P(Fir, EquirippleRefusalsEmptyHAndGiveNaN) {
     EXPECT_EQ(p.ret, 2);
 }
 
-TEST_P(Fir, EquirippleIterationLimit) {
-    const std::vector<Band> low{{1, 0, 0.2, 1}, {0, 0.25, 0.5, 1}};
-    const ParksResult byDefault = RunParks(41, 1, low, 0, 0);
-    EXPECT_EQ(byDefault.status, 0);
-    EXPECT_EQ(byDefault.h.size(), 41u);
-    // Limit 1 makes no exchange; limit 2 makes one, which cannot settle (no previous level).
-    const ParksResult one = RunParks(41, 1, low, 0, 1);
-    EXPECT_EQ(one.status, DesignParameterErr);
-    EXPECT_EQ(one.deviation, 0.0);
-    EXPECT_TRUE(one.h.empty());
-    const ParksResult two = RunParks(41, 1, low, 0, 2);
-    EXPECT_EQ(two.status, DesignParameterErr);
-    EXPECT_GT(two.deviation, 0.0);
-    EXPECT_LT(two.deviation, byDefault.deviation);
-    EXPECT_TRUE(two.h.empty());
-}
-
 TEST_P(Fir, NarrowbandDesignRefusals) {
     struct Row {
         double f1, f2, centre, ripple, attenuation;
@@ -166,20 +149,13 @@ TEST_P(Fir, NarrowbandDesignRefusals) {
         EXPECT_EQ(model.size(), 0);
         EXPECT_EQ(image.size(), 0);
     }
-    // A filter without taps, or an empty block, is refused by the narrowband filters.
-    Array1D<double> model, image, x{1.0, 2.0}, y{4.0}, none;
+    // The spec a failed design leaves has no taps to run.
+    Array1D<double> model, image, x{1.0, 2.0}, y{4.0};
     NarrowFilterSpec spec{0, 0, model.h(), image.h()};
     int32_t status = 0;
     FIRnarrowFilter_head(x.h(), &spec, y.h(), &status);
     EXPECT_EQ(status, EmptyArrayErr);
-    Array1D<double> one{1.0};
-    spec = {0, 1, one.h(), image.h()};
-    FIRnarrowFilter_head(none.h(), &spec, y.h(), &status);
-    EXPECT_EQ(status, EmptyArrayErr);
     EXPECT_EQ(y.size(), 0);
-    FIRnarrowFilter_head(x.h(), &spec, y.h(), &status);
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(y.vec(), V({1.0, 2.0}));
 }
 
 TEST_P(Fir, MultiRateStatusesShrinkOutputsAndZeroCounters) {
