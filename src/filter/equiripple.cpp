@@ -39,6 +39,35 @@ double Evaluate(const Interpolant& p, double c) {
     return num / den;
 }
 
+// Evaluate at several points at once, each summed exactly as Evaluate sums it: the compensated
+// denominator is a chain of dependent additions, and interleaving independent chains hides it.
+constexpr int kBatch = 4;
+
+void EvaluateBatch(const Interpolant& p, const double* c, double* out) {
+    double num[kBatch] = {}, den[kBatch] = {}, carry[kBatch] = {};
+    for (int32_t j = 0; j < p.nz; ++j) {
+        const double xj = p.x[j], aj = p.ad[j], yj = p.y[j];
+        for (int u = 0; u < kBatch; ++u) {
+            const double t = aj / (c[u] - xj);
+            num[u] += t * yj;
+            const double term = t - carry[u];
+            const double sum = den[u] + term;
+            carry[u] = (sum - den[u]) - term;
+            den[u] = sum;
+        }
+    }
+    for (int u = 0; u < kBatch; ++u) {
+        out[u] = num[u] / den[u];
+        // A point on an extremal divided by zero on the way: its value is the extremal's.
+        if (!std::isfinite(out[u]))
+            for (int32_t j = 0; j < p.nz; ++j)
+                if (c[u] == p.x[j]) {
+                    out[u] = p.y[j];
+                    break;
+                }
+    }
+}
+
 // 1 / product of 2 (x_k - x_j), taken in strides so that neighbours do not meet in a row; the
 // factor 2 keeps products of up to 2047 differences of cosines clear of underflow.
 bool BarycentricWeights(const double* x, int32_t nz, int32_t r, double* ad) {
@@ -98,14 +127,31 @@ struct Search {
     const Grid& g;
     const Interpolant& p;
     double nut = 1.0;
+    // Errors of a few neighbouring grid points, computed together: the search mostly walks the
+    // grid point by point. Valid for one interpolant, that is one exchange.
+    int32_t first = -1, last = -2, previous = -2;
+    double cached[kBatch] = {};
 
-    double E(int32_t l) const {
-        const double err = (Evaluate(p, g.c[l]) - g.des[l]) * g.wt[l];
-        return nut * err;
+    double Raw(int32_t l) {
+        if (l < first || l > last) {
+            // Ahead in the direction of the walk; after a jump (a new extremal's first test, next
+            // to it the first steps up and down) around the point.
+            int32_t lo = l < previous ? l - (kBatch - 1) : l == previous + 1 ? l : l - 2;
+            lo = std::max(0, std::min(lo, g.n - kBatch));
+            double c[kBatch];
+            for (int u = 0; u < kBatch; ++u) c[u] = g.c[std::min(lo + u, g.n - 1)];
+            EvaluateBatch(p, c, cached);
+            first = lo;
+            last = std::min(lo + kBatch - 1, g.n - 1);
+        }
+        previous = l;
+        const double a = cached[l - first];
+        return (a - g.des[l]) * g.wt[l];
     }
+    double E(int32_t l) { return nut * Raw(l); }
     // Climbs upward from l (E(l) = comp already taken) while E strictly rises below kup; returns
     // the last index reached.
-    int32_t Up(int32_t l, int32_t kup, double* comp) const {
+    int32_t Up(int32_t l, int32_t kup, double* comp) {
         for (;;) {
             ++l;
             if (l >= kup) break;
@@ -115,7 +161,7 @@ struct Search {
         }
         return l - 1;
     }
-    int32_t Down(int32_t l, int32_t klow, double* comp) const {
+    int32_t Down(int32_t l, int32_t klow, double* comp) {
         for (;;) {
             --l;
             if (l <= klow) break;
