@@ -127,47 +127,63 @@ Status Rational(const Signal<T>& v, int64_t count, const R* h, int32_t taps, int
     return rows.Release();
 }
 
+// y[o] = sum_k hr[k] q[o step + k] for o in [0, count), hr the taps reversed: several outputs side
+// by side, inputs `step` apart.
 template <class T, class R>
-void Accumulate(T* __restrict acc, const R* __restrict r, T xi, int32_t kn) {
-    for (int32_t k = 0; k < kn; ++k) acc[k] += xi * r[k];
+void Forward(const T* q, int64_t step, const R* hr, int32_t taps, T* y, int64_t count) {
+    constexpr int B = sizeof(T) == 4 ? 8 : 4;
+    int64_t o = 0;
+    for (; o + B <= count; o += B) {
+        T a[B] = {};
+        const T* base = q + o * step;
+        for (int32_t k = 0; k < taps; ++k) {
+            const R hk = hr[k];
+            const T* pk = base + k;
+            for (int u = 0; u < B; ++u) a[u] += hk * pk[u * step];
+        }
+        for (int u = 0; u < B; ++u) y[o + u] = a[u];
+    }
+    for (; o < count; ++o) {
+        T a{};
+        const T* pk = q + o * step;
+        for (int32_t k = 0; k < taps; ++k) a += hr[k] * pk[k];
+        y[o] = a;
+    }
 }
 
-// Decimation in transposed form: each input adds into the accumulators of the outputs it feeds;
-// the oldest one is complete when the counter comes round to 0. The accumulators slide along a
-// longer buffer, so that completing one costs no shift of the others.
+// Decimation with the results of the transposed form: each output is its running accumulator,
+// the contributions of the inputs added in their order, oldest first. Output m of the block
+// (at input p + m M) starts from the carried accumulator when m < K, else from 0; the outputs
+// whose inputs all lie in the block are formed directly, and the K accumulators of the outputs
+// still to come are left in the state. Only the outputs that are kept are formed.
 template <class T, class R>
 Status Decimate(const T* x, int32_t n, const R* h, int32_t taps, int32_t M, T* state, int64_t* d, int32_t* counter,
                 T* y) {
     const int32_t K = static_cast<int32_t>(CeilDiv(taps, M));
-    const int32_t cap = K + 4096;
-    Scratch<R> rows;
-    Scratch<T> buffer;
-    if (const Status s = Polyphase(h, taps, M, K, &rows)) return s;
-    if (const Status s = buffer.Allocate(static_cast<size_t>(cap))) return s;
-    T* buf = buffer.get();
-    std::copy(state, state + K, buf);
-    int32_t b = 0, c = *counter;
-    int64_t o = 0;
-    for (int32_t i = 0; i < n; ++i) {
-        const T xi = x[i];
-        const int32_t j = (M - c) % M;
-        Accumulate(buf + b, rows.get() + static_cast<size_t>(j) * K, xi, BranchTaps(taps, M, j));
-        if (c == 0) {
-            if (*d > 0)
-                --*d;
-            else
-                y[o++] = buf[b];
-            if (++b + K > cap) {
-                std::copy(buf + b, buf + b + K - 1, buf);
-                b = 0;
-            }
-            buf[b + K - 1] = T{};
-        }
-        c = c + 1 == M ? 0 : c + 1;
-    }
-    std::copy(buf + b, buf + b + K, state);
-    *counter = c;
-    return MergeRelease(rows.Release(), buffer.Release());
+    const int64_t p = (M - *counter) % M;
+    const int64_t events = CeilDiv(n - p, M);
+    const int64_t dropped = std::min(*d, events);
+    Scratch<R> reversed;
+    Scratch<T> carried;
+    if (const Status s = reversed.Allocate(static_cast<size_t>(taps))) return s;
+    if (const Status s = carried.Allocate(static_cast<size_t>(K))) return s;
+    std::reverse_copy(h, h + taps, reversed.get());
+    std::copy(state, state + K, carried.get());
+    // Accumulator of output m over the inputs of the block up to `end` (exclusive).
+    auto partial = [&](int64_t m, int64_t end) {
+        const int64_t at = p + m * M;
+        T a = m < K ? carried[static_cast<size_t>(m)] : T{};
+        for (int64_t i = std::max<int64_t>(0, at - taps + 1); i < end; ++i) a += x[i] * h[at - i];
+        return a;
+    };
+    const int64_t carriedEnd = std::min<int64_t>(K, events);
+    for (int64_t m = dropped; m < carriedEnd; ++m) y[m - dropped] = partial(m, p + m * M + 1);
+    const int64_t m0 = std::max<int64_t>(K, dropped);
+    if (m0 < events) Forward(x + (p + m0 * M - taps + 1), M, reversed.get(), taps, y + (m0 - dropped), events - m0);
+    for (int32_t k = 0; k < K; ++k) state[k] = partial(events + k, n);
+    *d -= dropped;
+    *counter = static_cast<int32_t>((*counter + n) % M);
+    return MergeRelease(reversed.Release(), carried.Release());
 }
 
 }  // namespace
