@@ -222,7 +222,9 @@ TEST_P(Fir, SinglePurposeStreamsCheckTheirState) {
     EXPECT_EQ(DecimatorFIRH(x.h(), y.h(), 5.0, 2, h.h(), st.h(), 1, 3, &delay), 0);
     ASSERT_EQ(st.size(), 4);
     EXPECT_EQ(y.vec(), V({3.0, 10.0}));  // x0 + x1, x0 + .. + x3 (h is 5 ones; the gain is unused)
-    EXPECT_EQ(st[3], 0.0);                // five inputs from counter 1 end at 0
+    // The running sums of the outputs still to come (at inputs 5, 7, 9), then the counter: five
+    // inputs from counter 1 end at 0.
+    EXPECT_EQ(st.vec(), V({2.0 + 3 + 4 + 5, 4.0 + 5, 0.0, 0.0}));
 }
 
 INSTANTIATE_TEST_SUITE_P(Placement, Fir, ::testing::Bool(), twtest::PlacementName);
