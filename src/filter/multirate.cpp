@@ -2,9 +2,8 @@
 
 #include <algorithm>
 #include <complex>
-#include <cstring>
-#include <type_traits>
 #include <numeric>
+#include <type_traits>
 
 namespace tw {
 
