@@ -113,6 +113,8 @@ TEST_P(Fir, EquirippleRefusalsEmptyHAndGiveNaN) {
         {"Hilbert odd end", 21, 1, {{1, 0.05, 0.4995, 1}}, 2, DesignParameterErr},
         {"unknown kind", 21, 1, low, 3, DesignParameterErr},
         {"too long", 4093, 1, low, 0, OutOfMemoryErr},
+        // Beyond double precision: the levelled error falls, and the exchange gives up at once.
+        {"falling level", 1501, 1, {{1, 0, 0.1, 1}, {0, 0.11, 0.5, 1}}, 0, DesignParameterErr},
     };
     for (const Row& r : rows) {
         const ParksResult p = RunParks(r.taps, r.fs, r.bands, r.kind, 100);
