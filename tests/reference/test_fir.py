@@ -269,6 +269,7 @@ class Streams(unittest.TestCase):
         n, blocks = 400, (5, 1, 184, 210)
         for aligned in (False, True):
             tw.placement(aligned)
+            self.addCleanup(tw.placement, False)
             for member, (dt, rt) in MEMBERS.items():
                 x = rng.standard_normal(n) + (1j * rng.standard_normal(n) if np.dtype(dt).kind == "c" else 0)
                 h = rng.standard_normal(31).astype(rt)
@@ -305,7 +306,6 @@ class Streams(unittest.TestCase):
                         self.assertTrue(np.array_equal(np.concatenate(parts), y), (member, mode, comp))
                         self.assertEqual((d, p), (d_one, p_one))
                         self.assertEqual(p, (n * up + (down - c % down)) % down if mode >= 2 else 0)
-        tw.placement(False)
 
     def test_single_purpose_streams(self):
         rng = np.random.default_rng(4)
