@@ -9,7 +9,7 @@ namespace tw {
 
 enum EquirippleKind : int32_t { kMultiband = 0, kDifferentiator = 1, kHilbert = 2 };
 
-// One band of the specification, in the caller's units of frequency.
+// One band of a design, in the caller's units of frequency.
 struct EquirippleBand {
     double gain;
     double lower;

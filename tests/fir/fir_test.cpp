@@ -151,7 +151,7 @@ TEST_P(Fir, NarrowbandDesignRefusals) {
         EXPECT_EQ(model.size(), 0);
         EXPECT_EQ(image.size(), 0);
     }
-    // The spec a failed design leaves has no taps to run.
+    // The record a failed design leaves has no taps to run.
     Array1D<double> model, image, x{1.0, 2.0}, y{4.0};
     NarrowFilterSpec spec{0, 0, model.h(), image.h()};
     int32_t status = 0;
