@@ -36,8 +36,9 @@ TW_API int32_t Parks(int32_t* taps, double* fs, Array1DHandle bands, int32_t* ki
 
 /* Narrowband design as an interpolated FIR (an image filter and a model filter stretched by L).
  * Edges: the pass edge first, then the stop edge; for the band types full widths around centre.
- * ripple is linear (peak to peak in the pass band), attenuation in dB. type: 0 lowpass, 1
- * highpass, 2 bandpass, 3 bandstop. On failure both arrays are emptied and interpolation is 0. */
+ * ripple is linear (each stage keeps its pass band within ripple / 2 of 1), attenuation in dB.
+ * type: 0 lowpass, 1 highpass, 2 bandpass, 3 bandstop. On failure both arrays are emptied and
+ * interpolation is 0. */
 TW_API int32_t FIRNarrowCoef_head(double* fs, double* firstEdge, double* secondEdge, double* centre,
                                   double* ripple, double* attenuation, int32_t* type, NarrowFilterSpec* spec,
                                   int32_t* status);
