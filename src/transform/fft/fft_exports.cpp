@@ -90,8 +90,7 @@ Status ComplexForward(Handle x, Handle& y, void** cell, int32_t start, int32_t s
 
 // The opening of the exports that transform the whole of x: x must not be empty, the table of
 // its length comes from the cell, and y is resized to as many elements. Its frame fails on any
-// non-zero status; y shrinks with the complex type code, f64 outputs included (the block is
-// emptied all the same).
+// non-zero status; y shrinks with its own type code.
 struct WholeLength {
     Frame f{tw::FailOn::NonZero};
     tw::CachedTables tables;
@@ -102,7 +101,7 @@ struct WholeLength {
     template <class Out>
     WholeLength(Handle x, Handle& y, void** cell, bool instanceData, Out** out)
         : tables(cell, instanceData), count(tw::Count(x)) {
-        f.Output<cdouble>(y);
+        f.Output<Out>(y);
         s = count < 1 ? EmptyArrayErr : 0;
         if (s == 0) s = tables.Acquire(0, count, &table);
         if (s == 0) s = f.Resize(y, count, out);
