@@ -2,7 +2,7 @@
 # Installs what building and testing need, from Debian's packages. Does nothing when all is there.
 set -euo pipefail
 packages=(cmake ninja-build g++ libgtest-dev libbenchmark-dev libfftw3-dev pkg-config python3-numpy python3-scipy
-          liblapack-dev libblas-dev libblis4-serial)
+          liblapack-dev libblas-dev libblis4-serial clang libclang-rt-14-dev)
 missing=()
 for p in "${packages[@]}"; do
   dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q "install ok installed" || missing+=("$p")

@@ -19,7 +19,7 @@ ELEMS = {"i32": ("I32", 4, "int32_t"), "u8": ("U8", 1, "uint8_t"), "u32": ("U32"
          "c128": ("C128", 16, None), "len": ("Len", 4, "int32_t")}
 DIRS = {"in": "In", "out": "Out", "io": "Io"}
 STYLES = {"ret": "Ret", "ptr": "Ptr", "both": "Both", "cluster": "Cluster", "none": "None"}
-CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep"}
+CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work"}
 
 
 class RowError(Exception):
@@ -139,7 +139,8 @@ def parse_signature(sig):
 
 
 def parse_contract(text, args):
-    c = {"fail_nonzero": False, "keep": [], "zero": [], "stand": [], "result_host": False, "nosweep": False}
+    c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False,
+         "nosweep": False}
     names = [a["name"] for a in args]
     for tok in text.split():
         key, _, value = tok.partition("=")
@@ -149,7 +150,7 @@ def parse_contract(text, args):
             if value not in ("nonzero", "negative"):
                 raise RowError("fail=%s: nonzero or negative" % value)
             c["fail_nonzero"] = value == "nonzero"
-        elif key in ("keep", "zero"):
+        elif key in ("keep", "zero", "work"):
             for v in value.split(","):
                 if v not in names:
                     raise RowError("%s names %r, which is no argument" % (key, v))
@@ -254,13 +255,13 @@ def write_table(rows, path, stem, includes):
         else:
             body = "sweep::Outcome o; o.p = reinterpret_cast<const void*>(%s); return o;" % call
         c = r["c"]
-        masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero")]
+        masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
-        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, %s,\n'
+        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
                    '     [](sweep::Slots& s) -> sweep::Outcome { %s }},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
-                      str(c["nosweep"]).lower(), masks[0], masks[1], stand, body))
+                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, body))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 

@@ -65,6 +65,7 @@ struct Row {
     bool noSweep;
     uint32_t keep;  // bit per argument
     uint32_t zero;
+    uint32_t work;  // outputs whose contents are working memory
     int32_t stand[4];
     Outcome (*call)(Slots&);
 };
@@ -77,6 +78,7 @@ struct Choice {
     int32_t i = 0;     // i32 scalars and pointees, i32 record fields
     double d = 0.5;    // f64 scalars and pointees, f64 record fields
     bool null = false;
+    std::vector<unsigned char> raw = {};  // element bytes, repeated, in place of the pattern (fuzzing)
 };
 using Case = std::vector<Choice>;
 
@@ -212,11 +214,13 @@ public:
         if (s.nested != nullptr && (nestedIn || !inputsOnly)) Append(&v, s.nested);
         return v;
     }
-    // Addresses of handles inside records differ from run to run and are left out.
+    // Addresses of handles inside records differ from run to run and are left out, and so are
+    // the contents of working memory handed out.
     uint64_t Digest() const {
         uint64_t h = 1469598103934665603ull;
         for (int a = 0; a < row_.nArgs; ++a) {
             std::vector<unsigned char> v = Snapshot(a);
+            if ((row_.work >> a) & 1) v.resize(std::min<size_t>(v.size(), row_.args[a].kind == Kind::H2 ? 8 : 4));
             for (int32_t f = 0; f < row_.args[a].nFields; ++f)
                 if (IsHandle(row_.args[a].fields[f].kind))
                     std::memset(v.data() + row_.args[a].fields[f].offset, 0, sizeof(void**));
@@ -268,7 +272,9 @@ private:
         const int32_t shape[2] = {c.rows, c.cols};
         void** h = TWRTNewArray(elemBytes, dims, shape);
         const int64_t n = dims == 2 ? int64_t{std::max(c.rows, 0)} * std::max(c.cols, 0) : std::max(c.rows, 0);
-        FillElements(static_cast<unsigned char*>(*h) + 4 * dims, e, elemBytes, n, c.fill);
+        auto* data = static_cast<unsigned char*>(*h) + 4 * dims;
+        FillElements(data, e, elemBytes, n, c.fill);
+        for (int64_t k = 0; !c.raw.empty() && k < n * elemBytes; ++k) data[k] = c.raw[static_cast<size_t>(k) % c.raw.size()];
         return h;
     }
 

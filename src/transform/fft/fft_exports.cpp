@@ -43,7 +43,7 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
     if (s == 0) s = f.In(x, &xs);
     // One block for the half-complex result (transformed at unit stride, where the kernels are
     // fastest, then unpacked into y) and, when the window reaches past x, the zero-padded input.
-    const bool pad = size > count - start;
+    const bool pad = s == 0 && size > count - start;  // start is known to lie inside x only then
     tw::Scratch<double> work;
     if (s == 0) s = work.Allocate(static_cast<size_t>(size) * (pad ? 2 : 1));
     const double* source = xs + (s == 0 ? start : 0);
