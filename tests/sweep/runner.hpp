@@ -70,8 +70,10 @@ inline std::vector<std::string> SweepRow(const Row& row, int random, Tally* tall
     const bool trace = std::getenv("TW_SWEEP_TRACE") != nullptr;
     const auto start = std::chrono::steady_clock::now();
     std::vector<void*> cells(static_cast<size_t>(row.nArgs), nullptr);
+    std::set<int32_t> statuses;
     auto run = [&](const Case& c, int32_t failAt) {
         Verdict v = CallAndJudge(row, c, cells.data(), failAt);
+        statuses.insert(v.status);
         ++tally->calls;
         tally->failed += v.failed ? 1 : 0;
         faults.insert(faults.end(), v.faults.begin(), v.faults.end());
@@ -100,9 +102,12 @@ inline std::vector<std::string> SweepRow(const Row& row, int random, Tally* tall
         for (size_t k = cases.size() - static_cast<size_t>(random); k < cases.size(); ++k) run(cases[k], 0);
     }
     ReleaseCells(row, cells.data(), true);
-    if (trace)
-        std::fprintf(stderr, "%-32s %6zu cases %8.3f s\n", row.name, cases.size(),
+    if (trace) {
+        std::fprintf(stderr, "%-32s %6zu cases %8.3f s, statuses", row.name, cases.size(),
                      std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
+        for (int32_t st : statuses) std::fprintf(stderr, " %d", st);
+        std::fprintf(stderr, "\n");
+    }
     return faults;
 }
 
