@@ -16,7 +16,10 @@ int32_t FillByPointer(Handle out, int32_t n, Status checked, int32_t* status, Co
     T* y = nullptr;
     int32_t resized = 0;
     Status s = checked;
-    if (s == 0 && (resized = f.Resize(out, n, &y)) != 0) s = OutOfMemoryErr;
+    if (s == 0 && (resized = f.Resize(out, n, &y)) != 0) {
+        s = OutOfMemoryErr;
+        if (!f.ResizeHasFailed()) resized = 0;  // only the aligned copy failed, not the host
+    }
     if (s == 0) s = core(f, y, n);
     ToPointer(status, f.Finish(s));
     return resized;
