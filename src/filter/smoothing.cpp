@@ -7,7 +7,6 @@
 #include <cstring>
 
 #include "matrix/decompose.hpp"
-#include "matrix/matrix_core.hpp"
 #include "numeric/sort.hpp"
 
 namespace tw {
@@ -75,7 +74,7 @@ Status SavitzkyGolayDesign(int32_t order, int32_t frame, const double* weights, 
             for (int32_t j = 0; j < c; ++j) scaled[Cells(i, c) + static_cast<size_t>(j)] *= root;
         }
     // Non-finite weights, or powers of the abscissa beyond the double range.
-    Status s = HasNonFinite(scaled, static_cast<int32_t>(std::min<size_t>(fc, INT32_MAX))) ? NanInfErr : 0;
+    Status s = std::all_of(scaled, scaled + fc, [](double v) { return std::isfinite(v); }) ? 0 : NanInfErr;
     if (s == 0) s = QrHouseholder<double>(scaled, f, c, 1, nullptr, r);
     for (int32_t i = 0; s == 0 && i < c; ++i)
         if (r[Cells(i, c) + static_cast<size_t>(i)] == 0) s = SingularMatrixErr;
