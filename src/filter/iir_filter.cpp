@@ -1,0 +1,192 @@
+#include "filter/iir_filter.hpp"
+
+#include <algorithm>
+#include <cmath>
+
+namespace tw {
+namespace {
+
+using cdouble = std::complex<double>;
+
+constexpr double kSmallestNormal = 2.2250738585072014e-308;
+
+// Products and quotients written out: the library's complex arithmetic has no special-value
+// recovery and no scaling, and a real factor scales the two parts separately.
+inline double Mul(double c, double v) { return c * v; }
+inline cdouble Mul(double c, cdouble v) { return {c * v.real(), c * v.imag()}; }
+inline cdouble Mul(cdouble c, double v) { return {c.real() * v, c.imag() * v}; }
+inline cdouble Mul(cdouble c, cdouble v) {
+    return {c.real() * v.real() - c.imag() * v.imag(), c.real() * v.imag() + c.imag() * v.real()};
+}
+inline double Div(double v, double c) { return v / c; }
+inline cdouble Div(cdouble v, double c) { return {v.real() / c, v.imag() / c}; }
+inline cdouble Div(cdouble v, cdouble c) {
+    const double d = c.real() * c.real() + c.imag() * c.imag();
+    return {(v.real() * c.real() + v.imag() * c.imag()) / d, (v.imag() * c.real() - v.real() * c.imag()) / d};
+}
+inline double Flush(double v) { return std::fabs(v) <= kSmallestNormal ? 0.0 : v; }
+inline cdouble Flush(cdouble v) { return {Flush(v.real()), Flush(v.imag())}; }
+
+template <class In, class Out, class C>
+void RecursiveFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t na, Cells<C> b, int32_t nb,
+                     Cells<In> xs, Cells<Out> ys) {
+    const C a0 = a[0];
+    for (int32_t i = 0; i < n; ++i) {
+        const In xi = x[i];
+        Out acc{};
+        for (int32_t j = nb - 1; j >= 2; --j) {
+            const int32_t k = nb - 1 - j;
+            acc += Mul(b[j], xs[k]);
+            xs.Set(k, xs[k + 1]);
+        }
+        if (nb > 1) {
+            acc += Mul(b[1], xs[nb - 2]);
+            xs.Set(nb - 2, xi);
+        }
+        acc += Mul(b[0], xi);
+        for (int32_t j = na - 1; j >= 2; --j) {
+            const int32_t k = na - 1 - j;
+            acc -= Mul(a[j], ys[k]);
+            ys.Set(k, ys[k + 1]);
+        }
+        const Out v = Flush(na < 2 ? Div(acc, a0) : Div(acc - Mul(a[1], ys[na - 2]), a0));
+        if (na > 1) ys.Set(na - 2, v);
+        y.Set(i, v);
+    }
+}
+
+// Outputs from the last backward, so that y may overwrite x; indices before 0 read the state.
+template <class In, class Out, class C>
+Status FirFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> b, int32_t nb, Cells<In> xs) {
+    if (nb == 1) {
+        const C b0 = b[0];
+        for (int32_t i = 0; i < n; ++i) y.Set(i, Mul(b0, x[i]));
+        return 0;
+    }
+    // A short tail (always so for one sample) stays on the stack.
+    const int32_t keep = std::min(nb - 1, n);
+    In local[16];
+    Scratch<In> heap;
+    In* tail = local;
+    if (keep > 16) {
+        if (const Status s = heap.Allocate(static_cast<size_t>(keep))) return s;
+        tail = heap.get();
+    }
+    for (int32_t k = 0; k < keep; ++k) tail[k] = x[n - keep + k];
+    for (int32_t i = n - 1; i >= 0; --i) {
+        Out acc{};
+        int32_t j = nb - 1;
+        for (; j > i; --j) acc += Mul(b[j], xs[nb - 1 + i - j]);
+        for (; j >= 0; --j) acc += Mul(b[j], x[i - j]);
+        y.Set(i, acc);
+    }
+    const int32_t m = nb - 1;
+    for (int32_t k = 0; k + keep < m; ++k) xs.Set(k, xs[k + keep]);
+    for (int32_t k = 0; k < keep; ++k) xs.Set(m - keep + k, tail[k]);
+    return heap.Release();
+}
+
+// One section over the whole block (the block result equals the sample-by-sample order, since a
+// section sees only its own input sequence); its values stay in registers.
+template <class T, int M>
+void CascadeSection(Cells<T> x, int32_t n, Cells<double> a, Cells<double> b, Cells<T> state, bool last) {
+    double ak[M], bk[M + 1];
+    T st[M];
+    for (int j = 0; j < M; ++j) ak[j] = a[j], st[j] = state[j];
+    for (int j = 0; j <= M; ++j) bk[j] = b[j];
+    for (int32_t i = 0; i < n; ++i) {
+        T w = x[i];
+        for (int j = 0; j < M; ++j) w -= Mul(ak[j], st[j]);
+        T v = Mul(bk[0], w);
+        for (int j = 0; j < M; ++j) v += Mul(bk[j + 1], st[j]);
+        for (int j = M - 1; j > 0; --j) st[j] = st[j - 1];
+        st[0] = Flush(w);
+        x.Set(i, last ? Flush(v) : v);
+    }
+    for (int j = 0; j < M; ++j) state.Set(j, st[j]);
+}
+
+void Reverse(double* p, int64_t n) { std::reverse(p, p + n); }
+
+}  // namespace
+
+template <class In, class Out, class C>
+Status IirDirectFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t na, Cells<C> b, int32_t nb,
+                       Cells<In> xState, Cells<Out> yState) {
+    if (na == 0) return FirFilter(x, y, n, b, nb, xState);
+    RecursiveFilter(x, y, n, a, na, b, nb, xState, yState);
+    return 0;
+}
+
+template <class T>
+void IirCascadeFilter(Cells<T> x, int32_t n, Cells<double> a, Cells<double> b, int32_t form, int32_t sections,
+                      Cells<T> state) {
+    for (int32_t k = 0; k < sections; ++k) {
+        const bool last = k == sections - 1;
+        if (form == 0)
+            CascadeSection<T, 2>(x, n, a + 2 * k, b + 3 * k, state + 2 * k, last);
+        else
+            CascadeSection<T, 4>(x, n, a + 4 * k, b + 5 * k, state + 4 * k, last);
+    }
+}
+
+Status ZeroPhaseFilter(Cells<double> x, int32_t n, Cells<double> a, int32_t na, Cells<double> b, int32_t nb,
+                       Cells<double> xForward, Cells<double> yForward, Cells<double> xBackward,
+                       Cells<double> yBackward) {
+    const int32_t pad = std::max(na, nb);
+    const int64_t len = int64_t{n} + 2 * int64_t{pad};
+    if (len > INT32_MAX) return OutOfMemoryErr;
+    Scratch<double> work;
+    if (const Status s = work.Allocate(static_cast<size_t>(len))) return s;
+    double* w = work.get();
+    std::fill(w, w + len, 0.0);
+    for (int32_t i = 0; i < n; ++i) w[pad + i] = x[i];
+    const Cells<double> buf(w);
+    const auto m = static_cast<int32_t>(len);
+    Status s = IirDirectFilter(buf, buf, m, a, na, b, nb, xForward, yForward);
+    if (s == 0) {
+        Reverse(w, len);
+        s = IirDirectFilter(buf, buf, m, a, na, b, nb, xBackward, yBackward);
+    }
+    if (s == 0)
+        for (int32_t k = 0; k < n; ++k) x.Set(k, w[pad + n - 1 - k]);
+    return MergeRelease(s, work.Release());
+}
+
+Status ZeroPhaseCascadeFilter(Cells<double> x, int32_t n, Cells<double> a, Cells<double> b, int32_t form,
+                              int32_t sections, Cells<double> forward, Cells<double> backward) {
+    const int32_t m = form == 0 ? 2 : 4, half = m / 2, base = m * sections - half;
+    bool fullA = false, fullB = false;
+    for (int32_t j = m - half; j <= m - 1; ++j) fullA = fullA || a[j] != 0.0;
+    for (int32_t j = m - half + 1; j <= m; ++j) fullB = fullB || b[j] != 0.0;
+    const int32_t pad = std::max(base + (fullA ? half : 0), base + (fullB ? half : 0)) + 1;
+    const int64_t len = int64_t{n} + 2 * int64_t{pad};
+    if (len > INT32_MAX) return OutOfMemoryErr;
+    Scratch<double> work;
+    if (const Status s = work.Allocate(static_cast<size_t>(len))) return s;
+    double* w = work.get();
+    std::fill(w, w + len, 0.0);
+    for (int32_t i = 0; i < n; ++i) w[pad + i] = x[i];
+    const Cells<double> buf(w);
+    const auto count = static_cast<int32_t>(len);
+    IirCascadeFilter(buf, count, a, b, form, sections, forward);
+    Reverse(w, len);
+    IirCascadeFilter(buf, count, a, b, form, sections, backward);
+    for (int32_t k = 0; k < n; ++k) x.Set(k, w[pad + n - 1 - k]);
+    return work.Release();
+}
+
+template Status IirDirectFilter(Cells<double>, Cells<double>, int32_t, Cells<double>, int32_t, Cells<double>,
+                                int32_t, Cells<double>, Cells<double>);
+template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<double>, int32_t, Cells<double>,
+                                int32_t, Cells<cdouble>, Cells<cdouble>);
+template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t, Cells<cdouble>,
+                                int32_t, Cells<cdouble>, Cells<cdouble>);
+template Status IirDirectFilter(Cells<double>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t, Cells<cdouble>,
+                                int32_t, Cells<double>, Cells<cdouble>);
+template void IirCascadeFilter(Cells<double>, int32_t, Cells<double>, Cells<double>, int32_t, int32_t,
+                               Cells<double>);
+template void IirCascadeFilter(Cells<cdouble>, int32_t, Cells<double>, Cells<double>, int32_t, int32_t,
+                               Cells<cdouble>);
+
+}  // namespace tw
