@@ -21,17 +21,19 @@ TW_API int32_t BesselCoefs(double* fs, double* fl, double* fh, int32_t* order, i
                            Array1DHandle b, int32_t* status);
 TW_API int32_t BesselCoefs90(double* fs, double* fl, double* fh, int32_t* order, int32_t* type, int32_t form,
                              Array1DHandle a, Array1DHandle b, int32_t* status);
-TW_API int32_t ChebyshevCoefs(double* fs, double* fl, double* fh, double* ripple, int32_t* order, int32_t* type,
-                              Array1DHandle a, Array1DHandle b, int32_t* status);
+TW_API int32_t ChebyshevCoefs(double* fs, double* fl, double* fh, double* ripple, int32_t* order,
+                              int32_t* type, Array1DHandle a, Array1DHandle b, int32_t* status);
 TW_API int32_t ChebyshevCoefs90(double* fs, double* fl, double* fh, double* ripple, int32_t* order,
-                                int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b, int32_t* status);
+                                int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b,
+                                int32_t* status);
 TW_API int32_t InvChebyshevCoefs(double* fs, double* fl, double* fh, double* attenuation, int32_t* order,
                                  int32_t* type, Array1DHandle a, Array1DHandle b, int32_t* status);
 TW_API int32_t InvChebyshevCoefs90(double* fs, double* fl, double* fh, double* attenuation, int32_t* order,
                                    int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b,
                                    int32_t* status);
 TW_API int32_t EllipticCoefs(double* fs, double* fl, double* fh, double* ripple, double* attenuation,
-                             int32_t* order, int32_t* type, Array1DHandle a, Array1DHandle b, int32_t* status);
+                             int32_t* order, int32_t* type, Array1DHandle a, Array1DHandle b,
+                             int32_t* status);
 TW_API int32_t EllipticCoefs90(double* fs, double* fl, double* fh, double* ripple, double* attenuation,
                                int32_t* order, int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b,
                                int32_t* status);
@@ -46,8 +48,8 @@ TW_API int32_t IIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHand
                                    uint8_t* cont);
 /* Cascade of the sections of the design exports, form 0 or 1; the state holds 2 or 4 internal
  * values per section, newest first. */
-TW_API int32_t IIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b, Array1DHandle state,
-                           uint8_t* cont, int32_t* status);
+TW_API int32_t IIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b,
+                           Array1DHandle state, uint8_t* cont, int32_t* status);
 /* One sample. structure: 0, 1 cascade of form 0, 1; 2 direct form; 3 direct form with b alone
  * (FIR). The state is zeroed when *reset is not 0. */
 TW_API int32_t IIR_Filter_PtbyPt(double* x, int32_t structure, Array1DHandle a, Array1DHandle b,
@@ -56,8 +58,8 @@ TW_API int32_t IIR_Filter_PtbyPt(double* x, int32_t structure, Array1DHandle a, 
 /* Complex signals and states, real coefficients. */
 TW_API int32_t CxSigIIR_Filter(Array1DHandle x, Array1DHandle a, Array1DHandle b, Array1DHandle xState,
                                Array1DHandle yState, uint8_t* cont, int32_t* status);
-TW_API int32_t CxSigIIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHandle b, Array1DHandle state,
-                                        uint8_t* cont);
+TW_API int32_t CxSigIIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHandle b,
+                                        Array1DHandle state, uint8_t* cont);
 TW_API int32_t CxSigIIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b,
                                 Array1DHandle state, uint8_t* cont, int32_t* status);
 TW_API int32_t CxSigIIR_Filter_PtbyPt(ComplexDouble* x, int32_t structure, Array1DHandle a, Array1DHandle b,

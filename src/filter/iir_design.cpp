@@ -290,7 +290,8 @@ bool IirDesignSizes(int32_t order, int32_t type, int32_t form, int32_t* na, int3
 Status IirDesignCheck(const IirSpec& sp) {
     // For lowpass and highpass fh is ignored altogether: its stand-in could never fail a check.
     const bool usesFh = sp.type != 0 && sp.type != 1;
-    if (!(sp.fs > 0) || !(sp.fl > 0) || (usesFh && (!(sp.fh > 0) || !(sp.fh > sp.fl)))) return CutoffInvalidErr;
+    if (!(sp.fs > 0) || !(sp.fl > 0) || (usesFh && (!(sp.fh > 0) || !(sp.fh > sp.fl))))
+        return CutoffInvalidErr;
     if (sp.prototype == IirPrototype::InvChebyshev && !(sp.attenuation > 0)) return AttenuationNotPositiveErr;
     if (sp.fl > sp.fs / 2 || (usesFh && sp.fh > sp.fs / 2)) return CutoffAboveNyquistErr;
     if (sp.prototype == IirPrototype::Chebyshev || sp.prototype == IirPrototype::Elliptic) {
@@ -327,7 +328,8 @@ Status IirDesign(const IirSpec& sp, double* a, double* b) {
     for (int32_t k = 0; k < s; ++k) {
         double num[5], den[5];
         Substitute(factors[static_cast<size_t>(k)], sp.type, t, A, B, num, den);
-        const int32_t len = band ? 2 * factors[static_cast<size_t>(k)].degree + 1 : factors[static_cast<size_t>(k)].degree + 1;
+        const int32_t len = band ? 2 * factors[static_cast<size_t>(k)].degree + 1
+                                 : factors[static_cast<size_t>(k)].degree + 1;
         for (int32_t j = 0; j < m; ++j) na[m * k + j] = j + 1 < len ? den[j + 1] : 0.0;
         for (int32_t j = 0; j <= m; ++j) nb[(m + 1) * k + j] = j < len ? num[j] : 0.0;
     }

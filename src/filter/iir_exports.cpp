@@ -10,8 +10,8 @@
 
 namespace {
 
-using tw::Cells;
 using tw::cdouble;
+using tw::Cells;
 using tw::Frame;
 using tw::Handle;
 using tw::Status;
@@ -49,10 +49,12 @@ Status DirectChecks(int32_t n, int32_t na, int32_t nb, bool* idle) {
     return 0;
 }
 
-// Direct-form filtering of x into y with separate x and y states (or one state holding both).
+// Direct-form filtering of x into y with separate x and y states (or one state holding both);
+// na 0 ignores a.
 template <class In, class Out, class C>
-Status RunDirect(Cells<In> x, Cells<Out> y, int32_t n, Handle a, Handle b, Handle& xs, Handle* ys, bool keep) {
-    const int32_t na = tw::Count(a), nb = tw::Count(b);
+Status RunDirect(Cells<In> x, Cells<Out> y, int32_t n, Handle a, int32_t na, Handle b, Handle& xs, Handle* ys,
+                 bool keep) {
+    const int32_t nb = tw::Count(b);
     Cells<In> xc;
     Cells<Out> yc;
     Status s = 0;
@@ -75,7 +77,8 @@ Status DirectInPlace(Handle& x, Handle a, Handle b, Handle& xs, Handle& ys, cons
     const int32_t n = tw::Count(x);
     bool idle = false;
     Status s = DirectChecks(n, tw::Count(a), tw::Count(b), &idle);
-    if (s == 0 && !idle) s = RunDirect<T, T, C>(Elements<T>(x), Elements<T>(x), n, a, b, xs, &ys, Byte(cont, 1));
+    if (s == 0 && !idle)
+        s = RunDirect<T, T, C>(Elements<T>(x), Elements<T>(x), n, a, tw::Count(a), b, xs, &ys, Byte(cont, 1));
     return f.Finish(s);
 }
 
@@ -89,7 +92,8 @@ Status DirectOneState(Handle& x, Handle a, Handle b, Handle& state, const uint8_
     bool idle = false;
     Status s = DirectChecks(n, tw::Count(a), tw::Count(b), &idle);
     if (s == 0 && !idle)
-        s = RunDirect<T, T, double>(Elements<T>(x), Elements<T>(x), n, a, b, state, nullptr, Byte(cont, 1));
+        s = RunDirect<T, T, double>(Elements<T>(x), Elements<T>(x), n, a, tw::Count(a), b, state, nullptr,
+                                    Byte(cont, 1));
     return f.Finish(s);
 }
 
@@ -126,7 +130,9 @@ Status Cascade(Handle& x, const int32_t* form, Handle a, Handle b, Handle& state
     if (s != 0 || idle) return f.Finish(s);
     Cells<T> st;
     s = PrepareState(state, na, Byte(cont, 1), &st);
-    if (s == 0) tw::IirCascadeFilter(Elements<T>(x), n, Elements<double>(a), Elements<double>(b), *form, sections, st);
+    if (s == 0)
+        tw::IirCascadeFilter(Elements<T>(x), n, Elements<double>(a), Elements<double>(b), *form, sections,
+                             st);
     return f.Finish(s);
 }
 
@@ -152,9 +158,11 @@ Status PointByPoint(T* x, int32_t structure, Handle a, Handle b, Handle& state, 
     if (s == 0 && cascade) {
         Cells<T> st;
         s = PrepareState(state, na, keep, &st);
-        if (s == 0) tw::IirCascadeFilter(Cells<T>(x), 1, Elements<double>(a), Elements<double>(b), structure, sections, st);
+        if (s == 0)
+            tw::IirCascadeFilter(Cells<T>(x), 1, Elements<double>(a), Elements<double>(b), structure,
+                                 sections, st);
     } else if (s == 0) {
-        s = RunDirect<T, T, double>(Cells<T>(x), Cells<T>(x), 1, a, b, state, nullptr, keep);
+        s = RunDirect<T, T, double>(Cells<T>(x), Cells<T>(x), 1, a, na, b, state, nullptr, keep);
     }
     s = f.Finish(s);
     if (s < 0 && x != nullptr) *x = T{};
@@ -162,16 +170,19 @@ Status PointByPoint(T* x, int32_t structure, Handle a, Handle b, Handle& state, 
 }
 
 // Real signal x into a complex y through complex coefficients; only y shrinks on failure.
-Status RealSignalComplexFilter(Handle x, Handle& y, Handle a, Handle b, Handle& xs, Handle& ys, const uint8_t* cont) {
+Status RealSignalComplexFilter(Handle x, Handle& y, Handle a, Handle b, Handle& xs, Handle& ys,
+                               const uint8_t* cont) {
     Frame f;
     f.Output<cdouble>(y);
     const int32_t n = tw::Count(x);
     bool idle = false;
     Status s = DirectChecks(n, tw::Count(a), tw::Count(b), &idle);
     if (s != 0 || idle) return f.Finish(s);
-    if (y == nullptr || tw::HostResize(tw::kTypeCode<cdouble>, 1, &y, n) != 0) return f.Finish(OutOfMemoryErr);
+    if (y == nullptr || tw::HostResize(tw::kTypeCode<cdouble>, 1, &y, n) != 0)
+        return f.Finish(OutOfMemoryErr);
     std::memcpy(*y, &n, sizeof n);
-    s = RunDirect<double, cdouble, cdouble>(Elements<double>(x), Elements<cdouble>(y), n, a, b, xs, &ys, Byte(cont, 1));
+    s = RunDirect<double, cdouble, cdouble>(Elements<double>(x), Elements<cdouble>(y), n, a, tw::Count(a), b,
+                                            xs, &ys, Byte(cont, 1));
     return f.Finish(s);
 }
 
@@ -192,8 +203,8 @@ Status ZeroPhase(Handle x, Handle a, Handle b, Handle& xf, Handle& xb, Handle& y
     if (s == 0 && na > 0) s = PrepareState(yf, na - 1, keep, &yfc);
     if (s == 0 && na > 0) s = PrepareState(yb, na - 1, keep, &ybc);
     if (s == 0)
-        s = tw::ZeroPhaseFilter(Elements<double>(x), n, Elements<double>(a), na, Elements<double>(b), nb, xfc, yfc,
-                                xbc, ybc);
+        s = tw::ZeroPhaseFilter(Elements<double>(x), n, Elements<double>(a), na, Elements<double>(b), nb, xfc,
+                                yfc, xbc, ybc);
     return f.Finish(s);
 }
 
@@ -211,8 +222,8 @@ Status ZeroPhaseCascade(Handle x, const int32_t* form, Handle a, Handle b, Handl
     s = PrepareState(forward, na, cont != 0, &fc);
     if (s == 0) s = PrepareState(backward, na, cont != 0, &bc);
     if (s == 0)
-        s = tw::ZeroPhaseCascadeFilter(Elements<double>(x), n, Elements<double>(a), Elements<double>(b), *form,
-                                       sections, fc, bc);
+        s = tw::ZeroPhaseCascadeFilter(Elements<double>(x), n, Elements<double>(a), Elements<double>(b),
+                                       *form, sections, fc, bc);
     return f.Finish(s);
 }
 
@@ -224,8 +235,15 @@ Status Design(tw::IirPrototype prototype, const double* fs, const double* fl, co
     f.Output<double>(a);
     f.Output<double>(b);
     const auto read = [](const double* p) { return p != nullptr ? *p : tw::kNaN; };
-    tw::IirSpec sp{prototype, read(fs), read(fl), read(fh), ripple, attenuation,
-                   order != nullptr ? *order : 0, type != nullptr ? *type : -1, form};
+    tw::IirSpec sp{prototype,
+                   read(fs),
+                   read(fl),
+                   read(fh),
+                   ripple,
+                   attenuation,
+                   order != nullptr ? *order : 0,
+                   type != nullptr ? *type : -1,
+                   form};
     if (!formGiven) sp.form = sp.type == 2 || sp.type == 3 ? 1 : 0;
     if (sp.order < 1) return f.Finish(OrderNotPositiveErr);
     int32_t na = 0, nb = 0;
@@ -264,12 +282,13 @@ TW_API int32_t BesselCoefs90(double* fs, double* fl, double* fh, int32_t* order,
                              Array1DHandle a, Array1DHandle b, int32_t* status) {
     return tw::ToPointer(status, Design(kBessel, fs, fl, fh, 0, 0, order, type, form, true, a, b));
 }
-TW_API int32_t ChebyshevCoefs(double* fs, double* fl, double* fh, double* ripple, int32_t* order, int32_t* type,
-                              Array1DHandle a, Array1DHandle b, int32_t* status) {
+TW_API int32_t ChebyshevCoefs(double* fs, double* fl, double* fh, double* ripple, int32_t* order,
+                              int32_t* type, Array1DHandle a, Array1DHandle b, int32_t* status) {
     return tw::ToPointer(status, Design(kCheb, fs, fl, fh, Value(ripple), 0, order, type, 0, false, a, b));
 }
 TW_API int32_t ChebyshevCoefs90(double* fs, double* fl, double* fh, double* ripple, int32_t* order,
-                                int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b, int32_t* status) {
+                                int32_t* type, int32_t form, Array1DHandle a, Array1DHandle b,
+                                int32_t* status) {
     return tw::ToPointer(status, Design(kCheb, fs, fl, fh, Value(ripple), 0, order, type, form, true, a, b));
 }
 TW_API int32_t InvChebyshevCoefs(double* fs, double* fl, double* fh, double* attenuation, int32_t* order,
@@ -284,7 +303,8 @@ TW_API int32_t InvChebyshevCoefs90(double* fs, double* fl, double* fh, double* a
                          Design(kInvCheb, fs, fl, fh, 0, Value(attenuation), order, type, form, true, a, b));
 }
 TW_API int32_t EllipticCoefs(double* fs, double* fl, double* fh, double* ripple, double* attenuation,
-                             int32_t* order, int32_t* type, Array1DHandle a, Array1DHandle b, int32_t* status) {
+                             int32_t* order, int32_t* type, Array1DHandle a, Array1DHandle b,
+                             int32_t* status) {
     return tw::ToPointer(
         status, Design(kEllip, fs, fl, fh, Value(ripple), Value(attenuation), order, type, 0, false, a, b));
 }
@@ -303,8 +323,8 @@ TW_API int32_t IIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHand
                                    uint8_t* cont) {
     return DirectOneState<double>(x, a, b, state, cont);
 }
-TW_API int32_t IIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b, Array1DHandle state,
-                           uint8_t* cont, int32_t* status) {
+TW_API int32_t IIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b,
+                           Array1DHandle state, uint8_t* cont, int32_t* status) {
     return tw::ToPointer(status, Cascade<double>(x, form, a, b, state, cont));
 }
 TW_API int32_t IIR_Filter_PtbyPt(double* x, int32_t structure, Array1DHandle a, Array1DHandle b,
@@ -315,8 +335,8 @@ TW_API int32_t CxSigIIR_Filter(Array1DHandle x, Array1DHandle a, Array1DHandle b
                                Array1DHandle yState, uint8_t* cont, int32_t* status) {
     return tw::ToPointer(status, DirectInPlace<cdouble, double>(x, a, b, xState, yState, cont));
 }
-TW_API int32_t CxSigIIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHandle b, Array1DHandle state,
-                                        uint8_t* cont) {
+TW_API int32_t CxSigIIR_Filter_OneState(Array1DHandle x, Array1DHandle a, Array1DHandle b,
+                                        Array1DHandle state, uint8_t* cont) {
     return DirectOneState<cdouble>(x, a, b, state, cont);
 }
 TW_API int32_t CxSigIIR_Filter2(Array1DHandle x, int32_t* form, Array1DHandle a, Array1DHandle b,

@@ -178,12 +178,12 @@ Status ZeroPhaseCascadeFilter(Cells<double> x, int32_t n, Cells<double> a, Cells
 
 template Status IirDirectFilter(Cells<double>, Cells<double>, int32_t, Cells<double>, int32_t, Cells<double>,
                                 int32_t, Cells<double>, Cells<double>);
-template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<double>, int32_t, Cells<double>,
-                                int32_t, Cells<cdouble>, Cells<cdouble>);
-template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t, Cells<cdouble>,
-                                int32_t, Cells<cdouble>, Cells<cdouble>);
-template Status IirDirectFilter(Cells<double>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t, Cells<cdouble>,
-                                int32_t, Cells<double>, Cells<cdouble>);
+template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<double>, int32_t,
+                                Cells<double>, int32_t, Cells<cdouble>, Cells<cdouble>);
+template Status IirDirectFilter(Cells<cdouble>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t,
+                                Cells<cdouble>, int32_t, Cells<cdouble>, Cells<cdouble>);
+template Status IirDirectFilter(Cells<double>, Cells<cdouble>, int32_t, Cells<cdouble>, int32_t,
+                                Cells<cdouble>, int32_t, Cells<double>, Cells<cdouble>);
 template void IirCascadeFilter(Cells<double>, int32_t, Cells<double>, Cells<double>, int32_t, int32_t,
                                Cells<double>);
 template void IirCascadeFilter(Cells<cdouble>, int32_t, Cells<double>, Cells<double>, int32_t, int32_t,

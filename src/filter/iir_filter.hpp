@@ -24,7 +24,9 @@ struct Cells {
         std::memcpy(&v, p + i * static_cast<int64_t>(sizeof(T)), sizeof(T));
         return v;
     }
-    void Set(int64_t i, const T& v) const { std::memcpy(p + i * static_cast<int64_t>(sizeof(T)), &v, sizeof(T)); }
+    void Set(int64_t i, const T& v) const {
+        std::memcpy(p + i * static_cast<int64_t>(sizeof(T)), &v, sizeof(T));
+    }
     Cells operator+(int64_t i) const { return Cells(p + i * static_cast<int64_t>(sizeof(T))); }
 };
 

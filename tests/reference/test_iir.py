@@ -194,6 +194,341 @@ class Designs(unittest.TestCase):
         self.assertEqual((st, len(a)), (0, 2))
 
 
+
+# ---- filtering ----
+
+def direct(name, x, a, b, xs, ys, cont, dtype=np.float64):
+    """IIR_Filter and its complex twins: (status, y, xState, yState)."""
+    xa, xsa, ysa, st = tw.array(x, dtype), tw.array(xs, dtype), tw.array(ys, dtype), tw.i32(7)
+    cdt = np.complex128 if name == "CxIIR_Filter_H" else np.float64
+    getattr(lib, name)(xa, tw.array(a, cdt), tw.array(b, cdt), xsa, ysa, byte(cont), st.ref)
+    return st.value, xa.numpy(), xsa.numpy(), ysa.numpy()
+
+
+def one_state(name, x, a, b, state, cont, dtype=np.float64):
+    xa, sa = tw.array(x, dtype), tw.array(state, dtype)
+    r = getattr(lib, name)(xa, tw.array(a), tw.array(b), sa, byte(cont))
+    return r, xa.numpy(), sa.numpy()
+
+
+def cascade(name, x, form, a, b, state, cont, dtype=np.float64):
+    xa, sa, st = tw.array(x, dtype), tw.array(state, dtype), tw.i32(7)
+    getattr(lib, name)(xa, tw.i32(form).ref, tw.array(a), tw.array(b), sa, byte(cont), st.ref)
+    return st.value, xa.numpy(), sa.numpy()
+
+
+def point(name, v, structure, a, b, state, reset):
+    """a and b as host arrays or sequences."""
+    cx = name.startswith("Cx")
+    cell = (ctypes.c_double * 2)(v.real, v.imag) if cx else ctypes.c_double(v)
+    a, b = (v if isinstance(v, tw.Array) else tw.array(v) for v in (a, b))
+    r = getattr(lib, name)(ctypes.byref(cell), ctypes.c_int32(structure), a, b, state, byte(reset))
+    return r, complex(cell[0], cell[1]) if cx else cell.value
+
+
+def initial(b, a, ys, xs):
+    """lfilter's zi for states oldest first; lfiltic leaves out lfilter's division by a0."""
+    return ss.lfiltic(b, a, ys[::-1], xs[::-1]) / a[0]
+
+
+def stated_loop(x, a, b, xs, ys):
+    """The per-sample order of accumulation, flush included."""
+    xs, ys, y = list(xs), list(ys), []
+    na, nb = len(a), len(b)
+    for v in x:
+        acc = 0.0
+        for j in range(nb - 1, 1, -1):
+            acc += b[j] * xs[nb - 1 - j]
+            xs[nb - 1 - j] = xs[nb - j]
+        if nb > 1:
+            acc += b[1] * xs[nb - 2]
+            xs[nb - 2] = v
+        acc += b[0] * v
+        for j in range(na - 1, 1, -1):
+            acc -= a[j] * ys[na - 1 - j]
+            ys[na - 1 - j] = ys[na - j]
+        out = acc / a[0] if na < 2 else (acc - a[1] * ys[na - 2]) / a[0]
+        out = 0.0 if abs(out) <= 2.2250738585072014e-308 else out
+        if na > 1:
+            ys[na - 2] = out
+        y.append(out)
+    return np.array(y), np.array(xs), np.array(ys)
+
+
+def stable(rng, na):
+    """A denominator with roots inside radius 0.9."""
+    r = 0.9 * rng.uniform(0.2, 1.0, na - 1) * np.exp(1j * rng.uniform(0, np.pi, na - 1))
+    a = np.atleast_1d(np.real(np.poly(np.r_[r[: (na - 1) // 2], np.conj(r[: (na - 1) // 2]), r[(na - 1) // 2 * 2:].real])))
+    return a * rng.uniform(0.5, 2.0)
+
+
+class Filters(unittest.TestCase):
+    def setUp(self):
+        self.rng = np.random.default_rng(20261125)
+
+    def each_placement(self):
+        for aligned in (0, 1):
+            tw.placement(aligned)
+            yield aligned
+        tw.placement(0)
+
+    def test_direct_form_bit_for_bit_and_against_lfilter(self):
+        for _ in self.each_placement():
+            for na, nb in ((1, 1), (2, 1), (1, 4), (3, 3), (5, 2), (9, 9), (2, 7)):
+                a, b = stable(self.rng, na), self.rng.standard_normal(nb)
+                x = self.rng.standard_normal(300)
+                xs, ys = self.rng.standard_normal(nb - 1), self.rng.standard_normal(na - 1)
+                st, y, xs2, ys2 = direct("IIR_Filter", x, a, b, xs, ys, 1)
+                wy, wxs, wys = stated_loop(x, a, b, xs, ys)
+                self.assertEqual(st, 0)
+                np.testing.assert_array_equal(y, wy)
+                np.testing.assert_array_equal(xs2, wxs)
+                np.testing.assert_array_equal(ys2, wys)
+                zi = initial(b, a, ys, xs) if max(na, nb) > 1 else None
+                ref = ss.lfilter(b, a, x, zi=zi)[0] if zi is not None else ss.lfilter(b, a, x)
+                err = rel(y, ref)
+                note(("IIR_Filter", "lfilter"), err)
+                self.assertLess(err, 1e-13)
+                # One state: the same numbers with the two states side by side.
+                r, y1, s1 = one_state("IIR_Filter_OneState", x, a, b, np.r_[xs, ys], 1)
+                np.testing.assert_array_equal(y1, wy)
+                np.testing.assert_array_equal(s1, np.r_[wxs, wys])
+
+    def test_fir_mode(self):
+        for nb, n in ((1, 10), (2, 1), (5, 3), (17, 200), (40, 25)):
+            b, x, xs = self.rng.standard_normal(nb), self.rng.standard_normal(n), self.rng.standard_normal(nb - 1)
+            st, y, xs2, ys2 = direct("IIR_Filter", x, [], b, xs, [4.0], 1)
+            self.assertEqual(st, 0)
+            ref = ss.lfilter(b, [1.0], np.r_[xs, x])[nb - 1:]
+            np.testing.assert_allclose(y, ref, rtol=0, atol=1e-14 * nb * np.max(np.abs(ref)))
+            np.testing.assert_array_equal(xs2, np.r_[xs, x][len(x):] if nb > 1 else [])
+            np.testing.assert_array_equal(ys2, [4.0])  # no yState in FIR mode
+
+    def test_block_splits_equal_one_call(self):
+        x = self.rng.standard_normal(257)
+        a, b = stable(self.rng, 5), self.rng.standard_normal(4)
+        sa, sb, _ = design("EllipticCoefs", 5, 2, 1)
+        for cuts in ((1,), (1, 2), (100, 101, 250), (3, 4, 5, 6)):
+            parts = np.split(x, cuts)
+            for kind in ("iir", "fir", "cascade"):
+                whole, pieces = None, []
+                for k, piece in enumerate([x] + parts):
+                    first = k <= 1
+                    if kind == "cascade":
+                        if first:
+                            state = np.zeros(0)
+                        st, y, state = cascade("IIR_Filter2", piece, 1, sa, sb, state, 0 if first else 1)
+                    else:
+                        if first:
+                            xs, ys = np.zeros(0), np.zeros(0)
+                        aa = a if kind == "iir" else []
+                        st, y, xs, ys = direct("IIR_Filter", piece, aa, b, xs, ys, 0 if first else 1)
+                    self.assertEqual(st, 0)
+                    if k == 0:
+                        whole = y
+                    else:
+                        pieces.append(y)
+                np.testing.assert_array_equal(np.concatenate(pieces), whole, (kind, cuts))
+
+    def test_cascades_against_sosfilt(self):
+        for name, typ, order in (("BWCoefs", 0, 7), ("ChebyshevCoefs", 1, 6), ("EllipticCoefs", 2, 5),
+                                 ("BesselCoefs", 3, 4)):
+            x = self.rng.standard_normal(500)
+            for form in (0, 1):
+                a, b, _ = design(name, order, typ, form)
+                m = 2 + 2 * form
+                st, y, state = cascade("IIR_Filter2", x, form, a, b, [], 0)
+                self.assertEqual((st, len(state)), (0, len(a)))
+                ref = x
+                for num, den in sections(a, b, m):
+                    ref = ss.lfilter(num, den, ref)
+                if form == 0:
+                    ref = ss.sosfilt([np.r_[nb_, da] for nb_, da in sections(a, b, 2)], x)
+                err = rel(y, ref)
+                note(("IIR_Filter2", "sosfilt"), err)
+                self.assertLess(err, 1e-12, (name, form))
+                # The state holds each section's internal values w, newest first.
+                v = x
+                for k, (num, den) in enumerate(sections(a, b, m)):
+                    w = ss.lfilter([1.0], den, v)
+                    np.testing.assert_allclose(state[m * k:m * (k + 1)], w[::-1][:m], rtol=1e-11, atol=1e-14)
+                    v = ss.lfilter(num, den, v)
+
+    def test_flush_at_the_smallest_normal(self):
+        tiny = 2.2250738585072014e-308
+        x = np.array([1e-310, tiny, -tiny, np.nextafter(tiny, 1), 5e-324, 1.0])
+        flushed = np.where(np.abs(x) <= tiny, 0.0, x)
+        self.assertEqual(direct("IIR_Filter", x, [1.0], [1.0], [], [], 0)[1].tolist(), flushed.tolist())
+        self.assertEqual(cascade("IIR_Filter2", x, 0, [0.0, 0.0], [1.0, 0.0, 0.0], [], 0)[1].tolist(),
+                         flushed.tolist())
+        self.assertEqual(direct("IIR_Filter", x, [], [1.0, 0.0], [0.0], [], 0)[1].tolist(), x.tolist())
+
+    def test_complex_twins(self):
+        x = self.rng.standard_normal(200) + 1j * self.rng.standard_normal(200)
+        a, b = stable(self.rng, 4), self.rng.standard_normal(3)
+        xs = self.rng.standard_normal(2) + 1j * self.rng.standard_normal(2)
+        ys = self.rng.standard_normal(3) + 1j * self.rng.standard_normal(3)
+        c128 = np.complex128
+        st, y, xs2, ys2 = direct("CxSigIIR_Filter", x, a, b, xs, ys, 1, c128)
+        for part in (np.real, np.imag):
+            _, yp, xsp, ysp = direct("IIR_Filter", part(x), a, b, part(xs), part(ys), 1)
+            np.testing.assert_array_equal(part(y), yp)
+            np.testing.assert_array_equal(part(xs2), xsp)
+            np.testing.assert_array_equal(part(ys2), ysp)
+            _, yo, so = one_state("IIR_Filter_OneState", part(x), a, b, part(np.r_[xs, ys]), 1)
+            np.testing.assert_array_equal(part(one_state("CxSigIIR_Filter_OneState", x, a, b, np.r_[xs, ys], 1,
+                                                         c128)[1]), yo)
+        sa, sb, _ = design("ChebyshevCoefs", 5, 3, 0)
+        _, yc, _ = cascade("CxSigIIR_Filter2", x, 0, sa, sb, [], 0, c128)
+        for part in (np.real, np.imag):
+            np.testing.assert_array_equal(part(yc), cascade("IIR_Filter2", part(x), 0, sa, sb, [], 0)[1])
+        # Complex coefficients: full products, against lfilter with the same states.
+        ca = a * np.exp(0.3j * np.arange(4))
+        cb = b * (1 - 0.5j)
+        st, y, _, _ = direct("CxIIR_Filter_H", x, ca, cb, xs, ys, 1, c128)
+        ref = ss.lfilter(cb, ca, x, zi=initial(cb, ca, ys, xs))[0]
+        self.assertLess(rel(y, ref), 1e-13)
+        ya, xsa, ysa = tw.empty(c128), tw.array(xs.real), tw.array(ys, c128)
+        r = lib.CxIIRReSig_Filter_H(tw.array(x.real), ya, tw.array(ca, c128), tw.array(cb, c128), xsa, ysa, byte(1))
+        ref = ss.lfilter(cb, ca, x.real, zi=initial(cb, ca, ys, xs.real))[0]
+        self.assertEqual(r, 0)
+        self.assertLess(rel(ya.numpy(), ref), 1e-13)
+        np.testing.assert_array_equal(xsa.numpy(), x.real[-2:])
+
+    def test_zero_phase_against_pad_filter_reverse_filter(self):
+        x = self.rng.standard_normal(120)
+        for a, b in ((stable(self.rng, 3), self.rng.standard_normal(5)), ([], self.rng.standard_normal(4))):
+            p = max(len(a), len(b))
+            states = [tw.empty() for _ in range(4)]
+            xa = tw.array(x)
+            self.assertEqual(lib.zeroPhaseFiltH(xa, tw.array(a), tw.array(b), *states, 0), 0)
+            aa = a if len(a) else [1.0]
+            fwd = ss.lfilter(b, aa, np.r_[np.zeros(p), x, np.zeros(p)])
+            bwd = ss.lfilter(b, aa, fwd[::-1])
+            err = rel(xa.numpy(), bwd[::-1][p:p + len(x)])
+            note(("zeroPhaseFiltH", "padded lfilter"), err)
+            self.assertLess(err, 1e-13)
+            # The states are those left by the padded signal: the next call starts from them.
+            xf, xb, yf, yb = (s.numpy() for s in states)
+            np.testing.assert_array_equal(xf, np.r_[x, np.zeros(p)][-(len(b) - 1):])
+            x2 = self.rng.standard_normal(30)
+            xa2 = tw.array(x2)
+            lib.zeroPhaseFiltH(xa2, tw.array(a), tw.array(b), *states, 1)
+            zf = initial(b, aa, yf, xf)
+            zb = initial(b, aa, yb, xb)
+            fwd = ss.lfilter(b, aa, np.r_[np.zeros(p), x2, np.zeros(p)], zi=zf)[0]
+            bwd = ss.lfilter(b, aa, fwd[::-1], zi=zb)[0]
+            self.assertLess(rel(xa2.numpy(), bwd[::-1][p:p + len(x2)]), 1e-12)
+
+    def test_zero_phase_cascade_padding(self):
+        # The padding: m S - m/2, plus m/2 when the first section is of full order, plus 1.
+        x = self.rng.standard_normal(80)
+        for name, order, typ, form, pad in (("BWCoefs", 5, 0, 0, 6), ("BWCoefs", 6, 0, 0, 7),
+                                            ("BWCoefs", 3, 2, 1, 7), ("BWCoefs", 4, 0, 1, 5),
+                                            ("BWCoefs", 5, 0, 1, 7), ("InvChebyshevCoefs", 5, 0, 0, 6)):
+            a, b, _ = design(name, order, typ, form)
+            m = 2 + 2 * form
+            f, bk, xa = tw.empty(), tw.empty(), tw.array(x)
+            self.assertEqual(lib.zeroPhaseCascadeFiltH(xa, tw.i32(form).ref, tw.array(a), tw.array(b), f, bk, 0), 0)
+            run = lambda v: ss.sosfilt([np.r_[nb_, da] for nb_, da in sections(a, b, 2)], v) if m == 2 else \
+                [v := ss.lfilter(nb_, da, v) for nb_, da in sections(a, b, 4)][-1]
+            fwd = run(np.r_[np.zeros(pad), x, np.zeros(pad)])
+            want = run(fwd[::-1])[::-1][pad:pad + len(x)]
+            err = rel(xa.numpy(), want)
+            note(("zeroPhaseCascadeFiltH", "padded sosfilt"), err)
+            self.assertLess(err, 1e-12, (name, order, typ, form))
+
+    def test_point_by_point_against_blocks(self):
+        x = self.rng.standard_normal(40)
+        a, b = stable(self.rng, 3), self.rng.standard_normal(4)
+        ca, cb, _ = design("EllipticCoefs", 4, 2, 1)
+        ba, bb, _ = design("BWCoefs", 3, 0, 0)
+        cases = (  # structure, a, b, block result
+            (0, ba, bb, cascade("IIR_Filter2", x, 0, ba, bb, [], 0)[1]),
+            (1, ca, cb, cascade("IIR_Filter2", x, 1, ca, cb, [], 0)[1]),
+            (2, a, b, direct("IIR_Filter", x, a, b, [], [], 0)[1]),
+            (3, a, b, direct("IIR_Filter", x, [], b, [], [], 0)[1]))
+        for structure, aa, bb_, want in cases:
+            for name in ("IIR_Filter_PtbyPt", "CxSigIIR_Filter_PtbyPt"):
+                state = tw.array([9.0] * 3, np.complex128 if name.startswith("Cx") else np.float64)
+                ha, hb = tw.array(aa), tw.array(bb_)
+                got = []
+                for k, v in enumerate(x):
+                    count = tw.twrt.TWRTAllocCount()
+                    r, out = point(name, complex(v, -v) if name.startswith("Cx") else v, structure, ha, hb,
+                                   state, 1 if k == 0 else 0)
+                    self.assertEqual(r, 0)
+                    if k:
+                        self.assertEqual(tw.twrt.TWRTAllocCount(), count)  # a fitting state is used as it is
+                    got.append(out)
+                got = np.array(got)
+                if name.startswith("Cx"):
+                    np.testing.assert_array_equal(got.real, want)
+                    np.testing.assert_array_equal(got.imag, -want)
+                else:
+                    np.testing.assert_array_equal(got, want)
+        # Reset on every call: x b0 / a0 each time.
+        state = tw.empty()
+        for v in x[:5]:
+            self.assertEqual(point("IIR_Filter_PtbyPt", v, 2, a, b, state, 1)[1], v * b[0] / a[0])
+
+    def test_idle_and_identity(self):
+        x = self.rng.standard_normal(9)
+        st, y, xs, ys = direct("IIR_Filter", x, [], [], [3.0], [3.0], 0)
+        self.assertEqual((st, y.tolist(), xs.tolist(), ys.tolist()), (0, x.tolist(), [3.0], [3.0]))
+        st, y, xs, ys = direct("IIR_Filter", x, [1.0], [1.0], [3.0], [3.0], 0)
+        self.assertEqual((st, y.tolist(), len(xs), len(ys)), (0, x.tolist(), 0, 0))
+        st, y, s = cascade("IIR_Filter2", x, 5, [], [], [3.0], 0)
+        self.assertEqual((st, y.tolist(), s.tolist()), (0, x.tolist(), [3.0]))
+
+    def test_failure_contracts(self):
+        x, c128 = [1.0, 2.0], np.complex128
+        st, y, _, _ = direct("IIR_Filter", [], [1.0], [1.0], [], [], 0)
+        self.assertEqual((st, len(y)), (-20003, 0))
+        for name, dtype in (("IIR_Filter", np.float64), ("CxSigIIR_Filter", c128), ("CxIIR_Filter_H", c128)):
+            st, y, xs, ys = direct(name, x, [1.0], [], [5.0], [5.0], 1, dtype)
+            self.assertEqual((st, len(y), len(xs), len(ys)), (-20008, 0, 1, 1))
+        for name, dtype in (("IIR_Filter_OneState", np.float64), ("CxSigIIR_Filter_OneState", c128)):
+            r, y, s = one_state(name, x, [1.0, 0.5], [], [5.0], 1, dtype)
+            self.assertEqual((r, len(y), len(s)), (-20008, 0, 0))
+        # Cascade order: x empty, a/b presence, form, layout; a state of the wrong size is no error.
+        for name, dtype in (("IIR_Filter2", np.float64), ("CxSigIIR_Filter2", c128)):
+            for xx, form, a, b, want in (([], 9, [1.0], [], -20003), (x, 9, [1.0], [], -20008),
+                                         (x, 9, [], [1.0], -20008), (x, 2, [0.5, 0.1], [1.0] * 3, -20061),
+                                         (x, 0, [0.5], [1.0] * 3, -20066), (x, 1, [0.5, 0.1], [1.0] * 3, -20066),
+                                         (x, 0, [0.5, 0.1], [1.0] * 4, -20066)):
+                st, y, s = cascade(name, xx, form, a, b, [5.0] * 7, 1, dtype)
+                self.assertEqual((st, len(y), len(s)), (want, 0, 7), (name, form, a, b))
+            st, y, s = cascade(name, x, 0, [0.5, 0.1], [1.0] * 3, [5.0] * 7, 1, dtype)
+            fresh = cascade(name, x, 0, [0.5, 0.1], [1.0] * 3, [], 0, dtype)
+            self.assertEqual((st, len(s), y.tolist()), (0, 2, fresh[1].tolist()))
+        for name in ("IIR_Filter_PtbyPt", "CxSigIIR_Filter_PtbyPt"):
+            for structure, a, b, want in ((4, [1.0], [1.0], -20061), (-1, [1.0], [1.0], -20061),
+                                          (2, [1.0], [], -20008), (0, [], [1.0], -20008),
+                                          (1, [0.5, 0.1], [1.0] * 3, -20066)):
+                state = tw.array([5.0])
+                r, out = point(name, 3.0, structure, a, b, state, 0)
+                self.assertEqual((r, out, len(state.numpy())), (want, 0.0, 0))
+            state = tw.array([5.0])  # structure 3 ignores a: no b, nothing to do
+            self.assertEqual(point(name, 3.0, 3, [1.0], [], state, 0), (0, 3.0))
+        states = [tw.array([5.0]) for _ in range(4)]
+        xa = tw.array(x)
+        self.assertEqual(lib.zeroPhaseFiltH(xa, tw.array([1.0, 0.5]), tw.empty(), *states, 1), -20008)
+        self.assertEqual((xa.numpy().tolist(), [len(s.numpy()) for s in states]), (x, [0] * 4))
+        states = [tw.array([5.0]) for _ in range(2)]
+        self.assertEqual(lib.zeroPhaseCascadeFiltH(xa, tw.i32(3).ref, tw.array([0.5, 0.1]), tw.array([1.0] * 3),
+                                                   *states, 1), -20061)
+        self.assertEqual((xa.numpy().tolist(), [len(s.numpy()) for s in states]), (x, [0] * 2))
+        ya = tw.array([7.0], c128)
+        r = lib.CxIIRReSig_Filter_H(tw.array(x), ya, tw.array([1.0], c128), tw.empty(c128), tw.array([5.0]),
+                                    tw.array([5.0], c128), byte(1))
+        self.assertEqual((r, len(ya.numpy())), (-20008, 0))
+        tw.twrt.TWRTFailResizeAt(1)  # the state's resize
+        st, y, xs, ys = direct("IIR_Filter", x, [1.0, 0.5], [1.0], [], [], 0)
+        tw.twrt.TWRTFailResizeAt(0)
+        self.assertEqual((st, len(y)), (-20001, 0))
+
+
 # ---- independent constructions ----
 
 def prototype(name, n, ripple=None):
