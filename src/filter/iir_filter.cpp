@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <type_traits>
 
 namespace tw {
 namespace {
@@ -27,10 +28,20 @@ inline cdouble Div(cdouble v, cdouble c) {
 inline double Flush(double v) { return std::fabs(v) <= kSmallestNormal ? 0.0 : v; }
 inline cdouble Flush(cdouble v) { return {Flush(v.real()), Flush(v.imag())}; }
 
-template <class In, class Out, class C>
-void RecursiveFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t na, Cells<C> b, int32_t nb,
-                     Cells<In> xs, Cells<Out> ys) {
-    const C a0 = a[0];
+// Elements of an ordinary array, for the stack copies of short states.
+template <class T>
+struct Plain {
+    T* p;
+    T operator[](int64_t i) const { return p[i]; }
+    void Set(int64_t i, const T& v) const { p[i] = v; }
+};
+
+// With a0 exactly 1 the division is an identity and leaves the recursion's critical path.
+template <bool UnitLead, class In, class Out, class A, class X, class Y>
+void RecursiveLoop(Cells<In> x, Cells<Out> y, int32_t n, A a, int32_t na, A b, int32_t nb, X xs, Y ys) {
+    const auto a0 = a[0];
+    // The newest output also stays in a register: the recursion does not wait for its store.
+    Out last = na > 1 ? ys[na - 2] : Out{};
     for (int32_t i = 0; i < n; ++i) {
         const In xi = x[i];
         Out acc{};
@@ -49,10 +60,43 @@ void RecursiveFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t n
             acc -= Mul(a[j], ys[k]);
             ys.Set(k, ys[k + 1]);
         }
-        const Out v = Flush(na < 2 ? Div(acc, a0) : Div(acc - Mul(a[1], ys[na - 2]), a0));
+        Out v = na < 2 ? acc : acc - Mul(a[1], last);
+        if constexpr (!UnitLead) v = Div(v, a0);
+        v = Flush(v);
         if (na > 1) ys.Set(na - 2, v);
+        last = v;
         y.Set(i, v);
     }
+}
+
+constexpr int32_t kLocalOrder = 32;
+
+// Short filters run on stack copies of their coefficients and states, written back at the end.
+template <class In, class Out, class C>
+void RecursiveFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t na, Cells<C> b, int32_t nb,
+                     Cells<In> xs, Cells<Out> ys) {
+    const bool unit = std::is_same_v<C, double> && a[0] == C(1);
+    if (na > kLocalOrder || nb > kLocalOrder) {
+        if (unit)
+            RecursiveLoop<true>(x, y, n, a, na, b, nb, xs, ys);
+        else
+            RecursiveLoop<false>(x, y, n, a, na, b, nb, xs, ys);
+        return;
+    }
+    C ca[kLocalOrder]{}, cb[kLocalOrder]{};
+    In sx[kLocalOrder]{};
+    Out sy[kLocalOrder]{};
+    for (int32_t j = 0; j < na; ++j) ca[j] = a[j];
+    for (int32_t j = 0; j < nb; ++j) cb[j] = b[j];
+    for (int32_t j = 0; j + 1 < nb; ++j) sx[j] = xs[j];
+    for (int32_t j = 0; j + 1 < na; ++j) sy[j] = ys[j];
+    const Plain<const C> pa{ca}, pb{cb};
+    if (unit)
+        RecursiveLoop<true>(x, y, n, pa, na, pb, nb, Plain<In>{sx}, Plain<Out>{sy});
+    else
+        RecursiveLoop<false>(x, y, n, pa, na, pb, nb, Plain<In>{sx}, Plain<Out>{sy});
+    for (int32_t j = 0; j + 1 < nb; ++j) xs.Set(j, sx[j]);
+    for (int32_t j = 0; j + 1 < na; ++j) ys.Set(j, sy[j]);
 }
 
 // Outputs from the last backward, so that y may overwrite x; indices before 0 read the state.
@@ -106,6 +150,35 @@ void CascadeSection(Cells<T> x, int32_t n, Cells<double> a, Cells<double> b, Cel
     for (int j = 0; j < M; ++j) state.Set(j, st[j]);
 }
 
+constexpr int32_t kLocalSections = 32;
+
+// Sample by sample through all sections, on stack copies: the sections' recursions are
+// independent chains that the processor overlaps.
+template <class T, int M>
+void CascadeSamples(Cells<T> x, int32_t n, Cells<double> a, Cells<double> b, int32_t sections,
+                    Cells<T> state) {
+    double ca[M * kLocalSections], cb[(M + 1) * kLocalSections];
+    T st[M * kLocalSections];
+    for (int32_t j = 0; j < M * sections; ++j) ca[j] = a[j], st[j] = state[j];
+    for (int32_t j = 0; j < (M + 1) * sections; ++j) cb[j] = b[j];
+    for (int32_t i = 0; i < n; ++i) {
+        T v = x[i];
+        for (int32_t k = 0; k < sections; ++k) {
+            const double* ak = ca + M * k;
+            const double* bk = cb + (M + 1) * k;
+            T* s = st + M * k;
+            T w = v;
+            for (int j = 0; j < M; ++j) w -= Mul(ak[j], s[j]);
+            v = Mul(bk[0], w);
+            for (int j = 0; j < M; ++j) v += Mul(bk[j + 1], s[j]);
+            for (int j = M - 1; j > 0; --j) s[j] = s[j - 1];
+            s[0] = Flush(w);
+        }
+        x.Set(i, Flush(v));
+    }
+    for (int32_t j = 0; j < M * sections; ++j) state.Set(j, st[j]);
+}
+
 void Reverse(double* p, int64_t n) { std::reverse(p, p + n); }
 
 }  // namespace
@@ -121,6 +194,13 @@ Status IirDirectFilter(Cells<In> x, Cells<Out> y, int32_t n, Cells<C> a, int32_t
 template <class T>
 void IirCascadeFilter(Cells<T> x, int32_t n, Cells<double> a, Cells<double> b, int32_t form, int32_t sections,
                       Cells<T> state) {
+    if (sections <= kLocalSections) {
+        if (form == 0)
+            CascadeSamples<T, 2>(x, n, a, b, sections, state);
+        else
+            CascadeSamples<T, 4>(x, n, a, b, sections, state);
+        return;
+    }
     for (int32_t k = 0; k < sections; ++k) {
         const bool last = k == sections - 1;
         if (form == 0)
