@@ -173,11 +173,6 @@ class Designs(unittest.TestCase):
             a, b, _ = design(name, 1, 0)
             np.testing.assert_allclose(a, [(t - 1) / (t + 1), 0], rtol=1e-15, atol=1e-16)
             np.testing.assert_allclose(b, [t / (1 + t), t / (1 + t), 0], rtol=1e-15)
-        # Orders 3 and 5 with form 1: one fourth-order section; a plain first-order one, then one.
-        a, b, _ = design("BWCoefs", 3, 0, 1)
-        self.assertEqual((len(a), len(b)), (4, 5))
-        a, b, _ = design("BWCoefs", 5, 1, 1)
-        self.assertEqual((len(a), len(b), a[2], a[3], b[2], b[3], b[4]), (8, 10, 0, 0, 0, 0, 0))
         # Even Chebyshev: DC at -ripple dB, the ripple top at 0 dB; odd: DC at 0 dB.
         for n, dc in ((4, 10 ** (-0.5 / 20)), (5, 1.0)):
             a, b, _ = design("ChebyshevCoefs", n, 0)
@@ -189,10 +184,6 @@ class Designs(unittest.TestCase):
             a, b, _ = design("BesselCoefs", n, 0)
             h = response(a, b, 2, np.array([0.0, 2 * np.pi * FL / FS]))
             np.testing.assert_allclose(np.abs(h), [1.0, np.sqrt(0.5)], rtol=1e-12)
-        # Cut-off at fs / 2: accepted, and the design goes on with a huge tan.
-        a, b, st = design("BWCoefs", 2, 0, fl=FS / 2)
-        self.assertEqual((st, len(a)), (0, 2))
-
 
 
 # ---- filtering ----
