@@ -32,7 +32,7 @@ bool IsBand(int32_t type) { return type == 2 || type == 3; }
 double Theta(int32_t i, int32_t n) { return (kPi + kPi / n) / 2 + i * kPi / n; }
 
 // The prototype's factors in section order: the real pole first, then the pairs.
-Status Prototype(const IirSpec& sp, Factor* f) {
+Status Prototype(const IirParams& sp, Factor* f) {
     const int32_t n = sp.order, pairs = n / 2;
     const bool odd = (n & 1) != 0;
     switch (sp.prototype) {
@@ -287,7 +287,7 @@ bool IirDesignSizes(int32_t order, int32_t type, int32_t form, int32_t* na, int3
     return true;
 }
 
-Status IirDesignCheck(const IirSpec& sp) {
+Status IirDesignCheck(const IirParams& sp) {
     // For lowpass and highpass fh is ignored altogether: its stand-in could never fail a check.
     const bool usesFh = sp.type != 0 && sp.type != 1;
     if (!(sp.fs > 0) || !(sp.fl > 0) || (usesFh && (!(sp.fh > 0) || !(sp.fh > sp.fl))))
@@ -305,7 +305,7 @@ Status IirDesignCheck(const IirSpec& sp) {
     return 0;
 }
 
-Status IirDesign(const IirSpec& sp, double* a, double* b) {
+Status IirDesign(const IirParams& sp, double* a, double* b) {
     const int32_t s = Sections(sp.order);
     const bool band = IsBand(sp.type);
     const auto us = static_cast<size_t>(s);

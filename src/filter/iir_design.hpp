@@ -10,7 +10,7 @@ namespace tw {
 
 enum class IirPrototype { Butterworth, Chebyshev, InvChebyshev, Elliptic, Bessel };
 
-struct IirSpec {
+struct IirParams {
     IirPrototype prototype;
     double fs, fl, fh;
     double ripple;       // dB, Chebyshev and elliptic
@@ -26,10 +26,10 @@ bool IirDesignSizes(int32_t order, int32_t type, int32_t form, int32_t* na, int3
 
 // The checks after sizing, in their order: cut-offs, attenuation (inverse Chebyshev), Nyquist,
 // ripple and attenuation (Chebyshev, elliptic), selectors.
-Status IirDesignCheck(const IirSpec& spec);
+Status IirDesignCheck(const IirParams& params);
 
-// The cascade into a and b of the lengths above. The spec must have passed IirDesignCheck.
-Status IirDesign(const IirSpec& spec, double* a, double* b);
+// The cascade into a and b of the lengths above. The parameters must have passed IirDesignCheck.
+Status IirDesign(const IirParams& params, double* a, double* b);
 
 // Elliptic helpers, exposed for tests. K of complementary modulus c; sn, cn, dn of u with
 // complementary modulus c; the inverse of sc(., k) at y.

@@ -235,7 +235,7 @@ Status Design(tw::IirPrototype prototype, const double* fs, const double* fl, co
     f.Output<double>(a);
     f.Output<double>(b);
     const auto read = [](const double* p) { return p != nullptr ? *p : tw::kNaN; };
-    tw::IirSpec sp{prototype,
+    tw::IirParams sp{prototype,
                    read(fs),
                    read(fl),
                    read(fh),

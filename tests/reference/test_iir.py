@@ -322,8 +322,8 @@ class Filters(unittest.TestCase):
                 np.testing.assert_array_equal(np.concatenate(pieces), whole, (kind, cuts))
 
     def test_cascades_against_sosfilt(self):
-        for name, typ, order in (("BWCoefs", 0, 7), ("ChebyshevCoefs", 1, 6), ("EllipticCoefs", 2, 5),
-                                 ("BesselCoefs", 3, 4)):
+        for _, (name, typ, order) in ((p, c) for p in self.each_placement() for c in (
+                ("BWCoefs", 0, 7), ("ChebyshevCoefs", 1, 6), ("EllipticCoefs", 2, 5), ("BesselCoefs", 3, 4))):
             x = self.rng.standard_normal(500)
             for form in (0, 1):
                 a, b, _ = design(name, order, typ, form)
