@@ -236,14 +236,14 @@ Status Design(tw::IirPrototype prototype, const double* fs, const double* fl, co
     f.Output<double>(b);
     const auto read = [](const double* p) { return p != nullptr ? *p : tw::kNaN; };
     tw::IirParams sp{prototype,
-                   read(fs),
-                   read(fl),
-                   read(fh),
-                   ripple,
-                   attenuation,
-                   order != nullptr ? *order : 0,
-                   type != nullptr ? *type : -1,
-                   form};
+                     read(fs),
+                     read(fl),
+                     read(fh),
+                     ripple,
+                     attenuation,
+                     order != nullptr ? *order : 0,
+                     type != nullptr ? *type : -1,
+                     form};
     if (!formGiven) sp.form = sp.type == 2 || sp.type == 3 ? 1 : 0;
     if (sp.order < 1) return f.Finish(OrderNotPositiveErr);
     int32_t na = 0, nb = 0;
