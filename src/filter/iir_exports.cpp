@@ -227,6 +227,8 @@ Status ZeroPhaseCascade(Handle x, const int32_t* form, Handle a, Handle b, Handl
     return f.Finish(s);
 }
 
+double Value(const double* p) { return p != nullptr ? *p : tw::kNaN; }
+
 // The design frame: order, sizes and resizes, then the checks in their order, then the design.
 Status Design(tw::IirPrototype prototype, const double* fs, const double* fl, const double* fh, double ripple,
               double attenuation, const int32_t* order, const int32_t* type, int32_t form, bool formGiven,
@@ -234,11 +236,10 @@ Status Design(tw::IirPrototype prototype, const double* fs, const double* fl, co
     Frame f;
     f.Output<double>(a);
     f.Output<double>(b);
-    const auto read = [](const double* p) { return p != nullptr ? *p : tw::kNaN; };
     tw::IirParams sp{prototype,
-                     read(fs),
-                     read(fl),
-                     read(fh),
+                     Value(fs),
+                     Value(fl),
+                     Value(fh),
                      ripple,
                      attenuation,
                      order != nullptr ? *order : 0,
@@ -261,8 +262,6 @@ constexpr auto kBessel = tw::IirPrototype::Bessel;
 constexpr auto kCheb = tw::IirPrototype::Chebyshev;
 constexpr auto kInvCheb = tw::IirPrototype::InvChebyshev;
 constexpr auto kEllip = tw::IirPrototype::Elliptic;
-
-double Value(const double* p) { return p != nullptr ? *p : tw::kNaN; }
 
 }  // namespace
 
