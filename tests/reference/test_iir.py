@@ -463,6 +463,26 @@ class Filters(unittest.TestCase):
         for v in x[:5]:
             self.assertEqual(point("IIR_Filter_PtbyPt", v, 2, a, b, state, 1)[1], v * b[0] / a[0])
 
+    def test_scratch_only_for_the_fir_tail_and_the_zero_phase_buffer(self):
+        # A 64-byte arena serves no scratch of interest: only the stated users fail for it.
+        x, a, b, long_b = np.arange(1.0, 101.0), [1.0, 0.5], [1.0, 0.2], np.ones(30)
+        ca, cb, _ = design("BWCoefs", 6, 0, 0)
+        self.assertEqual(lib.InitializeAnalysisWorkspaceH(64, None), 0)
+        lib.EnableAnalysisWorkspaceH(None)
+        try:
+            rows = ((lambda: direct("IIR_Filter", x, a, b, [], [], 0)[0], 0),
+                    (lambda: direct("IIR_Filter", x, [], np.ones(17), [], [], 0)[0], 0),  # tail of 16
+                    (lambda: cascade("IIR_Filter2", x, 0, ca, cb, [], 0)[0], 0),
+                    (lambda: point("IIR_Filter_PtbyPt", 1.0, 3, [], long_b, tw.empty(), 1)[0], 0),
+                    (lambda: direct("IIR_Filter", x, [], long_b, [], [], 0)[0], -20001),
+                    (lambda: lib.zeroPhaseFiltH(tw.array(x), tw.array(a), tw.array(b), *[tw.empty() for _ in range(4)], 0),
+                     -20001))
+            for k, (run, want) in enumerate(rows):
+                self.assertEqual(run(), want, k)
+        finally:
+            lib.DisableAnalysisWorkspaceH(None)
+            lib.UninitializeAnalysisWorkspaceH(None)
+
     def test_idle_and_identity(self):
         x = self.rng.standard_normal(9)
         st, y, xs, ys = direct("IIR_Filter", x, [], [], [3.0], [3.0], 0)
