@@ -55,7 +55,8 @@ for sections in (2, 4, 8):
     sos = np.array([np.r_[b[3 * k:3 * k + 3], 1.0, a[2 * k:2 * k + 2]] for k in range(sections)])
     ah, bh, state, form = tw.array(a), tw.array(b), tw.empty(), tw.i32(0)
     t = row("IIR_Filter2 %d sections" % sections,
-            lambda: lib.IIR_Filter2(xa, form.ref, ah, bh, state, ONE, status.ref), "sosfilt", lambda: ss.sosfilt(sos, x))
+            lambda: lib.IIR_Filter2(xa, form.ref, ah, bh, state, ONE, status.ref),
+            "sosfilt", lambda: ss.sosfilt(sos, x))
     cstate = tw.empty(np.complex128)
     tc = median_seconds(lambda: lib.CxSigIIR_Filter2(ca, form.ref, ah, bh, cstate, ONE, status.ref))
     print("%-36s %8.2f ms   %-22s %8.2f ms   ratio %.2f" % ("CxSigIIR_Filter2 %d sections" % sections, 1e3 * tc,
@@ -87,11 +88,6 @@ fn, ref, st0 = lib.IIR_Filter_PtbyPt, ctypes.byref(cell), ctypes.c_int32(0)
 def ptbypt():
     for _ in range(calls):
         fn(ref, st0, ah, bh, state, keep)
-
-
-def empty_calls():
-    for _ in range(calls):
-        lib.TW_PtbyPtProbe if False else None
 
 
 t = median_seconds(ptbypt, 3)

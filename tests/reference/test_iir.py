@@ -50,6 +50,13 @@ def response(a, b, m, w):
     return h
 
 
+def through(a, b, m, v):
+    """The cascade by lfilter, section after section."""
+    for num, den in sections(a, b, m):
+        v = ss.lfilter(num, den, v)
+    return v
+
+
 def rel(got, want):
     return np.max(np.abs(got - want)) / np.max(np.abs(want))
 
@@ -247,10 +254,11 @@ def stated_loop(x, a, b, xs, ys):
 
 
 def stable(rng, na):
-    """A denominator with roots inside radius 0.9."""
+    """A denominator of na coefficients, roots inside radius 0.9, a0 not 1."""
+    k = (na - 1) // 2
     r = 0.9 * rng.uniform(0.2, 1.0, na - 1) * np.exp(1j * rng.uniform(0, np.pi, na - 1))
-    a = np.atleast_1d(np.real(np.poly(np.r_[r[: (na - 1) // 2], np.conj(r[: (na - 1) // 2]), r[(na - 1) // 2 * 2:].real])))
-    return a * rng.uniform(0.5, 2.0)
+    roots = np.r_[r[:k], np.conj(r[:k]), r[2 * k:].real]
+    return np.atleast_1d(np.real(np.poly(roots))) * rng.uniform(0.5, 2.0)
 
 
 class Filters(unittest.TestCase):
@@ -330,11 +338,8 @@ class Filters(unittest.TestCase):
                 m = 2 + 2 * form
                 st, y, state = cascade("IIR_Filter2", x, form, a, b, [], 0)
                 self.assertEqual((st, len(state)), (0, len(a)))
-                ref = x
-                for num, den in sections(a, b, m):
-                    ref = ss.lfilter(num, den, ref)
-                if form == 0:
-                    ref = ss.sosfilt([np.r_[nb_, da] for nb_, da in sections(a, b, 2)], x)
+                ref = ss.sosfilt([np.r_[nb_, da] for nb_, da in sections(a, b, 2)], x) if m == 2 else \
+                    through(a, b, m, x)
                 err = rel(y, ref)
                 note(("IIR_Filter2", "sosfilt"), err)
                 self.assertLess(err, 1e-12, (name, form))
@@ -421,10 +426,8 @@ class Filters(unittest.TestCase):
             m = 2 + 2 * form
             f, bk, xa = tw.empty(), tw.empty(), tw.array(x)
             self.assertEqual(lib.zeroPhaseCascadeFiltH(xa, tw.i32(form).ref, tw.array(a), tw.array(b), f, bk, 0), 0)
-            run = lambda v: ss.sosfilt([np.r_[nb_, da] for nb_, da in sections(a, b, 2)], v) if m == 2 else \
-                [v := ss.lfilter(nb_, da, v) for nb_, da in sections(a, b, 4)][-1]
-            fwd = run(np.r_[np.zeros(pad), x, np.zeros(pad)])
-            want = run(fwd[::-1])[::-1][pad:pad + len(x)]
+            fwd = through(a, b, m, np.r_[np.zeros(pad), x, np.zeros(pad)])
+            want = through(a, b, m, fwd[::-1])[::-1][pad:pad + len(x)]
             err = rel(xa.numpy(), want)
             note(("zeroPhaseCascadeFiltH", "padded sosfilt"), err)
             self.assertLess(err, 1e-12, (name, order, typ, form))
@@ -475,8 +478,8 @@ class Filters(unittest.TestCase):
                     (lambda: cascade("IIR_Filter2", x, 0, ca, cb, [], 0)[0], 0),
                     (lambda: point("IIR_Filter_PtbyPt", 1.0, 3, [], long_b, tw.empty(), 1)[0], 0),
                     (lambda: direct("IIR_Filter", x, [], long_b, [], [], 0)[0], -20001),
-                    (lambda: lib.zeroPhaseFiltH(tw.array(x), tw.array(a), tw.array(b), *[tw.empty() for _ in range(4)], 0),
-                     -20001))
+                    (lambda: lib.zeroPhaseFiltH(tw.array(x), tw.array(a), tw.array(b),
+                                                *[tw.empty() for _ in range(4)], 0), -20001))
             for k, (run, want) in enumerate(rows):
                 self.assertEqual(run(), want, k)
         finally:
