@@ -429,7 +429,7 @@ class Filters(unittest.TestCase):
             fwd = through(a, b, m, np.r_[np.zeros(pad), x, np.zeros(pad)])
             want = through(a, b, m, fwd[::-1])[::-1][pad:pad + len(x)]
             err = rel(xa.numpy(), want)
-            note(("zeroPhaseCascadeFiltH", "padded sosfilt"), err)
+            note(("zeroPhaseCascadeFiltH", "padded cascade"), err)
             self.assertLess(err, 1e-12, (name, order, typ, form))
 
     def test_point_by_point_against_blocks(self):
