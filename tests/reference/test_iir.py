@@ -358,6 +358,12 @@ class Filters(unittest.TestCase):
         self.assertEqual(cascade("IIR_Filter2", x, 0, [0.0, 0.0], [1.0, 0.0, 0.0], [], 0)[1].tolist(),
                          flushed.tolist())
         self.assertEqual(direct("IIR_Filter", x, [], [1.0, 0.0], [0.0], [], 0)[1].tolist(), x.tolist())
+        # Complex data: each part by itself.
+        z = x + 1j * x[::-1]
+        want = flushed + 1j * flushed[::-1]
+        for got in (direct("CxSigIIR_Filter", z, [1.0], [1.0], [], [], 0, np.complex128)[1],
+                    cascade("CxSigIIR_Filter2", z, 0, [0.0, 0.0], [1.0, 0.0, 0.0], [], 0, np.complex128)[1]):
+            self.assertEqual(got.tolist(), want.tolist())
 
     def test_complex_twins(self):
         x = self.rng.standard_normal(200) + 1j * self.rng.standard_normal(200)
