@@ -1,29 +1,12 @@
 #include <algorithm>
 #include <cmath>
 
+#include "filter/iir_filter.hpp"
 #include "signal/convolve.hpp"
 #include "transform/fft/fft.hpp"
 
 namespace tw {
 namespace {
-
-constexpr double kSmallestNormal = 2.2250738585072014e-308;
-
-// The zero-state direct-form filter b/a driven by a unit impulse: out[i] is the i-th coefficient
-// of the series b(z)/a(z), which makes the first outputs the quotient of a long division. The
-// per-sample accumulation keeps the filter's order (b terms, then a[j] for j from the top down,
-// then the division by a0, then the underflow flush); terms that only meet the zero state or
-// zero input add nothing and are skipped.
-void ImpulseResponse(const double* b, int32_t nb, const double* a, int32_t na, double* out, int32_t n) {
-    for (int32_t i = 0; i < n; ++i) {
-        double acc = 0.0;
-        if (i < nb) acc += b[i];
-        for (int32_t j = std::min(na - 1, i); j >= 1; --j) acc -= a[j] * out[i - j];
-        double v = acc / a[0];
-        if (std::fabs(v) <= kSmallestNormal) v = 0.0;
-        out[i] = v;
-    }
-}
 
 // Long division after skipping the divisor's s leading zeros; the quotient starts at index s.
 Status LongDivision(const double* x, int32_t nx, const double* y, int32_t ny, double* q) {
@@ -32,11 +15,17 @@ Status LongDivision(const double* x, int32_t nx, const double* y, int32_t ny, do
     if (s == ny) return DivisorLeadingZeroErr;
     const int32_t d = ny - s;
     const int32_t len = nx - d + 1;
+    // The quotient is x run through the zero-state filter 1 / y.
     Scratch<double> out;
-    if (const Status st = out.Allocate(static_cast<size_t>(len))) return st;
-    ImpulseResponse(x, nx, y + s, d, out.get(), len);
-    std::copy(out.get() + s, out.get() + len, q);
-    return out.Release();
+    if (const Status st = out.Allocate(static_cast<size_t>(len) + d)) return st;
+    double* r = out.get();
+    double* yState = r + len;
+    std::fill(yState, yState + d, 0.0);
+    const double one = 1;
+    const Status st = IirDirectFilter(Cells<double>(x), Cells<double>(r), len, Cells<double>(y + s), d,
+                                      Cells<double>(&one), 1, Cells<double>(), Cells<double>(yState));
+    if (st == 0) std::copy(r + s, r + len, q);
+    return MergeRelease(st, out.Release());
 }
 
 int32_t PowerOfTwoAtLeast(int32_t n) {
