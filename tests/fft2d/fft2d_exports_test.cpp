@@ -66,7 +66,7 @@ TEST(Fft2DCells, FirstHoldsTheRowLengthSecondTheColumnLength) {
     EXPECT_EQ(HeldSize(slots[0]), 7);
     EXPECT_EQ(HeldSize(slots[1]), 4);
     EXPECT_EQ(TransformUnreserveProc(&cell), 0);
-    TWRTRunCleanups(-1);  // the work cells' tables go with their call sites
+    TWRTRunCleanups(2);  // the work cells' tables go with their call sites
 }
 
 TEST(Fft2DFrames, StatusesInTheirOrderEmptyY) {
