@@ -104,7 +104,7 @@ void Spectrum(const Array1D<double>& x) {
         if (power[k] > power[k - 1] && power[k] > power[k + 1]) lines.emplace_back(power[k], k);
     std::sort(lines.rbegin(), lines.rend());
     std::printf("Strongest lines of the windowed power spectrum (%d points)\n", n);
-    for (size_t i = 0; i < lines.size() && i < 6; ++i)
+    for (size_t i = 0; i < lines.size() && i < 5; ++i)
         std::printf("  %7.1f Hz  %8.2f dB  amplitude %.4f\n", lines[i].second * kRate / n,
                     10 * std::log10(2 * lines[i].first / (c.coherentGain * c.coherentGain)), 2 * std::sqrt(lines[i].first) / c.coherentGain);
     std::printf("\n");
@@ -129,6 +129,19 @@ void Fits() {
     std::printf("Fits to %d samples with a ripple of 0.05\n", n);
     std::printf("  line 0.75 t - 1.5:        slope %.6f, intercept %.6f, R^2 %.6f (status %d)\n", slope,
                 intercept, r2, status);
+    Array1D<double> cu, cl, pu, pl, upperParams, lowerParams;
+    double dSlope = 0, dIntercept = 0;
+    const int32_t cs = ConfBndLinear_head(lineData.h(), x.h(), none.h(), slope, intercept, 0.95, cu.h(), cl.h(),
+                                          upperParams.h(), lowerParams.h(), &dSlope, &dIntercept);
+    const int32_t ps = PredBndLinear_head(lineData.h(), x.h(), none.h(), slope, intercept, 0.95, pu.h(), pl.h());
+    if (cs == 0 && ps == 0) {
+        std::printf("  95 %% intervals: slope +/- %.6f, intercept +/- %.6f; bands of the line:\n", dSlope, dIntercept);
+        for (int32_t i : {0, 100, n - 1})
+            std::printf("    t %5.2f  fit %8.4f  confidence [%8.4f, %8.4f]  prediction [%8.4f, %8.4f]\n", x[i],
+                        line[i], cl[i], cu[i], pl[i], pu[i]);
+    } else {
+        std::printf("  bounds failed: %d %d\n", cs, ps);
+    }
     double amplitude, centre, deviation;
     int32_t steps = 500;
     status = GaussianPeakFit_head(peak.h(), x.h(), none.h(), 1e-8, none.h(), &amplitude, &centre, &deviation,

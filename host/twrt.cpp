@@ -15,12 +15,14 @@ struct Prefix {
     void* raw;
     size_t bytes;
     int32_t dims;
-    int32_t pad;
+    int32_t type;  // type code of the resize that made the block, 0 for a new array
 };
 
 std::atomic<int32_t> g_failAt{0};
 std::atomic<int64_t> g_resizes{0};
 std::atomic<int64_t> g_allocs{0};
+std::atomic<int64_t> g_live{0};
+std::atomic<int32_t> g_failedTotal{-1};
 std::atomic<int32_t> g_aligned{0};
 
 // Blocks may start at any 4-byte boundary, so the prefix is copied, never dereferenced in place.
@@ -30,7 +32,7 @@ Prefix ReadPrefix(const void* block) {
     return p;
 }
 
-void* AllocBlock(size_t bytes, int32_t dims) {
+void* AllocBlock(size_t bytes, int32_t dims, int32_t type = 0) {
     const size_t header = dims == 2 ? 8 : 4;
     const size_t slack = 128 + sizeof(Prefix);
     auto* raw = static_cast<unsigned char*>(std::calloc(1, bytes + slack));
@@ -45,14 +47,17 @@ void* AllocBlock(size_t bytes, int32_t dims) {
         data = reinterpret_cast<unsigned char*>(at) + header;
     }
     unsigned char* block = data - header;
-    const Prefix p{raw, bytes, dims, 0};
+    const Prefix p{raw, bytes, dims, type};
     std::memcpy(block - sizeof(Prefix), &p, sizeof p);
     g_allocs.fetch_add(1, std::memory_order_relaxed);
+    g_live.fetch_add(1, std::memory_order_relaxed);
     return block;
 }
 
 void FreeBlock(void* block) {
-    if (block != nullptr) std::free(ReadPrefix(block).raw);
+    if (block == nullptr) return;
+    std::free(ReadPrefix(block).raw);
+    g_live.fetch_sub(1, std::memory_order_relaxed);
 }
 
 struct Cleanup {
@@ -116,7 +121,10 @@ int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int3
     int32_t at = g_failAt.load(std::memory_order_relaxed);
     while (at > 0 && !g_failAt.compare_exchange_weak(at, at - 1, std::memory_order_relaxed)) {
     }
-    if (at == 1) return TWRTResizeFailed;
+    if (at == 1) {
+        g_failedTotal.store(totalElements, std::memory_order_relaxed);
+        return TWRTResizeFailed;
+    }
     const int32_t elem = TWRTElementSize(typeCode);
     if (handle == nullptr || *handle == nullptr || elem == 0 || (dims != 1 && dims != 2) ||
         totalElements < 0)
@@ -124,7 +132,7 @@ int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int3
     const size_t header = dims == 2 ? 8 : 4;
     const size_t bytes = header + static_cast<size_t>(totalElements) * static_cast<size_t>(elem);
     // Always move the block, so that a caller holding a stale element pointer is caught.
-    void* fresh = AllocBlock(bytes, dims);
+    void* fresh = AllocBlock(bytes, dims, typeCode);
     if (fresh == nullptr) return TWRTResizeFailed;
     void* old = **handle;
     if (old != nullptr) {
@@ -167,7 +175,19 @@ int32_t TWRTCleanupCount(int32_t mode) {
     return n;
 }
 
-void TWRTFailResizeAt(int32_t n) { g_failAt.store(n < 0 ? 0 : n, std::memory_order_relaxed); }
+void TWRTFailResizeAt(int32_t n) {
+    g_failedTotal.store(-1, std::memory_order_relaxed);
+    g_failAt.store(n < 0 ? 0 : n, std::memory_order_relaxed);
+}
+int32_t TWRTFailedResizeTotal(void) { return g_failedTotal.load(std::memory_order_relaxed); }
+int64_t TWRTLiveBlocks(void) { return g_live.load(std::memory_order_relaxed); }
+int32_t TWRTBlockInfo(TWRTHandle handle, int32_t* typeCode, int64_t* bytes) {
+    if (handle == nullptr || *handle == nullptr) return -1;
+    const Prefix p = ReadPrefix(*handle);
+    *typeCode = p.type;
+    *bytes = static_cast<int64_t>(p.bytes);
+    return 0;
+}
 int64_t TWRTResizeCount(void) { return g_resizes.load(std::memory_order_relaxed); }
 int64_t TWRTAllocCount(void) { return g_allocs.load(std::memory_order_relaxed); }
 void TWRTSetPlacement(int32_t aligned) { g_aligned.store(aligned != 0, std::memory_order_relaxed); }

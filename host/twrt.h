@@ -39,8 +39,14 @@ int32_t TWRTCleanupCount(int32_t mode);
 
 /* Test hooks. */
 void TWRTFailResizeAt(int32_t n); /* the n-th resize from now fails (0: none) */
+/* Element total that the failed resize asked for; -1 while none failed since TWRTFailResizeAt. */
+int32_t TWRTFailedResizeTotal(void);
 int64_t TWRTResizeCount(void);    /* resizes so far, failed ones included */
 int64_t TWRTAllocCount(void);     /* blocks allocated so far (new handles and resizes) */
+int64_t TWRTLiveBlocks(void);     /* blocks allocated and not yet released */
+/* Type code of the resize that made the block behind the handle (0 for a new array) and its
+ * bytes, dimension words included; -1 for a null handle. */
+int32_t TWRTBlockInfo(TWRTHandle handle, int32_t* typeCode, int64_t* bytes);
 /* 0: packed, 1-D element data at 4 mod 8 as the original host; 1: element data 64-byte aligned. */
 void TWRTSetPlacement(int32_t aligned);
 int32_t TWRTPlacement(void);

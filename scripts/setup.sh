@@ -3,7 +3,8 @@
 set -euo pipefail
 packages=(cmake ninja-build g++ libgtest-dev libbenchmark-dev libfftw3-dev pkg-config python3-numpy python3-scipy
           liblapack-dev libblas-dev libblis4-serial
-          python3-venv python3-pip python3-setuptools libsndfile1-dev gnuplot-nox)
+          python3-venv python3-pip python3-setuptools libsndfile1-dev gnuplot-nox
+          clang libclang-rt-14-dev)
 missing=()
 for p in "${packages[@]}"; do
   dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q "install ok installed" || missing+=("$p")

@@ -42,4 +42,24 @@ TW_API int32_t CxQXFFTH80_IDP(Array1DHandle x, Array1DHandle y, void** cell, int
                               int32_t size, int32_t shift);
 TW_API int32_t InvCxQXFFTH80_IDP(Array1DHandle x, Array1DHandle y, void** cell, int32_t shift);
 
+/* Two-dimensional transforms, rows first, then columns. The forward exports transform the rows x
+ * cols window of x starting at (rowStart, colStart), zero-padded where x ends; y is rows x cols,
+ * centred with the DC term at (rows/2, cols/2) when shift is non-zero. The spectrum of real data
+ * is exactly conjugate-symmetric. rowCell holds the table of length cols, colCell that of length
+ * rows; the _IDP twins keep them in slots 0 and 1 of one instance-data record. */
+TW_API int32_t ReFFT2D_H(Array2DHandle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols,
+                         int32_t shift, Array2DHandle y, void** rowCell, void** colCell);
+TW_API int32_t CxFFT2D_H(Array2DHandle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols,
+                         int32_t shift, Array2DHandle y, void** rowCell, void** colCell);
+/* Inverses of a complex x of the same size; shift undoes the centred order. The real inverse
+ * reads only the non-negative frequencies of each column after the row transforms. */
+TW_API int32_t ReInvFFT2D_H(Array2DHandle x, int32_t shift, Array2DHandle y, void** rowCell, void** colCell);
+TW_API int32_t CxInvFFT2D_H(Array2DHandle x, int32_t shift, Array2DHandle y, void** rowCell, void** colCell);
+TW_API int32_t ReFFT2D_H_IDP(Array2DHandle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols,
+                             int32_t shift, Array2DHandle y, void** cell);
+TW_API int32_t CxFFT2D_H_IDP(Array2DHandle x, int32_t rowStart, int32_t colStart, int32_t rows, int32_t cols,
+                             int32_t shift, Array2DHandle y, void** cell);
+TW_API int32_t ReInvFFT2D_H_IDP(Array2DHandle x, int32_t shift, Array2DHandle y, void** cell);
+TW_API int32_t CxInvFFT2D_H_IDP(Array2DHandle x, int32_t shift, Array2DHandle y, void** cell);
+
 #endif

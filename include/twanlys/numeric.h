@@ -1,4 +1,4 @@
-/* Numerical utilities: integration of sampled data, coordinates, scaling and vector norms. */
+/* Numerical utilities: integration of sampled data, coordinates, scaling and vector norms, polynomials. */
 #ifndef TWANLYS_NUMERIC_H
 #define TWANLYS_NUMERIC_H
 
@@ -73,5 +73,33 @@ TW_API int32_t unitVector_head(Array1DHandle data, double* norm, int32_t* status
 TW_API int32_t unitVector80_head(Array1DHandle data, double y, double* norm);
 TW_API int32_t CxUnitVector_head(Array1DHandle data, double* norm);
 TW_API int32_t CxUnitVector80_head(Array1DHandle data, double y, double* norm);
+
+/* Polynomials, coefficients in ascending powers (element i belongs to x^i); roots are complex.
+ * Evaluation is in the power form (a running power, not Horner's rule), in place. */
+TW_API int32_t PolyEv(Array1DHandle x, Array1DHandle coefficients, int32_t* status);
+TW_API int32_t EvPoly2D(Array2DHandle x, Array1DHandle coefficients, int32_t* status);
+/* The product has na + nb - 1 elements; the real one is resized as that many complex elements. */
+TW_API int32_t MultiplyPolyH(Array1DHandle a, Array1DHandle b, Array1DHandle product);
+TW_API int32_t CxMultiplyPolyH(Array1DHandle a, Array1DHandle b, Array1DHandle product);
+/* One root per start value: Newton from each real start, then Bairstow on each pair of complex
+ * starts (the two roots of one real quadratic factor). Empty coefficients: +20002, no roots. */
+TW_API int32_t PolyRootsNtBst_head(Array1DHandle coefficients, Array1DHandle realStarts, int32_t newtonIterations,
+                                   double newtonTolerance, Array1DHandle complexStarts, int32_t bairstowIterations,
+                                   double bairstowTolerance, Array1DHandle roots);
+/* All roots over the coefficients, zero roots first; option: iteration limit per root (below 1: 100). */
+TW_API int32_t CxPolyRoots_head(Array1DHandle coefficients, int32_t* option, int32_t* status);
+/* Distinct roots with their multiplicities; option: the inner root finder's limit (below 1: 100),
+ * tolerance 0 or below: 1e-10. Real coefficients list a complex pair side by side, positive
+ * imaginary part first. residual: ||c - lead prod (x - r)^m|| / ||c||. */
+TW_API int32_t MultPolyRoots_head(Array1DHandle coefficients, int32_t option, double tolerance, Array1DHandle roots,
+                                  double* residual, Array1DHandle multiplicities);
+TW_API int32_t CxMultPolyRoots_head(Array1DHandle coefficients, int32_t option, double tolerance,
+                                    Array1DHandle roots, double* residual, Array1DHandle multiplicities);
+/* Monic greatest common divisor g with a = g quotientA, b = g quotientB; tolerance 0 or below:
+ * 1e-8. residual: max(||a - g qa|| / ||a||, ||b - g qb|| / ||b||). */
+TW_API int32_t PolyGCD_H(Array1DHandle a, Array1DHandle b, double tolerance, Array1DHandle gcd,
+                         Array1DHandle quotientA, Array1DHandle quotientB, double* residual);
+TW_API int32_t CxPolyGCD_H(Array1DHandle a, Array1DHandle b, double tolerance, Array1DHandle gcd,
+                           Array1DHandle quotientA, Array1DHandle quotientB, double* residual);
 
 #endif

@@ -58,4 +58,36 @@ TW_API void PhasMod(int32_t n, double k, double* phase, double carrier, double* 
 TW_API void FreqMod(int32_t n, double k, double* phase, double carrier, double* x, double* peak,
                     double* accumulator);
 
+/* Convolution and correlation. algorithm: 0 direct, 1 frequency domain (transform length the
+ * next fast size at or above nx + ny - 1). z gets nx + ny - 1 elements. For the real exports an
+ * algorithm other than 0 and 1 computes nothing and succeeds. */
+TW_API int32_t Convolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t* status);
+/* Cross-correlation z = reverse(x) * y, lag 0 at z[nx - 1]. normalization: 0 none, 1 unbiased
+ * (each lag divided by its number of terms), 2 biased (divided by max(nx, ny)). Rxy is
+ * normalization 0. When x and y are the same block the frequency path takes one transform. */
+TW_API int32_t Rxy80(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm,
+                     int32_t normalization, int32_t* status);
+TW_API int32_t Rxy(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t* algorithm, int32_t* status);
+/* x is replaced by its 2n - 1 auto-correlation lags (frequency domain). */
+TW_API int32_t AutoCorrelation80(Array1DHandle x, int32_t normalization, int32_t* status);
+TW_API int32_t AutoCorrelation(Array1DHandle x, int32_t* status);
+/* Complex convolution, or with correlate non-zero the correlation with x conjugated and reversed,
+ * normalized as Rxy80. */
+TW_API int32_t CxConvolution(Array1DHandle x, Array1DHandle y, Array1DHandle z, int32_t algorithm,
+                             int32_t correlate, int32_t normalization);
+/* q with y * q = x, nx - ny + 1 samples, stored in x. Divides on a power-of-two transform, or by
+ * long division when the divisor's transform is near zero at a tested bin. The status is both
+ * returned and stored. */
+TW_API int32_t Deconvolution(Array1DHandle x, Array1DHandle y, int32_t* status);
+
+/* Two-dimensional convolution of matrices. sizeMode: 0 full, 1 the size of x from row r2/2 and
+ * column c2/2 of the full result (y of r2 x c2), 2 the valid part only. algorithm as above. */
+TW_API int32_t Convolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode, int32_t algorithm);
+/* Complex twin; in sizeMode 2 it also refuses matrices with fewer rows than columns. */
+TW_API int32_t CxConvolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t sizeMode,
+                              int32_t algorithm);
+/* Full 2-D correlation: x reversed along both dimensions (and conjugated) convolved with y. */
+TW_API int32_t Correlation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
+TW_API int32_t CxCorrelation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
+
 #endif

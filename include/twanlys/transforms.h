@@ -51,4 +51,49 @@ TW_API int32_t CxSpectrumH_IDP(Array1DHandle x, Array1DHandle y, void** cell);
 TW_API int32_t CrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
 TW_API int32_t CxCrossSpectrumH_IDP(Array1DHandle x, Array1DHandle y, Array1DHandle z, void** cell);
 
+/* Hartley, Hilbert, chirp-Z and Zak transforms. */
+
+/* Fast Hartley transform of x (f64) in place: H[k] = Re X[k] - Im X[k] of its DFT X. The inverse
+ * is the same transform times 1/n; a failure to get its table leaves x as it is. */
+TW_API int32_t FHTH(Array1DHandle x, void** cell);
+TW_API int32_t InvFHTH(Array1DHandle x, void** cell);
+/* Hilbert transform of x (f64) in place: the spectrum times -i with DC and Nyquist cleared, so a
+ * cosine at a bin becomes the sine. The inverse is its negation. */
+TW_API int32_t FastHilbertTransformH(Array1DHandle x, void** cell);
+TW_API int32_t InvFastHilbertTransformH(Array1DHandle x, void** cell);
+TW_API int32_t FHTH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t InvFHTH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t FastHilbertTransformH_IDP(Array1DHandle x, void** cell);
+TW_API int32_t InvFastHilbertTransformH_IDP(Array1DHandle x, void** cell);
+
+/* Discrete Zak transform into outLength complex values of y: for each phase m below M the
+ * length-N DFT H_m of x[m + j M] (zeros past the end of x), summed as
+ * y[q] = sum over m of H_m[(p + q) mod N] exp(-2 pi i m (q0 + q) / (M N)), with p = offset mod N
+ * and q0 = offset mod M N, both taken non-negative. A record longer than M N is first folded into
+ * its first M N samples in place (x is changed): the samples from x[N] on are added to x[0], x[1],
+ * ... pass by pass. An empty x gives an empty y and status 0. */
+TW_API int32_t ReDZTH(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                      Array1DHandle y, void** cell);
+TW_API int32_t CxDZTH(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                      Array1DHandle y, void** cell);
+TW_API int32_t ReDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                          Array1DHandle y, void** cell);
+TW_API int32_t CxDZTH_IDP(Array1DHandle x, int32_t M, int32_t N, int32_t offset, int32_t outLength,
+                          Array1DHandle y, void** cell);
+
+/* Chirp-Z transform of x (f64, or complex for the Cx form): y[j] = sum over k of x[k] A^(-k) W^(jk)
+ * for j below m (below 1: the count of x), the powers z^t taken as (|z|^2)^(t/2) times
+ * (cos t theta, sin t theta) with theta the principal argument of z. method 0 sums directly,
+ * method 1 runs Bluestein's convolution (fast; its chirps W^(-t^2/2) suit |W| = 1). A and W must be
+ * finite and not zero (a null pointer reads as NaN). */
+TW_API int32_t ChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                            int32_t method, Array1DHandle y);
+TW_API int32_t CxChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                              int32_t method, Array1DHandle y);
+/* The m samples y (m at most the count n of x; below 1: n) whose chirp-Z with A and W gives x at
+ * its first m points: the Vandermonde system of the nodes W^j solved exactly. Nodes that coincide
+ * (W a root of unity of order below m) give DivideByZeroErr. */
+TW_API int32_t InvChirpZT_head(Array1DHandle x, const ComplexDouble* A, const ComplexDouble* W, int32_t m,
+                               Array1DHandle y);
+
 #endif

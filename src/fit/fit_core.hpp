@@ -50,13 +50,15 @@ struct PolyTerms {
     int32_t count;
 };
 
-// Tuning of the robust kinds: two tolerances and a flag (the plain exports pass -1, -1 and 0).
+// Tuning of the robust kinds: two tolerances and a flag (the plain exports pass -1, -1 and 0);
+// iterations is the robust loop's limit in and count out (null: limit 0).
 struct RobustTuning {
     double tolerance1;
     double tolerance2;
     int32_t flag;
+    int32_t* iterations;
 };
-inline constexpr RobustTuning kPlainTuning{-1.0, -1.0, 0};
+inline constexpr RobustTuning kPlainTuning{-1.0, -1.0, 0, nullptr};
 
 // Polynomial of the given order in ascending coefficients (order + 1 of them), weights vetted
 // here. fit and mse may be null; the fit and mse always come from Horner's rule over all

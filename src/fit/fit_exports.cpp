@@ -1,23 +1,13 @@
 #include <cstring>
 
 #include "fit/fit_core.hpp"
+#include "fit/fit_frame.hpp"
 #include "frame/frame.hpp"
 #include "twanlys/fit.h"
 
 using namespace tw;
 
 namespace {
-
-// x of n samples and weights of n or none; the views come back aligned.
-Status ReadSamples(Frame& f, Handle x, Handle w, int32_t n, const double** xs, const double** ws) {
-    *ws = nullptr;
-    if (Count(x) != n) return EqSamplesErr;
-    const int32_t nw = Count(w);
-    if (nw != 0 && nw != n) return EqSamplesErr;
-    Status s = f.In(x, xs);
-    if (s == 0 && nw != 0) s = f.In(w, ws);
-    return s;
-}
 
 // Standard deviations s turned into weights 1 / (s s), s = 0 into 1.
 Status WeightsFromDeviations(const double* sd, int32_t n, Scratch<double>* w) {
@@ -37,13 +27,6 @@ Status ReadGuess(Frame& f, Handle g, int32_t p, const double** guess, bool* warn
 }
 
 // y as input, or as input and best-fit output (written back on success, shrunk on failure).
-Status ViewY(Frame& f, Handle& y, bool bestFit, const double** ys, double** fit) {
-    *fit = nullptr;
-    if (!bestFit) return f.In(y, ys);
-    const Status s = f.InPlace(y, fit);
-    *ys = *fit;
-    return s;
-}
 
 Status WithWarning(Status s, bool warn) { return s == 0 && warn ? InitialLengthWarn : s; }
 

@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "fit/fit_core.hpp"
+#include "fit/robust.hpp"
 
 namespace tw {
 
@@ -14,12 +15,11 @@ constexpr int32_t kTopPower = 25;
 
 size_t Cells(int32_t rows, int32_t cols) { return static_cast<size_t>(rows) * static_cast<size_t>(cols); }
 
-// The fit kinds on a design. Only plain least squares is served so far; the robust kinds and
-// their tuning join with their own module.
+// The fit kinds on a design; the robust kinds and their tuning live with the robust fits.
 Status SolveKind(int32_t kind, RobustTuning tuning, const double* h, int32_t n, int32_t k, const double* y,
                  const double* w, int32_t method, double* coef) {
-    static_cast<void>(tuning);
-    if (kind != PolyLeastSquares) return InvalidSelectorErr;
+    if (kind != PolyLeastSquares)
+        return RobustPolySolve(kind, tuning, h, n, k, y, w, static_cast<uint32_t>(method), coef);
     return GeneralLeastSquares(h, n, k, y, w, static_cast<uint32_t>(method), coef, nullptr, nullptr, nullptr);
 }
 

@@ -128,6 +128,9 @@ public:
         return View<T>(h, 2, n, true, data);
     }
 
+    // True once a resize has failed (as opposed to staging an aligned view of its block).
+    bool ResizeHasFailed() const { return shrinkAll_; }
+
     // Commits or applies the failure contract; returns the status with the releases merged in.
     Status Finish(Status s);
 

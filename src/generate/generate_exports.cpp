@@ -1,4 +1,5 @@
 #include "frame/frame.hpp"
+#include "generate/block_frame.hpp"
 #include "generate/waveforms.hpp"
 #include "twanlys/generate.h"
 
@@ -6,20 +7,9 @@ using namespace tw;
 
 namespace {
 
-// The frame of the block generators: status through the pointer, the host's own resize code as
-// the result.
 template <class Core>
 int32_t Generate(Handle out, const int32_t* length, int32_t* status, Core core) {
-    Frame f;
-    f.Output<double>(out);
-    const int32_t n = *length;
-    double* y = nullptr;
-    int32_t resized = 0;
-    Status s = n < 1 ? EmptyArrayErr : 0;
-    if (s == 0 && (resized = f.Resize(out, n, &y)) != 0) s = OutOfMemoryErr;
-    if (s == 0) s = core(f, y, n);
-    ToPointer(status, f.Finish(s));
-    return resized;
+    return FillByPointer<double>(out, *length, *length < 1 ? EmptyArrayErr : 0, status, core);
 }
 
 // The generators that cannot fail once the output stands.

@@ -3,6 +3,7 @@
 #include <cstdarg>
 #include <cstdio>
 #include <algorithm>
+#include <cmath>
 #include <complex>
 #include <cstring>
 #include <type_traits>
@@ -406,6 +407,40 @@ template Status Gelqf<double>(int, int, double*, int, double*);
 template Status Gelqf<cdouble>(int, int, cdouble*, int, cdouble*);
 template Status Orglq<double>(int, int, int, double*, int, const double*);
 template Status Orglq<cdouble>(int, int, int, cdouble*, int, const cdouble*);
+
+int Trsyl(char transA, char transB, int isgn, int m, int n, const double* a, const double* b, double* c, double* scale) {
+    int info = 0;
+    const int lda = std::max(m, 1), ldb = std::max(n, 1);
+    dtrsyl_(&transA, &transB, &isgn, &m, &n, a, &lda, b, &ldb, c, &lda, scale, &info, 1, 1);
+    return info;
+}
+
+int Trsyl(char transA, char transB, int isgn, int m, int n, const cdouble* a, const cdouble* b, cdouble* c,
+          double* scale) {
+    int info = 0;
+    const int lda = std::max(m, 1), ldb = std::max(n, 1);
+    ztrsyl_(&transA, &transB, &isgn, &m, &n, a, &lda, b, &ldb, c, &lda, scale, &info, 1, 1);
+    return info;
+}
+
+Status Gelsd(int m, int n, double* a, double* b, double rcond) {
+    const int order = std::max(m, n), minmn = std::min(m, n), lda = std::max(m, 1), ldb = std::max(order, 1);
+    const int nrhs = 1;
+    int rank = 0, info = 0, lwork = -1;
+    double query = 0;
+    Scratch<double> s, work;
+    Scratch<int> iwork;
+    const int levels = static_cast<int>(std::log2(static_cast<double>(std::max(minmn, 1)))) + 1;
+    if (s.Allocate(static_cast<size_t>(std::max(minmn, 1))) != 0 ||
+        iwork.Allocate((3 * static_cast<size_t>(levels) + 11) * static_cast<size_t>(std::max(minmn, 1))) != 0)
+        return OutOfMemoryErr;
+    dgelsd_(&m, &n, &nrhs, a, &lda, b, &ldb, s.get(), &rcond, &rank, &query, &lwork, iwork.get(), &info);
+    if (info != 0) return LapackStatus(Lapack::Gelsd, info, n);
+    lwork = static_cast<int>(query);
+    if (work.Allocate(static_cast<size_t>(std::max(lwork, 1))) != 0) return OutOfMemoryErr;
+    dgelsd_(&m, &n, &nrhs, a, &lda, b, &ldb, s.get(), &rcond, &rank, work.get(), &lwork, iwork.get(), &info);
+    return LapackStatus(Lapack::Gelsd, info, n);
+}
 
 Status LapackStatus(Lapack routine, int info, int n) {
     for (const InfoRule& r : kRules)

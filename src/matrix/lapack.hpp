@@ -110,6 +110,15 @@ void dgebak_(const char* job, const char* side, const int* n, const int* ilo, co
 void zgebak_(const char* job, const char* side, const int* n, const int* ilo, const int* ihi, const double* scale,
              const int* m, void* v, const int* ldv, int* info, size_t, size_t);
 double dlapy2_(const double* x, const double* y);
+// Sylvester equations on (quasi-)triangular matrices, and the minimum-norm least-squares driver.
+void dtrsyl_(const char* trana, const char* tranb, const int* isgn, const int* m, const int* n, const double* a,
+             const int* lda, const double* b, const int* ldb, double* c, const int* ldc, double* scale, int* info,
+             size_t, size_t);
+void ztrsyl_(const char* trana, const char* tranb, const int* isgn, const int* m, const int* n, const void* a,
+             const int* lda, const void* b, const int* ldb, void* c, const int* ldc, double* scale, int* info,
+             size_t, size_t);
+void dgelsd_(const int* m, const int* n, const int* nrhs, double* a, const int* lda, double* b, const int* ldb,
+             double* s, const double* rcond, int* rank, double* work, const int* lwork, int* iwork, int* info);
 }
 
 namespace tw {
@@ -180,6 +189,15 @@ void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, in
 void Gebak(char job, char side, int n, int ilo, int ihi, const double* scale, int m, cdouble* v, int ldv);
 
 inline double Lapy2(double x, double y) { return dlapy2_(&x, &y); }
+
+// op(A) X + isgn X op(B) = scale C on column-major blocks; trans 'N', 'T' (real) or 'C' (complex).
+// The raw info: above 0 means that close eigenvalues were perturbed.
+int Trsyl(char transA, char transB, int isgn, int m, int n, const double* a, const double* b, double* c, double* scale);
+int Trsyl(char transA, char transB, int isgn, int m, int n, const cdouble* a, const cdouble* b, cdouble* c,
+          double* scale);
+// Minimum-norm least squares of the column-major m by n a (destroyed) with one right-hand side in b
+// (at least max(m, n) elements, x in its first n); the integer work as stated for order N.
+Status Gelsd(int m, int n, double* a, double* b, double rcond);
 
 // The one translation of a driver's info into a status; n is the order of the problem.
 Status LapackStatus(Lapack routine, int info, int n);

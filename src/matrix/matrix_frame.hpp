@@ -26,7 +26,7 @@ int32_t PointerStyle(int32_t* status, Call call) {
 template <class T>
 Status Out2D(Frame& f, Handle& h, int32_t rows, int32_t cols, T** p, int32_t* host) {
     if (const Status s = f.Resize2D<T>(h, rows, cols, p)) {
-        *host = s;
+        if (f.ResizeHasFailed()) *host = s;  // not when only the aligned copy failed
         return OutOfMemoryErr;
     }
     return 0;
@@ -35,7 +35,7 @@ Status Out2D(Frame& f, Handle& h, int32_t rows, int32_t cols, T** p, int32_t* ho
 template <class T>
 Status Out1D(Frame& f, Handle& h, int32_t n, T** p, int32_t* host) {
     if (const Status s = f.Resize<T>(h, n, p)) {
-        *host = s;
+        if (f.ResizeHasFailed()) *host = s;  // not when only the aligned copy failed
         return OutOfMemoryErr;
     }
     return 0;

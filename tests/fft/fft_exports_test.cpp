@@ -143,26 +143,4 @@ TEST(FftFailure, ResizeFailureIsHandedOnAndEmptiesTheOutput) {
     TWRTRunCleanups(2);
 }
 
-TEST(FftFailure, InPlacePackingIsEmptiedOnFailure) {
-    twrt::Array1D<double> x(Ramp(8));
-    twrt::Array1D<double> y;
-    TWRTFailResizeAt(1);
-    EXPECT_NE(InvReQXFFTHCH(x.h(), y.h(), nullptr), 0);
-    TWRTFailResizeAt(0);
-    EXPECT_EQ(x.size(), 0);
-    EXPECT_EQ(y.size(), 0);
-}
-
-TEST(FftPlacement, PackedAndAlignedHostsGiveIdenticalResults) {
-    std::vector<std::vector<cd>> results;
-    for (bool aligned : {false, true}) {
-        twrt::Placement place(aligned);
-        twrt::Array1D<double> x(Ramp(210));
-        twrt::Array1D<cd> y;
-        ASSERT_EQ(ReQXFFTH80(x.h(), y.h(), nullptr, 3, 256, 1), 0);
-        results.push_back(y.vec());
-    }
-    EXPECT_EQ(results[0], results[1]);
-}
-
 }  // namespace

@@ -1,10 +1,6 @@
-// Binding to the host, the export list, and the link exports.
+// Binding to the host and the link exports.
 #include <dlfcn.h>
 #include <gtest/gtest.h>
-
-#include <fstream>
-#include <set>
-#include <sstream>
 
 #include "common/helpers.hpp"
 #include "twanlys/link.h"
@@ -52,26 +48,6 @@ TEST(Binding, SetTWRTModuleReturnsWhatItStores) {
     EXPECT_EQ(mean, 2.0);
     SetTWRTModule(nullptr);
     dlclose(host);
-}
-
-TEST(ExportList, EveryExportedSymbolIsCatalogued) {
-    std::ifstream list(std::string(TW_SOURCE_DIR) + "/src/exports.tsv");
-    std::set<std::string> catalogue;
-    std::string line;
-    while (std::getline(list, line)) catalogue.insert(line.substr(0, line.find('\t')));
-    ASSERT_GT(catalogue.size(), 580u);
-
-    std::string out;
-    ASSERT_EQ(twtest::Run("nm -D --defined-only " + kBin + "/libtwanlys.so", &out), 0);
-    std::istringstream symbols(out);
-    int exported = 0;
-    while (std::getline(symbols, line)) {
-        const std::string name = line.substr(line.rfind(' ') + 1);
-        if (name == "xerbla_" || name == "cblas_xerbla") continue;
-        EXPECT_TRUE(catalogue.count(name)) << name << " is exported but not catalogued";
-        ++exported;
-    }
-    EXPECT_GE(exported, 16);
 }
 
 TEST(LinkExports, UnreserveOnEmptyCellsIsANoOp) {

@@ -237,19 +237,4 @@ TEST(SpectrumFailure, ResizeFailureIsOutOfMemoryForComplexDataAndTheHostsStatusF
     }
 }
 
-TEST(SpectrumPlacement, PackedAndAlignedHostsGiveIdenticalResults) {
-    std::vector<std::vector<cd>> results;
-    for (bool aligned : {false, true}) {
-        twrt::Placement place(aligned);
-        twrt::Array1D<double> x(Ramp(35)), y(Ramp(35));
-        twrt::Array1D<cd> z;
-        ASSERT_EQ(CrossSpectrumH(x.h(), y.h(), z.h(), nullptr), 0);
-        ASSERT_EQ(SpectrumH(x.h(), nullptr), 0);
-        std::vector<cd> v = z.vec();
-        for (double p : x.vec()) v.emplace_back(p);
-        results.push_back(v);
-    }
-    EXPECT_EQ(results[0], results[1]);
-}
-
 }  // namespace

@@ -43,7 +43,7 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
     if (s == 0) s = f.In(x, &xs);
     // One block for the half-complex result (transformed at unit stride, where the kernels are
     // fastest, then unpacked into y) and, when the window reaches past x, the zero-padded input.
-    const bool pad = size > count - start;
+    const bool pad = s == 0 && size > count - start;  // start is known to lie inside x only then
     tw::Scratch<double> work;
     if (s == 0) s = work.Allocate(static_cast<size_t>(size) * (pad ? 2 : 1));
     const double* source = xs + (s == 0 ? start : 0);
@@ -90,8 +90,7 @@ Status ComplexForward(Handle x, Handle& y, void** cell, int32_t start, int32_t s
 
 // The opening of the exports that transform the whole of x: x must not be empty, the table of
 // its length comes from the cell, and y is resized to as many elements. Its frame fails on any
-// non-zero status; y shrinks with the complex type code, f64 outputs included (the block is
-// emptied all the same).
+// non-zero status; y shrinks with its own type code.
 struct WholeLength {
     Frame f{tw::FailOn::NonZero};
     tw::CachedTables tables;
@@ -102,7 +101,7 @@ struct WholeLength {
     template <class Out>
     WholeLength(Handle x, Handle& y, void** cell, bool instanceData, Out** out)
         : tables(cell, instanceData), count(tw::Count(x)) {
-        f.Output<cdouble>(y);
+        f.Output<Out>(y);
         s = count < 1 ? EmptyArrayErr : 0;
         if (s == 0) s = tables.Acquire(0, count, &table);
         if (s == 0) s = f.Resize(y, count, out);

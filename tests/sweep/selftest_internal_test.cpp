@@ -1,0 +1,126 @@
+// The sweep's checks each catch the fault they are for: exports with one fault each, described by
+// rows of their own (selftest.tsv) and judged by the same machinery as the library's exports.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <stdexcept>
+#include <utility>
+
+#include "frame/frame.hpp"
+#include "sweep/fakes.hpp"
+#include "sweep/runner.hpp"
+#include "selftest_table.inc"
+
+using namespace tw;
+
+namespace {
+
+void* g_leaked = nullptr;
+int g_calls = 0;
+
+// Copies x to y with the whole frame; `fault` names what to get wrong.
+enum class Fault { None, Leak, NoShrink, Counter };
+Status Copy(Handle x, Handle& y, Fault fault) {
+    Frame f;
+    if (fault != Fault::NoShrink) f.Output<double>(y);
+    const int32_t n = Count(x);
+    const double* xs = nullptr;
+    double* out = nullptr;
+    if (n < 1 && fault == Fault::Leak) g_leaked = ScratchAlloc(64);
+    Status s = f.In(x, &xs);
+    if (s == 0 && f.Resize(y, n < 1 ? 1 : n, &out) != 0) s = OutOfMemoryErr;
+    if (s == 0 && n < 1) s = EmptyArrayErr;
+    if (s == 0) std::memcpy(out, xs, static_cast<size_t>(n) * sizeof(double));
+    if (s == 0 && fault == Fault::Counter) out[0] = ++g_calls;
+    return fault == Fault::NoShrink && s != 0 ? s : f.Finish(s);
+}
+
+Status Mean(Handle x, double* mean, bool writeInput, bool nan) {
+    Frame f;
+    if (nan) f.Result(mean);
+    *mean = 0;
+    const int32_t n = Count(x);
+    double* xs = nullptr;
+    Status s = n < 1 ? EmptyArrayErr : 0;
+    if (s == 0) s = writeInput ? f.InPlace(x, &xs) : f.In(x, const_cast<const double**>(&xs));
+    for (int32_t i = 0; s == 0 && i < n; ++i) *mean += xs[i] / n;
+    if (s == 0 && writeInput) xs[0] *= 2;
+    return f.Finish(s);
+}
+
+}  // namespace
+
+TW_EXTERN_C int32_t SweepFakeGood(Array1DHandle x, Array1DHandle y) { return Copy(x, y, Fault::None); }
+TW_EXTERN_C int32_t SweepFakeLeaky(Array1DHandle x, Array1DHandle y) { return Copy(x, y, Fault::Leak); }
+TW_EXTERN_C int32_t SweepFakeNoShrink(Array1DHandle x, Array1DHandle y) { return Copy(x, y, Fault::NoShrink); }
+TW_EXTERN_C int32_t SweepFakeCounter(Array1DHandle x, Array1DHandle y) { return Copy(x, y, Fault::Counter); }
+TW_EXTERN_C int32_t SweepFakeWritesInput(Array1DHandle x, double* mean, int32_t* status) {
+    return ToPointer(status, Mean(x, mean, true, true));
+}
+TW_EXTERN_C int32_t SweepFakeNoNaN(Array1DHandle x, double* mean, int32_t* status) {
+    return ToPointer(status, Mean(x, mean, false, false));
+}
+TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x) { return Count(x) > 0 ? -20000 : EmptyArrayErr; }
+
+namespace {
+
+const sweep::Row& Fake(const char* name) {
+    for (const sweep::Row& r : kselftestRows)
+        if (std::strcmp(r.name, name) == 0) return r;
+    throw std::runtime_error(name);
+}
+
+bool Mentions(const std::vector<std::string>& faults, const std::string& what) {
+    for (const std::string& f : faults)
+        if (f.find(what) != std::string::npos) return true;
+    return false;
+}
+
+TEST(SweepSelfTest, TheCorrectFakePassesEveryCheck) {
+    sweep::Tally tally;
+    EXPECT_EQ(sweep::SweepRow(Fake("SweepFakeGood"), 8, &tally), std::vector<std::string>{});
+    EXPECT_EQ(sweep::CompareThreads({&Fake("SweepFakeGood")}, 2), std::vector<std::string>{});
+    EXPECT_GT(tally.calls, 40);
+}
+
+TEST(SweepSelfTest, EachFaultIsCaught) {
+    // Scratch blocks are counted in the arena, so one is set up unless the suite runs in one.
+    const bool ownArena = tw::InspectArena().live < 0;
+    ErrorCluster e{};
+    if (ownArena) InitializeAnalysisWorkspaceH(1 << 20, &e), EnableAnalysisWorkspaceH(&e);
+    const struct {
+        const char* fake;
+        int32_t count;  // elements of x
+        const char* caught;
+    } cases[] = {
+        {"SweepFakeLeaky", 0, "1 scratch blocks left live"},
+        {"SweepFakeNoShrink", 0, "y not emptied on failure"},
+        {"SweepFakeWritesInput", 4, "x is an input but was written"},
+        {"SweepFakeNoNaN", 0, "mean is not NaN on failure"},
+        {"SweepFakeStrangeStatus", 4, "status -20000 is not in status.h"},
+    };
+    for (const auto& c : cases) {
+        const sweep::Row& row = Fake(c.fake);
+        sweep::Case one = sweep::BaseCase(row);
+        one[0].rows = c.count;
+        std::vector<void*> cells(static_cast<size_t>(row.nArgs), nullptr);
+        const sweep::Verdict v = sweep::CallAndJudge(row, one, cells.data(), 0);
+        EXPECT_TRUE(Mentions(v.faults, c.caught)) << c.fake << " not caught: " << testing::PrintToString(v.faults);
+        ScratchFree(std::exchange(g_leaked, nullptr));
+    }
+    if (ownArena) DisableAnalysisWorkspaceH(&e), UninitializeAnalysisWorkspaceH(&e);
+    EXPECT_EQ(int32_t{e.code}, 0);
+}
+
+TEST(SweepSelfTest, ACallCountDiffersBetweenThreads) {
+    EXPECT_TRUE(Mentions(sweep::CompareThreads({&Fake("SweepFakeCounter")}, 2), "differs from one thread"));
+}
+
+TEST(SweepSelfTest, TheExportComparisonNamesBothKindsOfStray) {
+    const std::string nm = "0000000000001000 T Built\n0000000000002000 T Unlisted\n0000000000003000 T xerbla_\n";
+    const std::vector<std::string> faults = sweep::CompareExports({"Built", "Missing"}, nm);
+    EXPECT_EQ(faults, (std::vector<std::string>{"Unlisted is exported but its row has no signature",
+                                                 "Missing has a signature but is not exported"}));
+}
+
+}  // namespace
