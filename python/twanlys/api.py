@@ -22,6 +22,7 @@ import types
 import numpy as np
 
 from . import lowlevel as _ll
+from ._names import Arg, has_python_form, module_name, python_names
 from ._table import ROWS
 from .errors import check as _check
 
@@ -29,40 +30,12 @@ _DTYPES = {"i32": np.int32, "u8": np.uint8, "u32": np.uint32, "f32": np.float32,
            "c64": np.complex64, "c128": np.complex128, "len": np.int32}
 _CTYPES = {"i32": ctypes.c_int32, "len": ctypes.c_int32, "u8": ctypes.c_uint8, "u32": ctypes.c_uint32,
            "f32": ctypes.c_float, "f64": ctypes.c_double}
-_LOWLEVEL_ONLY = ("ptr.", "fn.", "cluster")
-_FAMILY_NAMES = {"windows": "window"}
 
 
 def _dtype(code):
     if code.startswith("b"):
         return np.dtype((np.void, int(code[1:])))
     return np.dtype(_DTYPES[code])
-
-
-def snake(name, marks=True):
-    """The Python name of an export: frame marks dropped (unless two exports would then share a
-    name), words split, lower case."""
-    base = re.sub(r"^TW_", "", name)
-    if marks:
-        base = re.sub(r"(_head|_H|CIN|H)(?=(_?\d+)?(_IDP)?$)", "", base)
-    base = re.sub(r"([a-z0-9])([A-Z])", r"\1_\2", base)
-    base = re.sub(r"([A-Z]+)([A-Z][a-z])", r"\1_\2", base)
-    base = re.sub(r"_+", "_", base).strip("_").lower()
-    return base + "_" if keyword.iskeyword(base) else base
-
-
-class Arg:
-    """One argument of a row: name, kind and what the Python function does with it."""
-
-    def __init__(self, text):
-        name, kind = text.split(":", 1)
-        self.name = name + "_" if keyword.iskeyword(name) else name
-        self.optional = kind.endswith("?")
-        self.kind = kind.rstrip("?")
-        parts = self.kind.split(".")
-        self.head = parts[0]
-        self.direction = parts[-1] if parts[-1] in ("in", "out", "io") else "in"
-        self.element = parts[1] if len(parts) > 2 else (parts[0] if parts[0] in _CTYPES else "")
 
 
 def _record_type(kind):
@@ -245,22 +218,22 @@ def build_families(package):
     """Adds a module per family to the package (twanlys.stats, twanlys.fft, ...) and returns
     {export name: function} for every export with a Python form."""
     functions = {}
-    rows = [r for r in ROWS if not any(":" + k in r[2] for k in _LOWLEVEL_ONLY) and r[5] not in ("link", "workspace")]
-    taken = collections.Counter((r[5], snake(r[0])) for r in rows)
-    for row in rows:
-        name, family = row[0], row[5] or "other"
-        pyname = snake(name, marks=taken[(row[5], snake(name))] == 1)
+    names = python_names(ROWS)
+    for row in ROWS:
+        if not has_python_form(row):
+            continue
+        name, family, pyname = row[0], row[5], names[row[0]]
         source, env, params, outputs = _build(row, pyname)
         exec(compile(source, f"<twanlys {name}>", "exec"), env)
         fn = env[pyname]
         fn.__doc__ = _doc(row, params, outputs)
         fn.__qualname__ = fn.__name__
-        module_name = _FAMILY_NAMES.get(family, family)
-        full = f"{package.__name__}.{module_name}"
+        short = module_name(family)
+        full = f"{package.__name__}.{short}"
         module = sys.modules.get(full)
         if module is None:
             module = sys.modules[full] = types.ModuleType(full, f"twanlys: the exports of twanlys/{family}.h")
-            setattr(package, module_name, module)
+            setattr(package, short, module)
         fn.__module__ = full
         setattr(module, fn.__name__, fn)
         functions[name] = fn
