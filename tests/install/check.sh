@@ -33,11 +33,12 @@ test "$("$work/example/build/example")" = "$expected"
 
 unset TWANLYS_LIB_DIR TWANLYS_PREFIX
 block "Use from Python" python >"$work/example.py"
+python_expected=$(printf '2.5\nTrue')
 cd "$work"
-test "$(PYTHONPATH="$lib/python3/dist-packages" /usr/bin/python3 example.py)" = 2.5
+test "$(PYTHONPATH="$lib/python3/dist-packages" /usr/bin/python3 example.py)" = "$python_expected"
 /usr/bin/python3 -m venv --system-site-packages "$work/venv"
 cp -r "$src/python" "$work/python"  # pip builds in the tree it is given
 "$work/venv/bin/pip" install -q --no-build-isolation --no-index "$work/python" >/dev/null
-test "$(TWANLYS_PREFIX="$prefix" "$work/venv/bin/python" example.py)" = 2.5
-test "$(LD_LIBRARY_PATH="$lib" "$work/venv/bin/python" example.py)" = 2.5
+test "$(TWANLYS_PREFIX="$prefix" "$work/venv/bin/python" example.py)" = "$python_expected"
+test "$(LD_LIBRARY_PATH="$lib" "$work/venv/bin/python" example.py)" = "$python_expected"
 echo "install: the README's C++ (pkg-config, find_package) and Python examples run against $prefix"

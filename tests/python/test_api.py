@@ -34,6 +34,12 @@ class Table(unittest.TestCase):
         for fn in tw.EXPORTS.values():
             self.assertIn("Export ", fn.__doc__)
 
+    def test_reference_pages_cover_every_export(self):
+        pages = os.path.join(os.environ.get("TWANLYS_LIB_DIR", os.path.join(ROOT, "build")), "doc", "reference")
+        text = "".join(open(os.path.join(pages, f)).read() for f in os.listdir(pages))
+        for row in ROWS:
+            self.assertIn(f"## {row[0]}\n", text)
+
 
 class Results(unittest.TestCase):
     def setUp(self):
