@@ -41,4 +41,14 @@ TW_API void TW_Airy(double x, double* ai, double* bi, double* aip, double* bip);
 TW_API void TW_KelvinI(double x, int32_t n, double* ber, double* bei);
 TW_API void TW_KelvinK(double x, int32_t n, double* ker, double* kei);
 
+/* Elliptic integrals in the parameter m (not the modulus k): F(phi | m) and E(phi | m); NaN as phi
+ * selects the complete K(m), E(m). */
+TW_API void TW_Elliptic1(double m, double phi, double* out);
+TW_API void TW_Elliptic2(double m, double phi, double* out);
+/* selector 1: the complete integral (phi ignored); any other value the incomplete one. */
+TW_API void TW_Elliptic1_85(double m, double phi, double* out, int32_t selector);
+TW_API void TW_Elliptic2_85(double m, double phi, double* out, int32_t selector);
+/* Jacobi's elliptic functions sn, cn, dn of u and the amplitude phi (phi may be null). */
+TW_API void TW_EllipticJ(double u, double m, double* sn, double* cn, double* dn, double* phi);
+
 #endif
