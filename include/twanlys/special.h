@@ -51,4 +51,21 @@ TW_API void TW_Elliptic2_85(double m, double phi, double* out, int32_t selector)
 /* Jacobi's elliptic functions sn, cn, dn of u and the amplitude phi (phi may be null). */
 TW_API void TW_EllipticJ(double u, double m, double* sn, double* cn, double* dn, double* phi);
 
+/* Riemann zeta function. */
+TW_API void TW_Zeta(double x, double* out);
+/* Dilogarithm in Spence's form: the integral of ln t / (1 - t) from 1 to x, for x >= 0. */
+TW_API void TW_Diln(double x, double* out);
+/* Dawson's integral exp(-x^2) times the integral of exp(t^2) from 0 to x. */
+TW_API void TW_Dawson(double x, double* out);
+/* Fresnel integrals S(x) and C(x) with the phase pi t^2 / 2. */
+TW_API void TW_FresnelIntegrals(double x, double* s, double* c);
+/* Exponential integral E_n(x), x >= 0, n >= 0. */
+TW_API void TW_ExpI(double x, int32_t n, double* out);
+/* Sine and cosine integrals Si(x), Ci(x) (Ci of |x| for x < 0). */
+TW_API void TW_SinI(double x, double* out);
+TW_API void TW_CosI(double x, double* out);
+/* Hyperbolic sine and cosine integrals Shi(x), Chi(x) (Chi of |x| for x < 0). */
+TW_API void TW_SinhI(double x, double* out);
+TW_API void TW_CoshI(double x, double* out);
+
 #endif

@@ -36,3 +36,40 @@ TW_API void TW_EllipticJ(double u, double m, double* sn, double* cn, double* dn,
     Store(cn, c);
     Store(dn, d);
 }
+
+TW_API void TW_Zeta(double x, double* out) { Store(out, Zeta(x)); }
+TW_API void TW_Diln(double x, double* out) { Store(out, Spence(x)); }
+TW_API void TW_Dawson(double x, double* out) { Store(out, Dawson(x)); }
+
+TW_API void TW_FresnelIntegrals(double x, double* s, double* c) {
+    double fs, fc;
+    Fresnel(x, &fs, &fc);
+    Store(s, fs);
+    Store(c, fc);
+}
+
+TW_API void TW_ExpI(double x, int32_t n, double* out) { Store(out, ExpN(n, x)); }
+
+TW_API void TW_SinI(double x, double* out) {
+    double si, ci;
+    SinCosIntegral(x, &si, &ci);
+    Store(out, si);
+}
+
+TW_API void TW_CosI(double x, double* out) {
+    double si, ci;
+    SinCosIntegral(x, &si, &ci);
+    Store(out, ci);
+}
+
+TW_API void TW_SinhI(double x, double* out) {
+    double shi, chi;
+    ShiChi(x, &shi, &chi);
+    Store(out, shi);
+}
+
+TW_API void TW_CoshI(double x, double* out) {
+    double shi, chi;
+    ShiChi(x, &shi, &chi);
+    Store(out, chi);
+}
