@@ -68,4 +68,16 @@ TW_API void TW_CosI(double x, double* out);
 TW_API void TW_SinhI(double x, double* out);
 TW_API void TW_CoshI(double x, double* out);
 
+/* Gauss's hypergeometric function 2F1(a, b; c; x), |x| <= 1. The 2011 generation takes the Pfaff
+ * transformation below x = 0.2 rather than -0.5. */
+TW_API void TW_Gauss(double x, double a, double b, double c, double* out);
+TW_API void TW_Gauss_2011(double x, double a, double b, double c, double* out);
+/* Kummer's confluent hypergeometric function M(a, b, x) = 1F1(a; b; x). */
+TW_API void TW_Kummer(double x, double a, double b, double* out);
+/* Tricomi's confluent hypergeometric function U(a, b, x), x >= 0. */
+TW_API void TW_Tricomi(double x, double a, double b, double* out);
+
+/* Struve's function H_v(x); x < 0 only for integer v. */
+TW_API void TW_Struve(double x, double v, double* out);
+
 #endif

@@ -156,15 +156,16 @@ void JacobiElliptic(double u, double m, double* sn, double* cn, double* dn, doub
             b = t;
             twon *= 2.0;
         }
-        double p = twon * a[i] * u, last = p;
+        double p = twon * a[i] * u;
         do {
             const double t = cc[i] * std::sin(p) / a[i];
-            last = p;
             p = 0.5 * (std::asin(t) + p);
         } while (--i);
         s = std::sin(p);
         c = std::cos(p);
-        d = c / std::cos(p - last);
+        // dn^2 = cn^2 + (1 - m) sn^2, a sum of positive terms. The ratio cn / cos(phi_1 - phi)
+        // would carry the rounding of the upper phase phi_1 (1e-10 seen at |u| ~ 13).
+        d = std::sqrt(c * c + (1.0 - m) * s * s);
         ph = p;
     }
     *sn = s;

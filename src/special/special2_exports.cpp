@@ -73,3 +73,14 @@ TW_API void TW_CoshI(double x, double* out) {
     ShiChi(x, &shi, &chi);
     Store(out, chi);
 }
+
+// The Pfaff transformation takes over below -0.5 in the first generation, below 0.2 in the second.
+TW_API void TW_Gauss(double x, double a, double b, double c, double* out) { Store(out, Hyp2F1(a, b, c, x, -0.5)); }
+TW_API void TW_Gauss_2011(double x, double a, double b, double c, double* out) {
+    Store(out, Hyp2F1(a, b, c, x, 0.2));
+}
+
+TW_API void TW_Kummer(double x, double a, double b, double* out) { Store(out, Hyp1F1(a, b, x)); }
+TW_API void TW_Tricomi(double x, double a, double b, double* out) { Store(out, HypU(a, b, x)); }
+
+TW_API void TW_Struve(double x, double v, double* out) { Store(out, Struve(v, x)); }

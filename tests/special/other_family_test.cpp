@@ -68,6 +68,11 @@ TEST(OtherFamily, StatedEdges) {
         {"Shi(1000)", [] { return Call(TW_SinhI, 1000.0); }, kInf, 0},
         {"Chi(-1) is Chi(1)", [] { return Call(TW_CoshI, -1.0); }, Call(TW_CoshI, 1.0), 0},
         {"Diln(+Inf)", [] { return Call(TW_Diln, kInf); }, -kInf, 0},
+        {"Kummer(5, 0, 1)", [] { return Call(TW_Kummer, 5.0, 0.0, 1.0); }, 1.0, 0},
+        {"Tricomi(0, 1, 1)", [] { return Call(TW_Tricomi, 0.0, 1.0, 1.0); }, kInf, 0},
+        {"Gauss beyond |x| = 1", [] { return Call(TW_Gauss, -1.5, 1.0, 1.0, 3.0); }, kNaN, 0},
+        {"Gauss, c a pole", [] { return Call(TW_Gauss, 0.5, 1.0, 1.0, -3.0); }, kInf, 0},
+        {"Struve(0, -2)", [] { return Call(TW_Struve, 0.0, -2.0); }, kNaN, 0},
     });
 }
 
@@ -90,6 +95,13 @@ TEST(OtherFamily, ClosedForms) {
         {"E_2(1) = 1/e - E_1(1)", [] { return Call(TW_ExpI, 1.0, 2); },
          std::exp(-1.0) - 0.21938393439552027, 4e-15},
         {"Si(inf)", [] { return Call(TW_SinI, kInf); }, kPi / 2, 0},
+        // 2F1(1, 1; 2; x) = -ln(1 - x)/x; the 2011 generation reaches it through Pfaff.
+        {"Gauss(0.1, 1, 1, 2)", [] { return Call(TW_Gauss, 0.1, 1.0, 1.0, 2.0); }, -std::log1p(-0.1) / 0.1, 4e-16},
+        {"Gauss_2011(0.1, 1, 1, 2)", [] { return Call(TW_Gauss_2011, 0.1, 1.0, 1.0, 2.0); }, -std::log1p(-0.1) / 0.1, 4e-16},
+        {"Kummer(x, 1, 2) = (e^x - 1)/x", [] { return Call(TW_Kummer, 3.0, 1.0, 2.0); }, std::expm1(3.0) / 3, 1e-15},
+        {"Tricomi(x, a, a + 1) = x^-a", [] { return Call(TW_Tricomi, 2.5, 1.5, 2.5); }, std::pow(2.5, -1.5), 4e-16},
+        {"Struve H_1/2(40)", [] { return Call(TW_Struve, 40.0, 0.5); },
+         std::sqrt(2 / (kPi * 40)) * (1 - std::cos(40.0)), 1e-14},
     });
 }
 
