@@ -80,4 +80,7 @@ TW_API void TW_Tricomi(double x, double a, double b, double* out);
 /* Struve's function H_v(x); x < 0 only for integer v. */
 TW_API void TW_Struve(double x, double v, double* out);
 
+/* The parabolic cylinder function D_v(x) (Whittaker's). */
+TW_API void TW_ParabolicCylinder(double x, double v, double* out);
+
 #endif

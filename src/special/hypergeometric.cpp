@@ -6,6 +6,7 @@
 
 #include "special/bessel.hpp"
 #include "special/gamma.hpp"
+#include "special/gamma_weighted_integral.hpp"
 #include "special/special2.hpp"
 #include "special/special2_tables.hpp"
 #include "special/special_frame.hpp"
@@ -234,50 +235,9 @@ double TricomiAsymptotic(double a, double b, double x, bool* ok) {
     return kNaN;
 }
 
-// U(a, b, x) = 1/Gamma(a) times the integral over t > 0 of exp(-x t) t^(a-1) (1 + t)^(b-a-1),
-// for a > 0, by the trapezoidal rule after t = exp(pi/2 sinh s), halving the step to 1e-14.
-// Below a = 1 the mass near t = 0 reaches far beyond any cut-off, so the part
-// Gamma(a) = integral of t^(a-1) e^(-t) is taken out in closed form and only the difference summed.
+// U(a, b, x) = 1/Gamma(a) times the integral over t > 0 of exp(-x t) t^(a-1) (1 + t)^(b-a-1), a > 0.
 double TricomiIntegral(double a, double b, double x) {
-    const double lg = LnGammaFunc(a);
-    const bool split = a < 1.0;
-    auto term = [&](double s) {
-        const double ls = kPiOver2 * std::sinh(s);
-        const double t = std::exp(ls);
-        const double jacobian = kPiOver2 * std::cosh(s);
-        if (split) {
-            const double q = (1.0 - x) * t + (b - a - 1.0) * std::log1p(t);
-            const double base = a * ls - lg;
-            if (std::fabs(q) < 1.0) return std::exp(base - t) * std::expm1(q) * jacobian;
-            return (std::exp(base + q - t) - std::exp(base - t)) * jacobian;
-        }
-        return std::exp(-x * t + a * ls + (b - a - 1.0) * std::log1p(t) - lg) * jacobian;
-    };
-    // Sum over the nodes k h (odd k only after the first level), outward until negligible.
-    auto sweep = [&](double h, int stride, double scale) {
-        double sum = 0.0;
-        for (int dir = -1; dir <= 1; dir += 2) {
-            for (int k = (stride == 1 && dir == 1) ? 0 : 1;; k += stride) {
-                const double s = dir * k * h;
-                const double v = term(s);
-                sum += v;
-                if ((std::fabs(s) > 1.0 && std::fabs(v) <= 1e-18 * std::fabs(scale + sum)) || std::fabs(s) > 8.0) break;
-            }
-        }
-        return sum;
-    };
-    double h = 0.25;
-    double total = sweep(h, 1, 0.0);
-    double value = total * h;
-    for (int level = 0; level < 8; ++level) {
-        h *= 0.5;
-        total += sweep(h, 2, total);
-        const double next = total * h;
-        const bool done = std::fabs(next - value) <= 1e-14 * std::fabs(next);
-        value = next;
-        if (done && level >= 1) break;
-    }
-    return split ? 1.0 + value : value;
+    return GammaWeightedIntegral(a, [&](double t) { return -x * t + (b - a - 1.0) * std::log1p(t); });
 }
 
 // U for x > 0 where the series cannot be used: the integral for a > 0, through Kummer's

@@ -84,3 +84,5 @@ TW_API void TW_Kummer(double x, double a, double b, double* out) { Store(out, Hy
 TW_API void TW_Tricomi(double x, double a, double b, double* out) { Store(out, HypU(a, b, x)); }
 
 TW_API void TW_Struve(double x, double v, double* out) { Store(out, Struve(v, x)); }
+
+TW_API void TW_ParabolicCylinder(double x, double v, double* out) { Store(out, ParabolicCylinderD(v, x)); }

@@ -73,6 +73,9 @@ TEST(OtherFamily, StatedEdges) {
         {"Gauss beyond |x| = 1", [] { return Call(TW_Gauss, -1.5, 1.0, 1.0, 3.0); }, kNaN, 0},
         {"Gauss, c a pole", [] { return Call(TW_Gauss, 0.5, 1.0, 1.0, -3.0); }, kInf, 0},
         {"Struve(0, -2)", [] { return Call(TW_Struve, 0.0, -2.0); }, kNaN, 0},
+        {"D_0.5(-Inf): sign of 1/Gamma(-0.5)", [] { return Call(TW_ParabolicCylinder, -kInf, 0.5); }, -kInf, 0},
+        {"D_3(-Inf)", [] { return Call(TW_ParabolicCylinder, -kInf, 3.0); }, -0.0, 0},
+        {"D_v(+Inf)", [] { return Call(TW_ParabolicCylinder, kInf, -2.5); }, 0.0, 0},
     });
 }
 
@@ -100,6 +103,9 @@ TEST(OtherFamily, ClosedForms) {
         {"Gauss_2011(0.1, 1, 1, 2)", [] { return Call(TW_Gauss_2011, 0.1, 1.0, 1.0, 2.0); }, -std::log1p(-0.1) / 0.1, 4e-16},
         {"Kummer(x, 1, 2) = (e^x - 1)/x", [] { return Call(TW_Kummer, 3.0, 1.0, 2.0); }, std::expm1(3.0) / 3, 1e-15},
         {"Tricomi(x, a, a + 1) = x^-a", [] { return Call(TW_Tricomi, 2.5, 1.5, 2.5); }, std::pow(2.5, -1.5), 4e-16},
+        {"D_2(x) = (x^2 - 1) e^(-x^2/4)", [] { return Call(TW_ParabolicCylinder, 3.0, 2.0); }, 8 * std::exp(-2.25), 4e-16},
+        {"D_-1(x) = e^(x^2/4) sqrt(pi/2) erfc(x/sqrt 2)", [] { return Call(TW_ParabolicCylinder, 1.5, -1.0); },
+         std::exp(0.5625) * std::sqrt(kPi / 2) * std::erfc(1.5 / std::sqrt(2.0)), 1e-14},
         {"Struve H_1/2(40)", [] { return Call(TW_Struve, 40.0, 0.5); },
          std::sqrt(2 / (kPi * 40)) * (1 - std::cos(40.0)), 1e-14},
     });
