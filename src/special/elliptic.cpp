@@ -10,7 +10,6 @@ namespace tw {
 
 namespace {
 
-
 bool OutsideUnit(double m) { return !IsFinite(m) || m < 0.0 || m > 1.0; }
 
 // The number of whole periods pi nearest to phi: each contributes 2K (2E). Rounding to the

@@ -36,7 +36,8 @@ double GammaWeightedIntegral(double a, LogG logG) {
                 const double s = dir * k * h;
                 const double v = term(s);
                 sum += v;
-                if ((std::fabs(s) > 1.0 && std::fabs(v) <= 1e-18 * std::fabs(scale + sum)) || std::fabs(s) > 8.0) {
+                if ((std::fabs(s) > 1.0 && std::fabs(v) <= 1e-18 * std::fabs(scale + sum)) ||
+                    std::fabs(s) > 8.0) {
                     break;
                 }
             }

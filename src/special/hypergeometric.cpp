@@ -285,7 +285,8 @@ double HypU(double a, double b, double x) {
     if (x < 6.0 && !NonPositiveInteger(b) && !NonPositiveInteger(2.0 - b)) {
         // Two Kummer functions with gammas (13.2.42); kept where they do not cancel badly.
         const double t1 = GammaFunc(1.0 - b) * RecipGamma(a - b + 1.0) * Hyp1F1(a, b, x);
-        const double t2 = GammaFunc(b - 1.0) * RecipGamma(a) * std::pow(x, 1.0 - b) * Hyp1F1(a - b + 1.0, 2.0 - b, x);
+        const double t2 =
+            GammaFunc(b - 1.0) * RecipGamma(a) * std::pow(x, 1.0 - b) * Hyp1F1(a - b + 1.0, 2.0 - b, x);
         const double u = t1 + t2;
         if (IsFinite(u) && std::fabs(t1) + std::fabs(t2) <= 16.0 * std::fabs(u)) return u;
     }

@@ -78,7 +78,8 @@ double ParabolicCylinderD(double v, double x) {
     // pair rests on 1F1 at large arguments, which the asymptotic route may give to 1e-7 only.
     if (x >= 0.0 && x <= 2.0) {
         const double even = kSqrtPi * RecipGammaOrZero(0.5 * (1.0 - v)) * Hyp1F1(-0.5 * v, 0.5, z);
-        const double odd = kSqrt2 * kSqrtPi * x * RecipGammaOrZero(-0.5 * v) * Hyp1F1(0.5 * (1.0 - v), 1.5, z);
+        const double odd =
+            kSqrt2 * kSqrtPi * x * RecipGammaOrZero(-0.5 * v) * Hyp1F1(0.5 * (1.0 - v), 1.5, z);
         const double d = even - odd;
         if (IsFinite(d) && std::fabs(even) + std::fabs(odd) <= 16.0 * std::fabs(d)) return scale * d;
     }

@@ -75,7 +75,9 @@ TW_API void TW_CoshI(double x, double* out) {
 }
 
 // The Pfaff transformation takes over below -0.5 in the first generation, below 0.2 in the second.
-TW_API void TW_Gauss(double x, double a, double b, double c, double* out) { Store(out, Hyp2F1(a, b, c, x, -0.5)); }
+TW_API void TW_Gauss(double x, double a, double b, double c, double* out) {
+    Store(out, Hyp2F1(a, b, c, x, -0.5));
+}
 TW_API void TW_Gauss_2011(double x, double a, double b, double c, double* out) {
     Store(out, Hyp2F1(a, b, c, x, 0.2));
 }

@@ -45,7 +45,9 @@ std::string RoutineText(const std::string& json, const char* routine) {
 
 // Skip marks an index the generator does not take from the file (-1: none).
 template <class Entry>
-int SkipOf(const Entry&) { return -1; }
+int SkipOf(const Entry&) {
+    return -1;
+}
 int SkipOf(const tw::cephes::OtherTableEntry& e) { return e.skip; }
 
 // Every compiled figure equals the file's; counts the figures compared.
@@ -83,14 +85,16 @@ void CheckAgainstFile(const Entries& entries, int& checked) {
 }
 
 TEST(BesselTables, EqualTheCollectedFigures) {
-    if (FindData().empty() || !fs::exists(FindData())) GTEST_SKIP() << "no cephes-tables.json beside the checkout";
+    if (FindData().empty() || !fs::exists(FindData()))
+        GTEST_SKIP() << "no cephes-tables.json beside the checkout";
     int checked = 0;
     CheckAgainstFile(tw::cephes::kTables, checked);
     EXPECT_GT(checked, 300);
 }
 
 TEST(OtherSpecialTables, EqualTheCollectedFigures) {
-    if (FindData().empty() || !fs::exists(FindData())) GTEST_SKIP() << "no cephes-tables.json beside the checkout";
+    if (FindData().empty() || !fs::exists(FindData()))
+        GTEST_SKIP() << "no cephes-tables.json beside the checkout";
     int checked = 0;
     CheckAgainstFile(tw::cephes::kOtherTables, checked);
     EXPECT_GT(checked, 250);
