@@ -19,6 +19,8 @@ constexpr double kIntegerTol = 1.8334264312505186e-11;  // an order counts as an
 constexpr double kGapTol = 3.7252902984619132e-09;      // c - a - b counts as an integer
 constexpr double kSeriesStop = 8.881784197001252e-16;
 constexpr double kMaxTerms = 10000.0;
+// Recurrences run at most this many steps; beyond, the parameters are out of reach.
+constexpr double kMaxSteps = 10000.0;
 
 bool NonPositiveInteger(double v) { return v <= 0.0 && std::fabs(v - std::round(v)) < kIntegerTol; }
 
@@ -65,7 +67,7 @@ double GaussTransformed(double a, double b, double c, double x, double pfaffBelo
     }
     const double d = c - a - b;
     const double id = std::round(d);
-    if (x > 0.9 && !terminates) {
+    if (x > 0.9 && !terminates && std::fabs(id) <= kMaxSteps) {
         if (std::fabs(d - id) > kGapTol) {
             y = GaussSeries(a, b, c, x, &err);
             if (err < cephes::hyp2f1::ETHRESH) {
@@ -161,8 +163,6 @@ double GaussTransformed(double a, double b, double c, double x, double pfaffBelo
     return y;
 }
 
-double GaussRecursive(double a, double b, double c, double x, double pfaffBelow);
-
 // 2F1 on finite arguments with |x| <= 1.
 double GaussCore(double a, double b, double c, double x, double pfaffBelow) {
     const double s = 1.0 - x;
@@ -193,10 +193,14 @@ double GaussCore(double a, double b, double c, double x, double pfaffBelow) {
         if (err < cephes::hyp2f1::ETHRESH) return y;
         // Raise c until c - a - b > 0, then come back down by the recurrence on c (15.2.27).
         const double id = std::round(d);
+        if (2.0 - id > kMaxSteps) {
+            SpecialReport(SpecialFunction::Hyp2F1, SpecialFault::Precision);
+            return y;
+        }
         const int aid = static_cast<int>(2.0 - id);
         double e = c + aid;
-        double d2 = GaussRecursive(a, b, e, x, pfaffBelow);
-        double d1 = GaussRecursive(a, b, e + 1.0, x, pfaffBelow);
+        double d2 = GaussCore(a, b, e, x, pfaffBelow);
+        double d1 = GaussCore(a, b, e + 1.0, x, pfaffBelow);
         const double q = a + b + 1.0;
         double r = y;
         for (int i = 0; i < aid; ++i) {
@@ -211,10 +215,6 @@ double GaussCore(double a, double b, double c, double x, double pfaffBelow) {
     const double y = GaussTransformed(a, b, c, x, pfaffBelow, &err);
     if (err > cephes::hyp2f1::ETHRESH) SpecialReport(SpecialFunction::Hyp2F1, SpecialFault::Precision);
     return y;
-}
-
-double GaussRecursive(double a, double b, double c, double x, double pfaffBelow) {
-    return GaussCore(a, b, c, x, pfaffBelow);
 }
 
 // The asymptotic series of U for large x, accepted only if the first omitted term is below eps
@@ -247,6 +247,10 @@ double TricomiByIntegral(double a, double b, double x) {
     if (a > 0.0) return TricomiIntegral(a, b, x);
     if (1.0 + a - b > 0.0) return std::pow(x, 1.0 - b) * TricomiIntegral(1.0 + a - b, 2.0 - b, x);
     const double steps = std::floor(-a) + 1.0;
+    if (steps > kMaxSteps) {
+        SpecialReport(SpecialFunction::Tricomi, SpecialFault::Precision);
+        return kNaN;
+    }
     double top = a + steps;  // in (0, 1]
     double u1 = TricomiIntegral(top + 1.0, b, x), u0 = TricomiIntegral(top, b, x);
     for (double k = 0.0; k < steps; k += 1.0) {

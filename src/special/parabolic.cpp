@@ -1,7 +1,7 @@
 // The parabolic cylinder function D_v(x) in Whittaker's form. Integer v >= 0 by the Hermite
-// recurrence; v < 0 by the integral e^(-x^2/4) / Gamma(-v) times that of t^(-v-1) e^(-x t - t^2/2).
-// Other v: two Kummer functions with gammas on 0 <= x <= 2 where they do not cancel (beyond, they
-// cancel by up to e^(x^2/2)) and Tricomi's function for x > 0; for x < 0 the value at |x| plus
+// recurrence. Otherwise two Kummer functions with gammas where they do not cancel (for x > 0 they
+// cancel by up to e^(x^2/2)), Tricomi's function for x > 0, and for x < 0 either the integral
+// e^(-x^2/4) / Gamma(-v) times that of t^(-v-1) e^(-x t - t^2/2) (v < 0) or the value at |x| plus
 // twice one Kummer part (the recurrence in v is unstable there).
 #include <cmath>
 
@@ -73,10 +73,11 @@ double ParabolicCylinderD(double v, double x) {
     if (wholeOrder && v <= kHermiteLimit) return Hermite(v, x);
     const double z = 0.5 * x * x;
     const double scale = std::exp(v * kHalfLn2 - 0.25 * x * x);  // 2^(v/2) e^(-x^2/4)
-    if (v < 0.0) return NegativeOrder(v, x);
-    // The Kummer pair only on 0 <= x <= 2, where both series converge quickly; for x < 0 the
-    // pair rests on 1F1 at large arguments, which the asymptotic route may give to 1e-7 only.
-    if (x >= 0.0 && x <= 2.0) {
+    // The Kummer pair where it cannot cancel much: for v < 0 and x <= 0 both parts have one sign
+    // and every term of both series is positive; on 0 <= x <= 2 by a test. Elsewhere for x < 0
+    // and v > 0 the pair rests on 1F1 at large arguments whose terms cancel when the first
+    // parameter is near a non-positive integer.
+    if (x <= 2.0 && (x >= 0.0 || v < 0.0)) {
         const double even = kSqrtPi * RecipGammaOrZero(0.5 * (1.0 - v)) * Hyp1F1(-0.5 * v, 0.5, z);
         const double odd =
             kSqrt2 * kSqrtPi * x * RecipGammaOrZero(-0.5 * v) * Hyp1F1(0.5 * (1.0 - v), 1.5, z);
@@ -84,6 +85,7 @@ double ParabolicCylinderD(double v, double x) {
         if (IsFinite(d) && std::fabs(even) + std::fabs(odd) <= 16.0 * std::fabs(d)) return scale * d;
     }
     if (x > 0.0) return scale * HypU(-0.5 * v, 0.5, z);
+    if (v < 0.0) return NegativeOrder(v, x);
     // x < 0: D_v(x) = D_v(|x|) + 2 (even part), or 2 (odd part) - D_v(|x|). Of the two Kummer
     // functions take the one whose first parameter lies farther from a non-positive integer:
     // near one its large terms cancel down to the polynomial part.
