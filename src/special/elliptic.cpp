@@ -16,8 +16,8 @@ bool OutsideUnit(double m) { return !IsFinite(m) || m < 0.0 || m > 1.0; }
 // nearest multiple of pi/2 instead would leave an odd count with the wrong half period.
 double PeriodsOf(double phi) { return std::floor(phi / kPi + 0.5); }
 
-// Descending Landen transformation of the amplitude for 0 <= phi < pi/2; *e gathers the
-// sum of c_n sin(phi_n) that the second kind needs. Returns (atan(t) + mod pi) / (2^n a).
+// Descending Landen transformation of the amplitude for 0 <= phi < pi/2; *e, when given, gathers
+// the sum of c_n sin(phi_n) that the second kind needs. Returns (atan(t) + mod pi) / (2^n a).
 double Landen(double phi, double m, double* e) {
     double a = 1.0, b = std::sqrt(1.0 - m), c = std::sqrt(m), t = std::tan(phi), d = 1.0, mod = 0.0;
     double sum = 0.0;
@@ -31,9 +31,9 @@ double Landen(double phi, double m, double* e) {
         a = 0.5 * (a + b);
         b = g;
         d += d;
-        sum += c * std::sin(phi);
+        if (e != nullptr) sum += c * std::sin(phi);
     }
-    *e = sum;
+    if (e != nullptr) *e = sum;
     return (std::atan(t) + mod * kPi) / (d * a);
 }
 
@@ -46,8 +46,7 @@ double FirstKindReduced(double phi, double m) {
         const double e = 1.0 / (std::sqrt(1.0 - m) * t);
         if (std::fabs(e) < 10.0) return EllipticK(m) - FirstKindReduced(std::atan(e), m);
     }
-    double unused;
-    return Landen(phi, m, &unused);
+    return Landen(phi, m, nullptr);
 }
 
 double SecondKindReduced(double phi, double m) {
