@@ -17,9 +17,12 @@ double GammaWeightedIntegral(double a, LogG logG) {
     const double lg = LnGammaFunc(a);
     const bool split = a < 1.0;
     auto term = [&](double s) {
-        const double ls = kPiOver2 * std::sinh(s);
+        // sinh and cosh from one exponential: the nodes move by rounding only, and the weights
+        // move with them.
+        const double es = std::exp(s), inv = 1.0 / es;
+        const double ls = kPiOver2 * 0.5 * (es - inv);
         const double t = std::exp(ls);
-        const double jacobian = kPiOver2 * std::cosh(s);
+        const double jacobian = kPiOver2 * 0.5 * (es + inv);
         const double base = a * ls - lg;
         if (split) {
             const double q = logG(t) + t;  // ln(g(t) e^t)
