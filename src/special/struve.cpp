@@ -18,7 +18,7 @@ constexpr double kHalfSqrtPi = 0.886226925452758;
 // 1F2(a; b, c; x) with error estimate eps * largest term / sum.
 double Hyp1F2(double a, double b, double c, double x, double* err) {
     constexpr double stop = 1.8046660579423136e-14;
-    // The stated limit 1.79769313486232e+308 lies beyond the largest double and rounds to
+    // The term limit 1.79769313486232e+308 lies beyond the largest double and rounds to
     // infinity: no finite term stops the series.
     constexpr double limit = kInf;
     double an = a, bn = b, cn = c, a0 = 1.0, sum = 1.0, n = 1.0, t = 1.0, max = 0.0;
