@@ -41,4 +41,46 @@ TW_API void TW_Airy(double x, double* ai, double* bi, double* aip, double* bip);
 TW_API void TW_KelvinI(double x, int32_t n, double* ber, double* bei);
 TW_API void TW_KelvinK(double x, int32_t n, double* ker, double* kei);
 
+/* Elliptic integrals in the parameter m (not the modulus k): F(phi | m) and E(phi | m); NaN as phi
+ * selects the complete K(m), E(m). */
+TW_API void TW_Elliptic1(double m, double phi, double* out);
+TW_API void TW_Elliptic2(double m, double phi, double* out);
+/* selector 1: the complete integral (phi ignored); any other value the incomplete one. */
+TW_API void TW_Elliptic1_85(double m, double phi, double* out, int32_t selector);
+TW_API void TW_Elliptic2_85(double m, double phi, double* out, int32_t selector);
+/* Jacobi's elliptic functions sn, cn, dn of u and the amplitude phi (phi may be null). */
+TW_API void TW_EllipticJ(double u, double m, double* sn, double* cn, double* dn, double* phi);
+
+/* Riemann zeta function. */
+TW_API void TW_Zeta(double x, double* out);
+/* Dilogarithm in Spence's form: the integral of ln t / (1 - t) from 1 to x, for x >= 0. */
+TW_API void TW_Diln(double x, double* out);
+/* Dawson's integral exp(-x^2) times the integral of exp(t^2) from 0 to x. */
+TW_API void TW_Dawson(double x, double* out);
+/* Fresnel integrals S(x) and C(x) with the phase pi t^2 / 2. */
+TW_API void TW_FresnelIntegrals(double x, double* s, double* c);
+/* Exponential integral E_n(x), x >= 0, n >= 0. */
+TW_API void TW_ExpI(double x, int32_t n, double* out);
+/* Sine and cosine integrals Si(x), Ci(x) (Ci of |x| for x < 0). */
+TW_API void TW_SinI(double x, double* out);
+TW_API void TW_CosI(double x, double* out);
+/* Hyperbolic sine and cosine integrals Shi(x), Chi(x) (Chi of |x| for x < 0). */
+TW_API void TW_SinhI(double x, double* out);
+TW_API void TW_CoshI(double x, double* out);
+
+/* Gauss's hypergeometric function 2F1(a, b; c; x), |x| <= 1. The 2011 generation takes the Pfaff
+ * transformation below x = 0.2 rather than -0.5. */
+TW_API void TW_Gauss(double x, double a, double b, double c, double* out);
+TW_API void TW_Gauss_2011(double x, double a, double b, double c, double* out);
+/* Kummer's confluent hypergeometric function M(a, b, x) = 1F1(a; b; x). */
+TW_API void TW_Kummer(double x, double a, double b, double* out);
+/* Tricomi's confluent hypergeometric function U(a, b, x), x >= 0. */
+TW_API void TW_Tricomi(double x, double a, double b, double* out);
+
+/* Struve's function H_v(x); x < 0 only for integer v. */
+TW_API void TW_Struve(double x, double v, double* out);
+
+/* The parabolic cylinder function D_v(x) (Whittaker's). */
+TW_API void TW_ParabolicCylinder(double x, double v, double* out);
+
 #endif

@@ -58,6 +58,16 @@ enum class SpecialFunction : int32_t {
     Airy,
     Kelvin,
     Hyp1F1,
+    Elliptic,
+    EllipticJ,
+    Hyp2F1,
+    Tricomi,
+    Zeta,
+    Spence,
+    Struve,
+    ParabolicCylinder,
+    ExpN,
+    ShiChi,
 };
 enum class SpecialFault : int32_t { Domain = 0, Pole = 1, Overflow = 2, Underflow = 3, Precision = 4 };
 
