@@ -76,7 +76,7 @@ Status Prototype(const IirParams& sp, Factor* f) {
             const double e = std::sqrt(std::pow(10.0, sp.ripple / 10) - 1);
             const double es = std::sqrt(std::pow(10.0, sp.attenuation / 10) - 1);
             const double k1 = e / es, k1c = std::sqrt(1 - k1 * k1);
-            const double K1 = EllipticK(k1c), K1c = EllipticK(k1);
+            const double K1 = EllipticKOfComplement(k1c), K1c = EllipticKOfComplement(k1);
             const double q = std::exp(-kPi * (K1c / K1) / n);
             double t2 = 1, t3 = 1;
             for (int32_t j = 1; j <= 25; ++j) {
@@ -88,7 +88,7 @@ Status Prototype(const IirParams& sp, Factor* f) {
             double k = 4 * std::sqrt(q) * (t2 * t2) / (t3 * t3);
             if (k >= 1) k = 0.99999999999999;
             const double kc = std::sqrt(1 - k * k);
-            const double Kk = EllipticK(kc);
+            const double Kk = EllipticKOfComplement(kc);
             const double v0 = (Kk / n) * InverseSc(1 / e, k1) / K1;
             double S0, C0, D0;
             JacobiSnCnDn(v0, k, &S0, &C0, &D0);
@@ -388,7 +388,7 @@ Status IirDesign(const IirParams& sp, double* a, double* b) {
     return MergeRelease(factors.Release(), natural.Release());
 }
 
-double EllipticK(double c) {
+double EllipticKOfComplement(double c) {
     double a = c, b = 1;
     for (int32_t i = 0; i < 25 && !(std::fabs(a - b) / a < 1e-15); ++i) {
         const double next = (a + b) / 2;

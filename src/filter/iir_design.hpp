@@ -33,7 +33,7 @@ Status IirDesign(const IirParams& params, double* a, double* b);
 
 // Elliptic helpers, exposed for tests. K of complementary modulus c; sn, cn, dn of u with
 // complementary modulus c; the inverse of sc(., k) at y.
-double EllipticK(double c);
+double EllipticKOfComplement(double c);
 void JacobiSnCnDn(double u, double c, double* sn, double* cn, double* dn);
 double InverseSc(double y, double k);
 
