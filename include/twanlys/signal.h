@@ -90,4 +90,39 @@ TW_API int32_t CxConvolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z,
 TW_API int32_t Correlation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
 TW_API int32_t CxCorrelation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
 
+/* ---- Decimation and moving sums ---- */
+
+/* x replaced by x[k factor], or the mean of each group of factor samples (average nonzero), for k
+ * below n / factor. */
+TW_API int32_t DecimateCIN(Array1DHandle x, int32_t* factor, uint8_t* average, int32_t* status);
+TW_API int32_t CxDecimate_H(Array1DHandle x, int32_t factor, int32_t average);
+/* Streaming decimation: offset is the index in the next block of the next sample to take (or of
+ * the next full group's start); partial samples of an unfinished group sum to *sum. reset clears
+ * partial and sum. x is replaced by the outputs of this block. */
+TW_API int32_t DecimateContinuous_H(Array1DHandle x, int32_t factor, int32_t average, int32_t* offset,
+                                    int32_t reset, int32_t* partial, double* sum);
+TW_API int32_t CxDecimateContinuous_H(Array1DHandle x, int32_t factor, int32_t average, int32_t* offset,
+                                      int32_t reset, int32_t* partial, ComplexDouble* sum);
+/* Block sums (not means) of factor samples written over the front of x, which keeps its size;
+ * produced says how many. count samples of an unfinished block are carried in sum. */
+TW_API void ReDecimatedMovingAverageH(Array1DHandle x, int32_t factor, double* sum, int32_t* count,
+                                      int32_t reset, int32_t* produced);
+TW_API void CxDecimatedMovingAverageH(Array1DHandle x, int32_t factor, ComplexDouble* sum, int32_t* count,
+                                      int32_t reset, int32_t* produced);
+/* stages cascaded moving sums of width samples in place, unscaled. sums (stages values) and
+ * window (stages x width) carry the past; position is the next window column. They are rebuilt
+ * and zeroed on reset or when their sizes or position do not fit. */
+TW_API int32_t ReCascadedMovingAverageH(Array1DHandle x, int32_t stages, int32_t width, Array1DHandle sums,
+                                        Array2DHandle window, int32_t* position, int32_t reset);
+TW_API int32_t CxCascadedMovingAverageH(Array1DHandle x, int32_t stages, int32_t width, Array1DHandle sums,
+                                        Array2DHandle window, int32_t* position, int32_t reset);
+/* Cascaded-integrator-comb filters from moving sums of width R D, each scaled by 1 / (R D); mode
+ * nonzero alternates signs (the filter moves to half the sampling rate). State: R D + 1 cells per
+ * stage, plus the phase for the decimator. The decimator keeps every R-th sample, the
+ * interpolator stuffs R x[k] every R samples; delay samples at the start are dropped. */
+TW_API int32_t CICDecimatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t stages,
+                                  int32_t R, int32_t D, int32_t mode, uint8_t reset, int32_t* delay);
+TW_API int32_t CICInterpolatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t stages,
+                                     int32_t R, int32_t D, int32_t mode, uint8_t reset, int32_t* delay);
+
 #endif
