@@ -125,4 +125,22 @@ TW_API int32_t CICDecimatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandl
 TW_API int32_t CICInterpolatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t stages,
                                      int32_t R, int32_t D, int32_t mode, uint8_t reset, int32_t* delay);
 
+/* ---- Resampling ---- */
+
+/* Rational resampling by L / M (gcd 1) with an odd FIR h centred on each output instant:
+ * y[k] = L sum_i v[i] h[i L - delay - k M + (taps - 1) / 2], v the stateCount live state samples
+ * followed by x. delay is the next output instant in the L-fold upsampled time base, counted from
+ * the first live state sample; state keeps (taps - 1) / L + 1 cells per channel. reset empties the
+ * state and keeps delay. */
+TW_API int32_t RationalResample_H(Array1DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                  Array1DHandle h, Array1DHandle state, int32_t* stateCount, Array1DHandle y);
+TW_API int32_t CxRationalResample_H(Array1DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                    Array1DHandle h, Array1DHandle state, int32_t* stateCount, Array1DHandle y);
+/* The same on the rows (channels) of x, with one timing; a state without rows is created. */
+TW_API int32_t RationalResampleMultiCh_H(Array2DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                         Array1DHandle h, Array2DHandle state, int32_t* stateCount,
+                                         Array2DHandle y);
+TW_API int32_t CxRationalResampleMCh_H(Array2DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                       Array1DHandle h, Array2DHandle state, int32_t* stateCount, Array2DHandle y);
+
 #endif

@@ -35,6 +35,14 @@ def dtype(cx):
     return np.complex128 if cx else np.float64
 
 
+def placements():
+    """Packed blocks (element data at 4 mod 8, worked on through staging copies), then aligned."""
+    for aligned in (0, 1):
+        tw.placement(aligned)
+        yield aligned
+    tw.placement(0)
+
+
 def cuts(rng, n, pieces):
     """n split at pieces - 1 random places (empty pieces included)."""
     edges = np.sort(rng.integers(0, n + 1, pieces - 1))
@@ -87,7 +95,7 @@ class Decimation(unittest.TestCase):
 
     def test_stream_cut_anywhere_is_one_block(self):
         rng = np.random.default_rng(62)
-        for trial in range(150):
+        for trial, _ in ((t, a) for t in range(150) for a in placements()):
             cx, average = bool(trial % 2), trial // 2 % 2
             n, f = int(rng.integers(0, 60)), int(rng.integers(1, 8))
             offset = int(rng.integers(0, 2 * f + 3))
@@ -246,6 +254,103 @@ class Cic(unittest.TestCase):
             s, y = cic_call(name, [], st, 2, 2, 1, 0, 0, delay)
             self.assertEqual((s, len(y), delay.value), (24003, 0, 3))
             np.testing.assert_array_equal(st.numpy(), np.arange(cells))
+
+
+for name in ("RationalResample_H", "CxRationalResample_H", "RationalResampleMultiCh_H", "CxRationalResampleMCh_H"):
+    getattr(lib, name).argtypes = [P, I32, I32, I32, PI, P, P, PI, P]
+
+
+def rational_stream(name, pieces, l, m, h, delay0, state=None, multi=False):
+    """Feeds the pieces one call each; returns the outputs joined, the state, delay and count."""
+    cx = name.startswith("Cx")
+    make = tw.matrix if multi else tw.array
+    state = state or tw.empty(dtype(cx), dims=2 if multi else 1)
+    delay, count, reset, out = I32(delay0), I32(0), 0 if multi else 1, []
+    for p in pieces:
+        y = tw.empty(dtype(cx), dims=2 if multi else 1)
+        s = getattr(lib, name)(make(p, dtype(cx)), l, m, reset, delay, tw.array(h), state, count, y)
+        if s != 0:
+            return s, None, state, delay.value, count.value
+        out.append(y.numpy())
+        reset = 0
+    return 0, np.concatenate(out, axis=-1), state, delay.value, count.value
+
+
+def rational_reference(v, l, m, h, delay0):
+    c = (len(h) - 1) // 2
+    full = np.concatenate([l * ss.upfirdn(h[::-1], v, l), np.zeros(l)])  # upfirdn stops short when taps < l
+    k = max(0, (len(v) * l - c - delay0 - 1) // m + 1)
+    return full[delay0 + c + m * np.arange(k)]
+
+
+class Rational(unittest.TestCase):
+    def test_random_rates_taps_delays_and_cuts(self):
+        rng = np.random.default_rng(71)
+        worst = 0.0
+        for trial in range(240):
+            while True:
+                l, m = (int(v) for v in rng.integers(1, 9, 2))
+                if np.gcd(l, m) == 1:
+                    break
+            taps = 2 * int(rng.integers(0, 12)) + 1  # short filters too: taps below 2 l - 1
+            n, delay0, cx = int(rng.integers(0, 90)), int(rng.integers(0, 3 * l + taps)), trial % 4 == 3
+            name = "CxRationalResample_H" if cx else "RationalResample_H"
+            h, x = rng.standard_normal(taps), signal(rng, n, cx)
+            want = rational_reference(x, l, m, h, delay0)
+            s, whole, _, d1, c1 = rational_stream(name, [x], l, m, h, delay0)
+            self.assertEqual(s, 0)
+            scale = 2 * l * taps * EPS * np.max(np.abs(h)) * max(1.0, np.max(np.abs(x), initial=0))
+            close(self, whole, want.astype(dtype(cx)), scale, (trial, l, m, taps, delay0))
+            worst = max(worst, np.max(np.abs(whole - want), initial=0) / scale)
+            pieces = [x[i] for i in cuts(rng, n, int(rng.integers(2, 7)))]
+            s, split, _, d2, c2 = rational_stream(name, pieces, l, m, h, delay0)
+            self.assertEqual(s, 0, (trial, l, m, taps, delay0))
+            np.testing.assert_array_equal(split, whole, str(trial))
+            self.assertEqual((d2, c2), (d1, c1), trial)
+        print("\nrational: worst error / bound %.3g" % worst)
+
+    def test_short_block_waits_in_the_state(self):
+        h = np.ones(31)
+        s, y, state, delay, count = rational_stream("RationalResample_H", [[1.0, 2.0]], 3, 2, h, 0)
+        self.assertEqual((s, len(y), delay, count), (0, 0, 0, 2))
+        self.assertEqual(list(state.numpy()), [1.0, 2.0] + [0.0] * 9)
+
+    def test_channels_share_one_timing(self):
+        rng = np.random.default_rng(72)
+        for cx, _ in ((cx, a) for cx in (False, True) for a in placements()):
+            name = "CxRationalResampleMCh_H" if cx else "RationalResampleMultiCh_H"
+            l, m, taps, delay0, n = 5, 3, 41, 7, 120
+            h, x = rng.standard_normal(taps), signal(rng, (3, n), cx)
+            # The empty state is created on the first call, which does not ask for a reset.
+            pieces = [x[:, i] for i in cuts(rng, n, 4)]
+            s, y, state, _, _ = rational_stream(name, pieces, l, m, h, delay0, multi=True)
+            self.assertEqual((s, state.shape()), (0, (3, (taps - 1) // l + 1)))
+            for r in range(3):
+                one = rational_stream(name.replace("MultiCh", "").replace("MCh", ""), [x[r]], l, m, h, delay0)[1]
+                np.testing.assert_array_equal(y[r], one)
+
+    def test_statuses_empty_y_and_state(self):
+        h3, h4 = np.ones(3), np.ones(4)
+        rows = [  # (L, M, h, delay, stateCount, state cells, reset, status), tested in this order
+            (0, 1, h4, -1, 0, 3, 1, -20059), (0, 1, h4, 0, -1, 3, 1, -20059), (0, 1, h4, 0, 0, 3, 1, -20140),
+            (2, 0, h4, 0, 0, 3, 1, -20140), (2, 3, h4, 0, 0, 3, 1, -20033), (2, 3, [], 0, 0, 3, 1, -20033),
+            (2, 4, h3, 0, 0, 3, 1, -20046), (2, 3, h3, 0, 4, 3, 0, -20046), (2, 3, h3, 0, 4, 3, 1, 0),
+        ]
+        for l, m, h, delay, count, cells, reset, want in rows:
+            for multi in (False, True):
+                name = "RationalResampleMultiCh_H" if multi else "RationalResample_H"
+                make = tw.matrix if multi else tw.array
+                state = make(np.ones((1, cells)) if multi else np.ones(cells))
+                y = make(np.ones((1, 2)) if multi else np.ones(2))
+                s = getattr(lib, name)(make([[1.0] * 6] if multi else [1.0] * 6), l, m, reset, I32(delay),
+                                       tw.array(h), state, I32(count), y)
+                self.assertEqual(s, want, (l, m, len(h), multi))
+                if want:
+                    self.assertEqual((y.shape(), state.shape()), ((0, 0) if multi else (0,),) * 2)
+        state = tw.matrix(np.ones((2, 2)))
+        s = lib.RationalResampleMultiCh_H(tw.matrix(np.ones((3, 4))), 1, 1, 1, I32(0), tw.array(h3), state, I32(0),
+                                          tw.empty(dims=2))
+        self.assertEqual((s, state.shape()), (-20008, (0, 0)))
 
 
 if __name__ == "__main__":
