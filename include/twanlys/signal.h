@@ -143,4 +143,63 @@ TW_API int32_t RationalResampleMultiCh_H(Array2DHandle x, int32_t L, int32_t M, 
 TW_API int32_t CxRationalResampleMCh_H(Array2DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
                                        Array1DHandle h, Array2DHandle state, int32_t* stateCount, Array2DHandle y);
 
+/* Table resamplers. The table is the impulse response of a lowpass filter at oversample times the
+ * input rate, with unit sum, symmetric about its centre; interpolation 1 reads the nearest cell
+ * below a position, any other value interpolates linearly. The records are packed. */
+#pragma pack(push, 1)
+typedef struct {
+    double ratio;          /* input samples per output sample */
+    int32_t interpolation;
+    double start;          /* position of the first output, in input samples */
+    NumericHandle table;
+    int32_t oversample;
+} ResampleSettings;
+
+typedef struct {
+    int32_t interpolation;
+    uint8_t antiAlias;
+    NumericHandle table;
+    int32_t oversample;
+} VariableSettings;
+
+/* Caller-held state of a constant-ratio resampler: buffered samples, current coefficients and the
+ * position of the next output in the buffer. */
+typedef struct {
+    NumericHandle buffer;
+    int32_t count;
+    NumericHandle coefs;
+    double scale;
+    int32_t left;
+    int32_t right;
+    int32_t interpolation;
+    double ratio;
+    double frac;
+    int32_t index;
+} ResampleState;
+#pragma pack(pop)
+
+/* Constant-ratio resampling. ratio, interpolation and start are taken from the settings on reset
+ * only; table and oversample on every call. y is sized to ceil((n + count) / ratio) and produced
+ * says how many outputs it holds. antiAlias widens the filter by the ratio when it exceeds 1. */
+TW_API int32_t Resample_Const(Array1DHandle x, ResampleState* state, const ResampleSettings* settings, int32_t reset,
+                              Array1DHandle y, int32_t* produced, int32_t antiAlias);
+TW_API int32_t CxResample_Const(Array1DHandle x, ResampleState* state, const ResampleSettings* settings,
+                                int32_t reset, Array1DHandle y, int32_t* produced, int32_t antiAlias);
+/* Resampling at ascending instants `times` (input samples from x[0]); each computable output
+ * replaces its time (in the complex twin the times are the real parts). done outputs were made;
+ * the caller drops consumed samples of x, and the unreached times and *lastTime are lowered by
+ * consumed, ready for the next call with the rest. */
+TW_API int32_t Resample_Variable(Array1DHandle x, Array1DHandle times, const VariableSettings* settings,
+                                 double* lastTime, int32_t* done, int32_t* consumed);
+TW_API int32_t CxResample_Variable(Array1DHandle x, Array1DHandle times, const VariableSettings* settings,
+                                   double* lastTime, int32_t* done, int32_t* consumed);
+/* The same on the rows of x into y (rows x done); the f64 times are kept and only the unreached
+ * ones lowered. */
+TW_API int32_t Resample_Variable_MultiCh(Array2DHandle x, Array2DHandle y, Array1DHandle times,
+                                         const VariableSettings* settings, double* lastTime, int32_t* done,
+                                         int32_t* consumed);
+TW_API int32_t CxResample_Variable_MultiCh(Array2DHandle x, Array2DHandle y, Array1DHandle times,
+                                           const VariableSettings* settings, double* lastTime, int32_t* done,
+                                           int32_t* consumed);
+
 #endif

@@ -69,4 +69,38 @@ int32_t TableWidth(const Table& t, double r);
 template <class T>
 T TableOutput(const T* v, int64_t i, const TablePositions& p, const double* coef);
 
+// The scalar fields of a constant-ratio resampler's state.
+struct ConstResampler {
+    int32_t count;  // live samples in the buffer
+    double scale;
+    int32_t left;
+    int32_t right;
+    int32_t interpolation;
+    double ratio;   // input samples per output
+    double frac;    // fraction of the next output instant
+    int32_t index;  // integer part of it, from the start of the buffer
+};
+
+// One block at a constant ratio over v = the count live buffer samples followed by x (total
+// samples). Writes up to `capacity` outputs into y (ResampleSizeErr beyond), keeps the current
+// coefficients in coef (BufferTooSmallErr if they need more than coefCells), and sets *drop to
+// the leading samples of v that the buffer no longer needs.
+template <class T>
+Status ResampleConstBlock(const Table& t, double filterRatio, const T* v, int64_t total, ConstResampler* st,
+                          double* coef, int32_t coefCells, T* y, int32_t capacity, int32_t* produced,
+                          int64_t* drop);
+
+struct VariableResult {
+    int32_t done;
+    int32_t consumed;
+    double last;
+};
+
+// Outputs at the ascending instants `times` (input samples from x[0]) on each of `rows` rows of x
+// (rows x n) into out (rows x m), until one needs samples past x. With antiAlias each output's
+// filter widens by its gap to the previous instant (`last` before the first).
+template <class T>
+Status ResampleVariableBlock(const Table& t, bool antiAlias, const T* x, int32_t rows, int32_t n,
+                             const double* times, int32_t m, double last, T* out, VariableResult* result);
+
 }  // namespace tw

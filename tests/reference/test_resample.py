@@ -353,5 +353,215 @@ class Rational(unittest.TestCase):
         self.assertEqual((s, state.shape()), (-20008, (0, 0)))
 
 
+class Settings(ctypes.Structure):
+    _pack_ = 1
+    _fields_ = [("ratio", D), ("interpolation", I32), ("start", D), ("table", P), ("oversample", I32)]
+
+
+class Variable(ctypes.Structure):
+    _pack_ = 1
+    _fields_ = [("interpolation", I32), ("antiAlias", U8), ("table", P), ("oversample", I32)]
+
+
+class State(ctypes.Structure):
+    _pack_ = 1
+    _fields_ = [("buffer", P), ("count", I32), ("coefs", P), ("scale", D), ("left", I32), ("right", I32),
+                ("interpolation", I32), ("ratio", D), ("frac", D), ("index", I32)]
+
+
+for name in ("Resample_Const", "CxResample_Const"):
+    getattr(lib, name).argtypes = [P, ctypes.POINTER(State), ctypes.POINTER(Settings), I32, P, PI, I32]
+for name in ("Resample_Variable", "CxResample_Variable"):
+    getattr(lib, name).argtypes = [P, P, ctypes.POINTER(Variable), PD, PI, PI]
+for name in ("Resample_Variable_MultiCh", "CxResample_Variable_MultiCh"):
+    getattr(lib, name).argtypes = [P, P, P, ctypes.POINTER(Variable), PD, PI, PI]
+
+
+def table_filter(table, over, interp, r, f):
+    """left, right, scale and coefficients, rendered from the stated position arithmetic."""
+    size = len(table)
+    s = over / min(max(r, 1.0), over)
+    half = (size - 1) / 2
+    left, right = int(np.floor((half - s * f) / s)), int(np.floor((s * f + half) / s))
+    pos = (half - s * f) - (left - 1) * s + np.arange(left + right) * s
+    j = np.minimum(np.trunc(pos).astype(int), size - 1)
+    nxt = table[np.minimum(j + 1, size - 1)]
+    coef = table[j] if interp == 1 else np.where(j == size - 1, table[j], table[j] + (pos - j) * (nxt - table[j]))
+    return left, right, s, coef
+
+
+def table_output(v, i, left, right, s, coef):
+    taps = left + right
+    terms = [coef[taps - 1 - m] * v[i + right - m] for m in range(taps) if i + right - m >= 0]
+    return s * sum(terms, 0.0)
+
+
+def const_reference(x, table, over, interp, ratio, start, anti):
+    """One block from a reset: the outputs at start + k ratio while the filter fits x."""
+    r = ratio if anti else min(ratio, 1.0)
+    out, k = [], 0
+    while True:
+        t = k * ratio + start
+        i = int(np.floor(t))
+        left, right, s, coef = table_filter(table, over, interp, r, t - i)
+        if i + right > len(x) - 1:
+            return np.array(out, dtype=x.dtype)
+        out.append(table_output(x, i, left, right, s, coef))
+        k += 1
+
+
+def lowpass(over, half_cells):
+    """A symmetric table of 2 half_cells over + 1 cells, unit sum, zero at both ends."""
+    t = np.arange(-half_cells * over, half_cells * over + 1) / over
+    table = np.sinc(t * 0.8) * np.cos(np.pi * t / (2 * half_cells)) ** 2
+    return table / table.sum()
+
+
+class TableResamplers(unittest.TestCase):
+    def const_stream(self, name, pieces, table, over, interp, ratio, start, anti):
+        cx = name.startswith("Cx")
+        tab = tw.array(table)
+        settings = Settings(ratio, interp, start, tab.h, over)
+        state, buffer, coefs = State(), tw.empty(dtype(cx)), tw.empty()
+        state.buffer, state.coefs = buffer.h, coefs.h
+        out, reset = [], 1
+        for p in pieces:
+            y, produced = tw.empty(dtype(cx)), I32(-1)
+            s = getattr(lib, name)(tw.array(p, dtype(cx)), state, settings, reset, y, produced, anti)
+            if s != 0:
+                return s, state, y, produced.value
+            self.assertGreaterEqual(len(y.numpy()), produced.value)
+            out.append(y.numpy()[:produced.value])
+            reset = 0
+        return 0, state, np.concatenate(out), None
+
+    def test_ratio_one_is_the_table_every_oversample_cells(self):
+        rng = np.random.default_rng(81)
+        for over, half in ((1, 3), (4, 2), (8, 5)):
+            table = lowpass(over, half)
+            x = rng.standard_normal(60)
+            g = table[::over]  # cell 0 is 0, and so is the sample it would weigh
+            want = over * np.correlate(np.r_[np.zeros(half), x, np.zeros(half)], g, "valid")[:len(x) - half]
+            for interp in (0, 1):
+                s, _, got, _ = self.const_stream("Resample_Const", [x], table, over, interp, 1.0, 0.0, 1)
+                self.assertEqual(s, 0)
+                close(self, got, want, 8 * half * EPS * np.max(np.abs(x)), (over, half, interp))
+
+    def test_const_one_block_and_cuts(self):
+        rng = np.random.default_rng(82)
+        for trial in range(40):
+            cx, interp, anti = trial % 4 == 3, trial % 2, trial // 2 % 2
+            # Tables at least two input samples wide on each side: with one, the filter can
+            # leave the next output one sample before the buffer, which reads as a fresh start.
+            over, half = int(rng.choice([1, 4, 8, 16])), int(rng.integers(2, 6))
+            table = lowpass(over, half)
+            ratio = float(rng.choice([0.25, 0.75, 1.0, 1.25, 2.5, 3.0, 0.6875]))
+            start = float(rng.choice([0.0, 0.5, 2.25, 7.75]))
+            n = int(rng.integers(1, 150))
+            x = signal(rng, n, cx)
+            name = "CxResample_Const" if cx else "Resample_Const"
+            s, _, whole, _ = self.const_stream(name, [x], table, over, interp, ratio, start, anti)
+            self.assertEqual(s, 0)
+            want = const_reference(x, table, over, interp, ratio, start, anti)
+            close(self, whole, want, 4 * len(table) * EPS * np.max(np.abs(x)), trial)
+            # Ratios and starts exact in binary give the same fractions on every split.
+            pieces = [x[i] for i in cuts(rng, n, int(rng.integers(2, 7)))]
+            s, _, split, _ = self.const_stream(name, pieces, table, over, interp, ratio, start, anti)
+            self.assertEqual(s, 0)
+            np.testing.assert_array_equal(split, whole, str(trial))
+
+    def test_const_failures_zero_the_state(self):
+        table = lowpass(4, 2)
+        # A start before the buffer reads from index count - 1 = -1: with a one-cell table that
+        # is one output more than the capacity n / ratio.
+        s, state, y, produced = self.const_stream("Resample_Const", [np.ones(5)], np.ones(1), 1, 1, 1.0, -0.5, 1)
+        fields = [getattr(state, f) for f, _ in State._fields_ if f not in ("buffer", "coefs")]
+        self.assertEqual((s, y.shape(), produced, fields), (-20076, (0,), 0, [0] * 8))
+        for tab, over, ratio, want in ((np.zeros(0), 4, 1.0, -20003), (table, 0, 1.0, -20140),
+                                       (table, 4, 0.0, -20140), (table, 4, -1.0, -20140)):
+            s = self.const_stream("Resample_Const", [np.ones(5)], tab, over, 0, ratio, 0.0, 1)[0]
+            self.assertEqual(s, want)
+        # The table and oversample are read on every call: a narrower step without a reset needs
+        # more coefficients than the reset made room for.
+        tab, buffer, coefs = tw.array(table), tw.empty(), tw.empty()
+        state, settings = State(), Settings(1.0, 0, 0.0, tab.h, 4)
+        state.buffer, state.coefs = buffer.h, coefs.h
+        self.assertEqual(lib.Resample_Const(tw.array(np.ones(9)), state, settings, 1, tw.empty(), I32(), 1), 0)
+        settings.oversample = 1
+        y = tw.empty()
+        self.assertEqual(lib.Resample_Const(tw.array(np.ones(9)), state, settings, 0, y, I32(), 1), -20075)
+        self.assertEqual((buffer.shape(), coefs.shape(), state.count, state.ratio), ((0,), (0,), 0, 0.0))
+
+    def variable_call(self, name, x, times, settings, last):
+        cx, multi = name.startswith("Cx"), name.endswith("MultiCh")
+        lt, done, consumed = D(last), I32(-1), I32(-1)
+        if multi:
+            th, y = tw.array(times), tw.empty(dtype(cx), dims=2)
+            s = getattr(lib, name)(tw.matrix(x, dtype(cx)), y, th, settings, lt, done, consumed)
+            return s, y.numpy(), th.numpy(), lt.value, done.value, consumed.value
+        th = tw.array(times + 0j if cx else times, dtype(cx))
+        s = getattr(lib, name)(tw.array(x, dtype(cx)), th, settings, lt, done, consumed)
+        got = th.numpy()
+        return s, got[:done.value], got[done.value:].real, lt.value, done.value, consumed.value
+
+    def variable_reference(self, x, times, table, over, interp, anti, last):
+        out, previous = [], last
+        for p in times:
+            i = int(np.floor(p))
+            left, right, s, coef = table_filter(table, over, interp, p - previous if anti else 1.0, p - i)
+            if i + right > len(x) - 1:
+                break
+            out.append(table_output(x, i, left, right, s, coef))
+            previous = p
+        return np.array(out, dtype=x.dtype)
+
+    def test_variable_one_block_and_a_stream(self):
+        rng = np.random.default_rng(83)
+        for trial in range(40):
+            cx, interp, anti = trial % 4 == 3, trial % 2, trial // 2 % 2
+            over, half = int(rng.choice([4, 8])), int(rng.integers(2, 5))
+            table, tab = lowpass(over, half), None
+            tab = tw.array(table)
+            settings = Variable(interp, anti, tab.h, over)
+            n = int(rng.integers(10, 80))
+            x = signal(rng, n, cx)
+            # Uneven gaps, exact in binary: a wide filter after narrow ones reaches back past
+            # what the narrow ones needed.
+            times = np.cumsum(rng.choice([0.25, 0.5, 3.5], 60, p=[0.6, 0.2, 0.2])) - 0.5
+            name = "CxResample_Variable" if cx else "Resample_Variable"
+            s, whole, rest, last, done, consumed = self.variable_call(name, x, times, settings, -1.0)
+            want = self.variable_reference(x, times, table, over, interp, anti, -1.0)
+            self.assertEqual((s, done), (0, len(want)))
+            close(self, whole, want, 4 * len(table) * EPS * np.max(np.abs(x)), trial)
+            np.testing.assert_array_equal(rest, times[done:] - consumed)
+            self.assertEqual(last, times[done - 1] - consumed if done else -1.0 - consumed)
+            # The caller's loop: drop consumed samples, call again with the rest and more samples.
+            held, pending, last, out = x[:0], times, -1.0, []
+            for piece in np.split(x, np.cumsum(rng.integers(1, 6, n))):
+                held = np.r_[held, piece]
+                s, y, pending, last, done, consumed = self.variable_call(name, held, pending, settings, last)
+                self.assertEqual(s, 0)
+                out.append(y)
+                held = held[consumed:]
+            np.testing.assert_array_equal(np.concatenate(out), whole, str(trial))
+
+    def test_variable_channels(self):
+        rng = np.random.default_rng(84)
+        table = lowpass(4, 3)
+        tab = tw.array(table)
+        times = np.arange(0.5, 70.0, 1.5)
+        for cx in (False, True):
+            x = signal(rng, (3, 40), cx)
+            settings = Variable(0, 1, tab.h, 4)
+            name = "CxResample_Variable_MultiCh" if cx else "Resample_Variable_MultiCh"
+            s, y, kept, last, done, consumed = self.variable_call(name, x, times, settings, 0.0)
+            self.assertEqual((s, y.shape), (0, (3, done)))
+            np.testing.assert_array_equal(kept, np.r_[times[:done], times[done:] - consumed])
+            for r in range(3):
+                one = self.variable_call(name.replace("_MultiCh", ""), x[r], times, settings, 0.0)
+                np.testing.assert_array_equal(y[r], one[1])
+                self.assertEqual((done, consumed), one[4:])
+
+
 if __name__ == "__main__":
     unittest.main()
