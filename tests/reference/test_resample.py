@@ -197,48 +197,31 @@ def cic_call(name, x, state, stages, r, d, mode, reset, delay):
 
 
 class Cic(unittest.TestCase):
-    def test_decimator_over_random_cuts(self):
+    def test_one_pass_over_random_cuts(self):
         rng = np.random.default_rng(65)
-        for trial in range(60):
+        for trial in range(90):
+            decimator = trial % 2 == 0
             stages, r, d = int(rng.integers(1, 4)), int(rng.integers(1, 5)), int(rng.integers(1, 3))
             mode, n, delay0 = trial % 3, int(rng.integers(1, 150)), int(rng.integers(0, 2)) * int(rng.integers(0, 40))
             x = rng.standard_normal(n)
-            v = x
+            if decimator:
+                v = x
+            else:  # the interpolator stuffs R x[k] at k R
+                v = np.zeros(n * r)
+                v[::r] = r * x
             for _ in range(stages):
                 v = cic_stage(v, r * d, mode)
-            want = v[delay0::r]
+            want = v[delay0::r] if decimator else v[delay0:]
+            name = "CICDecimatorByMovH" if decimator else "CICInterpolatorByMovH"
             state, delay, reset, out = tw.empty(), I32(delay0), 1, []
             for piece in cuts(rng, n, int(rng.integers(1, 6))):
-                if len(piece) == 0:
-                    continue
-                s, y = cic_call("CICDecimatorByMovH", x[piece], state, stages, r, d, mode, reset, delay)
-                self.assertEqual(s, 0)
-                out.append(y)
-                reset = 0
-            self.assertEqual(state.shape(), ((r * d + 1) * stages + 1,))
-            close(self, np.concatenate(out), want, 4 * n * EPS * 2 ** stages, trial)
-
-    def test_interpolator_stuffs_r_x(self):
-        rng = np.random.default_rng(66)
-        for trial in range(30):
-            stages, r, d = int(rng.integers(1, 4)), int(rng.integers(1, 5)), int(rng.integers(1, 3))
-            mode, n, delay0 = trial % 2, int(rng.integers(1, 60)), int(rng.integers(0, 50))
-            x = rng.standard_normal(n)
-            u = np.zeros(n * r)
-            u[::r] = r * x
-            for _ in range(stages):
-                u = cic_stage(u, r * d, mode)
-            state, delay, reset, out = tw.empty(), I32(delay0), 1, []
-            for piece in cuts(rng, n, int(rng.integers(1, 5))):
-                if len(piece) == 0:
-                    continue
-                s, y = cic_call("CICInterpolatorByMovH", x[piece], state, stages, r, d, mode, reset, delay)
-                self.assertEqual(s, 0)
-                out.append(y)
-                reset = 0
-            self.assertEqual(state.shape(), ((r * d + 1) * stages,))
-            close(self, np.concatenate(out), u[delay0:], 4 * n * r * EPS * r * 2 ** stages, trial)
-            self.assertEqual(delay.value, max(0, delay0 - n * r))
+                if len(piece):
+                    s, y = cic_call(name, x[piece], state, stages, r, d, mode, reset, delay)
+                    self.assertEqual(s, 0)
+                    out.append(y)
+                    reset = 0
+            self.assertEqual(state.shape(), ((r * d + 1) * stages + decimator,))
+            close(self, np.concatenate(out), want, 4 * len(v) * EPS * r * 2 ** stages, trial)
 
     def test_statuses(self):
         for name, cells in (("CICDecimatorByMovH", 7), ("CICInterpolatorByMovH", 6)):
@@ -396,18 +379,16 @@ def table_output(v, i, left, right, s, coef):
     return s * sum(terms, 0.0)
 
 
-def const_reference(x, table, over, interp, ratio, start, anti):
-    """One block from a reset: the outputs at start + k ratio while the filter fits x."""
-    r = ratio if anti else min(ratio, 1.0)
-    out, k = [], 0
-    while True:
-        t = k * ratio + start
-        i = int(np.floor(t))
-        left, right, s, coef = table_filter(table, over, interp, r, t - i)
+def table_reference(x, times, table, over, interp, ratios):
+    """Outputs at the instants while the filter at each ratio fits x."""
+    out = []
+    for p, r in zip(times, ratios):
+        i = int(np.floor(p))
+        left, right, s, coef = table_filter(table, over, interp, r, p - i)
         if i + right > len(x) - 1:
-            return np.array(out, dtype=x.dtype)
+            break
         out.append(table_output(x, i, left, right, s, coef))
-        k += 1
+    return np.array(out, dtype=x.dtype)
 
 
 def lowpass(over, half_cells):
@@ -462,7 +443,8 @@ class TableResamplers(unittest.TestCase):
             name = "CxResample_Const" if cx else "Resample_Const"
             s, _, whole, _ = self.const_stream(name, [x], table, over, interp, ratio, start, anti)
             self.assertEqual(s, 0)
-            want = const_reference(x, table, over, interp, ratio, start, anti)
+            times = start + ratio * np.arange(int(n / ratio) + 2)
+            want = table_reference(x, times, table, over, interp, [ratio if anti else 1.0] * len(times))
             close(self, whole, want, 4 * len(table) * EPS * np.max(np.abs(x)), trial)
             # Ratios and starts exact in binary give the same fractions on every split.
             pieces = [x[i] for i in cuts(rng, n, int(rng.integers(2, 7)))]
@@ -504,23 +486,12 @@ class TableResamplers(unittest.TestCase):
         got = th.numpy()
         return s, got[:done.value], got[done.value:].real, lt.value, done.value, consumed.value
 
-    def variable_reference(self, x, times, table, over, interp, anti, last):
-        out, previous = [], last
-        for p in times:
-            i = int(np.floor(p))
-            left, right, s, coef = table_filter(table, over, interp, p - previous if anti else 1.0, p - i)
-            if i + right > len(x) - 1:
-                break
-            out.append(table_output(x, i, left, right, s, coef))
-            previous = p
-        return np.array(out, dtype=x.dtype)
-
     def test_variable_one_block_and_a_stream(self):
         rng = np.random.default_rng(83)
         for trial in range(40):
             cx, interp, anti = trial % 4 == 3, trial % 2, trial // 2 % 2
             over, half = int(rng.choice([4, 8])), int(rng.integers(2, 5))
-            table, tab = lowpass(over, half), None
+            table = lowpass(over, half)
             tab = tw.array(table)
             settings = Variable(interp, anti, tab.h, over)
             n = int(rng.integers(10, 80))
@@ -530,7 +501,7 @@ class TableResamplers(unittest.TestCase):
             times = np.cumsum(rng.choice([0.25, 0.5, 3.5], 60, p=[0.6, 0.2, 0.2])) - 0.5
             name = "CxResample_Variable" if cx else "Resample_Variable"
             s, whole, rest, last, done, consumed = self.variable_call(name, x, times, settings, -1.0)
-            want = self.variable_reference(x, times, table, over, interp, anti, -1.0)
+            want = table_reference(x, times, table, over, interp, np.diff(times, prepend=-1.0) if anti else [1.0] * 60)
             self.assertEqual((s, done), (0, len(want)))
             close(self, whole, want, 4 * len(table) * EPS * np.max(np.abs(x)), trial)
             np.testing.assert_array_equal(rest, times[done:] - consumed)
