@@ -43,12 +43,24 @@ template <class T>
 void RationalFilter(const T* v, const double* poly, const int32_t* start, int32_t taps, int32_t l, int32_t m,
                     int32_t delay, int32_t count, T* y) {
     const int64_t c = (taps - 1) / 2, phases = std::min(l, taps);
+    const int64_t whole = m / l, rest = m % l;  // one output step as whole samples and phases
     const double gain = l;
-    int64_t t = delay;
+    int64_t t = delay, i0 = 0, j0 = 0;
     for (int32_t k = 0; k < count; ++k, t += m) {
-        const int64_t q = t - c - 1;
-        const int64_t i0 = q < 0 ? 0 : q / l + 1;
-        const int64_t j0 = i0 * l - t + c, p = j0 % l;
+        // The first input i0 and first tap j0 follow from t; once t passes c they advance by the
+        // step, without a division per output.
+        if (t - c - 1 < 0) {
+            i0 = 0;
+            j0 = c - t;
+        } else if (k == 0 || t - m - c - 1 < 0) {
+            i0 = (t - c - 1) / l + 1;
+            j0 = i0 * l - t + c;
+        } else {
+            i0 += whole;
+            j0 -= rest;
+            if (j0 < 0) j0 += l, ++i0;
+        }
+        const int64_t p = j0 % l;
         T sum{};
         if (p < phases) {
             const double* hp = poly + start[p] + j0 / l;
