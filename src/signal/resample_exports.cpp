@@ -195,6 +195,7 @@ Status ResampleVariable(Handle x, Handle* y, Handle& times, const VariableSettin
     const VariableSettings settings = Load(settingsRecord);
     Frame f;
     if constexpr (Multi) f.Output2D<T>(*y);
+    f.Output<Time>(times);
     f.Result(last);
     const Handle table = settings.table;
     const Shape xd = Multi ? Dims(x) : Shape{1, Count(x)};

@@ -413,7 +413,8 @@ class TableResamplers(unittest.TestCase):
                 return s, state, y, produced.value
             self.assertGreaterEqual(len(y.numpy()), produced.value)
             out.append(y.numpy()[:produced.value])
-            reset = 0
+            # Ratio, interpolation and start are read on a reset only.
+            reset, settings.ratio, settings.interpolation, settings.start = 0, 7.0, 1 - interp, 3.0
         return 0, state, np.concatenate(out), None
 
     def test_ratio_one_is_the_table_every_oversample_cells(self):
@@ -463,6 +464,11 @@ class TableResamplers(unittest.TestCase):
                                        (table, 4, 0.0, -20140), (table, 4, -1.0, -20140)):
             s = self.const_stream("Resample_Const", [np.ones(5)], tab, over, 0, ratio, 0.0, 1)[0]
             self.assertEqual(s, want)
+            # The variable resampler has no ratio to refuse.
+            times, last, ta = tw.array([0.5, 1.0]), D(0.0), tw.array(tab)
+            s = lib.Resample_Variable(tw.array(np.ones(5)), times, Variable(0, 1, ta.h, over), last, I32(), I32())
+            failed = (want, (0,), True) if ratio > 0 else (0, (2,), False)
+            self.assertEqual((s, times.shape(), np.isnan(last.value)), failed)
         # The table and oversample are read on every call: a narrower step without a reset needs
         # more coefficients than the reset made room for.
         tab, buffer, coefs = tw.array(table), tw.empty(), tw.empty()
