@@ -26,8 +26,8 @@ Status DecimateBlock(const T* x, int32_t n, int32_t factor, bool average, T* out
 
 namespace {
 
-// Groups after the first that fit between `start` and the end of the block. The stated count
-// and this one agree while offset + partial = factor; a carry that breaks that cannot make the
+// Whole groups between `start` and the end of the block. The count (b + n) / factor agrees with
+// the groups that fit while offset + partial = factor; a carry that breaks that cannot make the
 // routine read past x.
 int32_t WholeGroups(int64_t start, int32_t n, int32_t factor) {
     return start <= n ? static_cast<int32_t>((n - start) / factor) : 0;
@@ -40,10 +40,10 @@ int32_t DecimateStreamCount(int32_t n, int32_t factor, bool average, const Decim
     if (!average) return c.offset < n ? (n - c.offset - 1) / factor + 1 : 0;
     const int64_t b = c.partial != 0 ? int64_t{c.partial} : -int64_t{c.offset};
     if (b + n < factor) return 0;  // also a negative b + n: nothing completes
-    const int32_t stated = static_cast<int32_t>((b + n) / factor);
+    const int32_t groups = static_cast<int32_t>((b + n) / factor);
     const int32_t safe = c.partial != 0 ? (c.offset <= n ? 1 + WholeGroups(c.offset, n, factor) : 0)
                                         : WholeGroups(c.offset, n, factor);
-    return std::min(stated, safe);
+    return std::min(groups, safe);
 }
 
 template <class T>

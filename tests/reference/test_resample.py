@@ -361,7 +361,7 @@ for name in ("Resample_Variable_MultiCh", "CxResample_Variable_MultiCh"):
 
 
 def table_filter(table, over, interp, r, f):
-    """left, right, scale and coefficients, rendered from the stated position arithmetic."""
+    """left, right, scale and coefficients, rendered from the position arithmetic."""
     size = len(table)
     s = over / min(max(r, 1.0), over)
     half = (size - 1) / 2
