@@ -90,4 +90,116 @@ TW_API int32_t CxConvolve_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z,
 TW_API int32_t Correlation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
 TW_API int32_t CxCorrelation_2DH(Array2DHandle x, Array2DHandle y, Array2DHandle z, int32_t algorithm);
 
+/* ---- Decimation and moving sums ---- */
+
+/* x replaced by x[k factor], or the mean of each group of factor samples (average nonzero), for k
+ * below n / factor. */
+TW_API int32_t DecimateCIN(Array1DHandle x, int32_t* factor, uint8_t* average, int32_t* status);
+TW_API int32_t CxDecimate_H(Array1DHandle x, int32_t factor, int32_t average);
+/* Streaming decimation: offset is the index in the next block of the next sample to take (or of
+ * the next full group's start); partial samples of an unfinished group sum to *sum. reset clears
+ * partial and sum. x is replaced by the outputs of this block. */
+TW_API int32_t DecimateContinuous_H(Array1DHandle x, int32_t factor, int32_t average, int32_t* offset,
+                                    int32_t reset, int32_t* partial, double* sum);
+TW_API int32_t CxDecimateContinuous_H(Array1DHandle x, int32_t factor, int32_t average, int32_t* offset,
+                                      int32_t reset, int32_t* partial, ComplexDouble* sum);
+/* Block sums (not means) of factor samples written over the front of x, which keeps its size;
+ * produced says how many. count samples of an unfinished block are carried in sum. */
+TW_API void ReDecimatedMovingAverageH(Array1DHandle x, int32_t factor, double* sum, int32_t* count,
+                                      int32_t reset, int32_t* produced);
+TW_API void CxDecimatedMovingAverageH(Array1DHandle x, int32_t factor, ComplexDouble* sum, int32_t* count,
+                                      int32_t reset, int32_t* produced);
+/* stages cascaded moving sums of width samples in place, unscaled. sums (stages values) and
+ * window (stages x width) carry the past; position is the next window column. They are rebuilt
+ * and zeroed on reset or when their sizes or position do not fit. */
+TW_API int32_t ReCascadedMovingAverageH(Array1DHandle x, int32_t stages, int32_t width, Array1DHandle sums,
+                                        Array2DHandle window, int32_t* position, int32_t reset);
+TW_API int32_t CxCascadedMovingAverageH(Array1DHandle x, int32_t stages, int32_t width, Array1DHandle sums,
+                                        Array2DHandle window, int32_t* position, int32_t reset);
+/* Cascaded-integrator-comb filters from moving sums of width R D, each scaled by 1 / (R D); mode
+ * nonzero alternates signs (the filter moves to half the sampling rate). State: R D + 1 cells per
+ * stage, plus the phase for the decimator. The decimator keeps every R-th sample, the
+ * interpolator stuffs R x[k] every R samples; delay samples at the start are dropped. */
+TW_API int32_t CICDecimatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t stages,
+                                  int32_t R, int32_t D, int32_t mode, uint8_t reset, int32_t* delay);
+TW_API int32_t CICInterpolatorByMovH(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t stages,
+                                     int32_t R, int32_t D, int32_t mode, uint8_t reset, int32_t* delay);
+
+/* ---- Resampling ---- */
+
+/* Rational resampling by L / M (gcd 1) with an odd FIR h centred on each output instant:
+ * y[k] = L sum_i v[i] h[i L - delay - k M + (taps - 1) / 2], v the stateCount live state samples
+ * followed by x. delay is the next output instant in the L-fold upsampled time base, counted from
+ * the first live state sample; state keeps (taps - 1) / L + 1 cells per channel. reset empties the
+ * state and keeps delay. */
+TW_API int32_t RationalResample_H(Array1DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                  Array1DHandle h, Array1DHandle state, int32_t* stateCount, Array1DHandle y);
+TW_API int32_t CxRationalResample_H(Array1DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                    Array1DHandle h, Array1DHandle state, int32_t* stateCount, Array1DHandle y);
+/* The same on the rows (channels) of x, with one timing; a state without rows is created. */
+TW_API int32_t RationalResampleMultiCh_H(Array2DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                         Array1DHandle h, Array2DHandle state, int32_t* stateCount,
+                                         Array2DHandle y);
+TW_API int32_t CxRationalResampleMCh_H(Array2DHandle x, int32_t L, int32_t M, int32_t reset, int32_t* delay,
+                                       Array1DHandle h, Array2DHandle state, int32_t* stateCount, Array2DHandle y);
+
+/* Table resamplers. The table is the impulse response of a lowpass filter at oversample times the
+ * input rate, with unit sum, symmetric about its centre; interpolation 1 reads the nearest cell
+ * below a position, any other value interpolates linearly. The records are packed. */
+#pragma pack(push, 1)
+typedef struct {
+    double ratio;          /* input samples per output sample */
+    int32_t interpolation;
+    double start;          /* position of the first output, in input samples */
+    NumericHandle table;
+    int32_t oversample;
+} ResampleSettings;
+
+typedef struct {
+    int32_t interpolation;
+    uint8_t antiAlias;
+    NumericHandle table;
+    int32_t oversample;
+} VariableSettings;
+
+/* Caller-held state of a constant-ratio resampler: buffered samples, current coefficients and the
+ * position of the next output in the buffer. */
+typedef struct {
+    NumericHandle buffer;
+    int32_t count;
+    NumericHandle coefs;
+    double scale;
+    int32_t left;
+    int32_t right;
+    int32_t interpolation;
+    double ratio;
+    double frac;
+    int32_t index;
+} ResampleState;
+#pragma pack(pop)
+
+/* Constant-ratio resampling. ratio, interpolation and start are taken from the settings on reset
+ * only; table and oversample on every call. y is sized to ceil((n + count) / ratio) and produced
+ * says how many outputs it holds. antiAlias widens the filter by the ratio when it exceeds 1. */
+TW_API int32_t Resample_Const(Array1DHandle x, ResampleState* state, const ResampleSettings* settings, int32_t reset,
+                              Array1DHandle y, int32_t* produced, int32_t antiAlias);
+TW_API int32_t CxResample_Const(Array1DHandle x, ResampleState* state, const ResampleSettings* settings,
+                                int32_t reset, Array1DHandle y, int32_t* produced, int32_t antiAlias);
+/* Resampling at ascending instants `times` (input samples from x[0]); each computable output
+ * replaces its time (in the complex twin the times are the real parts). done outputs were made;
+ * the caller drops consumed samples of x, and the unreached times and *lastTime are lowered by
+ * consumed, ready for the next call with the rest. */
+TW_API int32_t Resample_Variable(Array1DHandle x, Array1DHandle times, const VariableSettings* settings,
+                                 double* lastTime, int32_t* done, int32_t* consumed);
+TW_API int32_t CxResample_Variable(Array1DHandle x, Array1DHandle times, const VariableSettings* settings,
+                                   double* lastTime, int32_t* done, int32_t* consumed);
+/* The same on the rows of x into y (rows x done); the f64 times are kept and only the unreached
+ * ones lowered. */
+TW_API int32_t Resample_Variable_MultiCh(Array2DHandle x, Array2DHandle y, Array1DHandle times,
+                                         const VariableSettings* settings, double* lastTime, int32_t* done,
+                                         int32_t* consumed);
+TW_API int32_t CxResample_Variable_MultiCh(Array2DHandle x, Array2DHandle y, Array1DHandle times,
+                                           const VariableSettings* settings, double* lastTime, int32_t* done,
+                                           int32_t* consumed);
+
 #endif
