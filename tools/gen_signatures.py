@@ -19,7 +19,7 @@ ELEMS = {"i32": ("I32", 4, "int32_t"), "u8": ("U8", 1, "uint8_t"), "u32": ("U32"
          "c128": ("C128", 16, None), "len": ("Len", 4, "int32_t")}
 DIRS = {"in": "In", "out": "Out", "io": "Io"}
 STYLES = {"ret": "Ret", "ptr": "Ptr", "both": "Both", "cluster": "Cluster", "none": "None"}
-CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work"}
+CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work", "inwhen"}
 
 
 class RowError(Exception):
@@ -58,6 +58,10 @@ def parse_kind(text):
         return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
+        return k
+    if text == "u16":
+        # An i32 slot passed on as uint16_t: the sweep's hostile i32 values wrap to 0, 1, 65535, ...
+        k.update(kind="I32", ctype="uint16_t")
         return k
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
@@ -140,7 +144,7 @@ def parse_signature(sig):
 
 def parse_contract(text, args):
     c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False,
-         "nosweep": False}
+         "nosweep": False, "inwhen_flag": -1, "inwhen": []}
     names = [a["name"] for a in args]
     for tok in text.split():
         key, _, value = tok.partition("=")
@@ -157,6 +161,15 @@ def parse_contract(text, args):
                 c[key].append(names.index(v))
         elif key == "stand":
             c["stand"] = value.split(",")
+        elif key == "inwhen":
+            flag, _, listed = value.partition(":")
+            if flag not in names or args[names.index(flag)]["kind"] != "I32":
+                raise RowError("inwhen=%s: the flag must be an i32 argument" % value)
+            c["inwhen_flag"] = names.index(flag)
+            for v in listed.split(","):
+                if v not in names:
+                    raise RowError("inwhen names %r, which is no argument" % v)
+                c["inwhen"].append(names.index(v))
         elif key == "result":
             if value != "host":
                 raise RowError("result=%s: only result=host" % value)
@@ -216,7 +229,7 @@ def accessor(i, a):
     if k in ("H1", "H2"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
-        return "s.I(%d)" % i
+        return ("static_cast<uint16_t>(s.I(%d))" if a["ctype"] == "uint16_t" else "s.I(%d)") % i
     if k == "F64":
         return "s.D(%d)" % i
     if k in ("Cell", "Idp"):
@@ -257,11 +270,13 @@ def write_table(rows, path, stem, includes):
         c = r["c"]
         masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
-        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
+        inwhen = sum(1 << i for i in c["inwhen"])
+        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s, %d, 0x%xu,\n'
                    '     [](sweep::Slots& s) -> sweep::Outcome { %s }},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
-                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, body))
+                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, c["inwhen_flag"], inwhen,
+                      body))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 
