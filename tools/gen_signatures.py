@@ -56,12 +56,12 @@ def parse_kind(text):
     if text in ("i32", "len"):
         k.update(kind="I32" if text == "i32" else "Len", ctype="int32_t")
         return k
+    if text in ("u16", "u32"):
+        # Unsigned selectors by value: swept with the i32 values, converted as a caller would.
+        k.update(kind="I32", ctype="uint16_t" if text == "u16" else "uint32_t")
+        return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
-        return k
-    if text == "u16":
-        # An i32 slot passed on as uint16_t: the sweep's hostile i32 values wrap to 0, 1, 65535, ...
-        k.update(kind="I32", ctype="uint16_t")
         return k
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
@@ -144,7 +144,7 @@ def parse_signature(sig):
 
 def parse_contract(text, args):
     c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False,
-         "nosweep": False, "inwhen_flag": -1, "inwhen": []}
+         "nosweep": False}
     names = [a["name"] for a in args]
     for tok in text.split():
         key, _, value = tok.partition("=")
@@ -162,14 +162,14 @@ def parse_contract(text, args):
         elif key == "stand":
             c["stand"] = value.split(",")
         elif key == "inwhen":
+            # Marked on the arguments themselves: the index of the flag that makes them inputs.
             flag, _, listed = value.partition(":")
             if flag not in names or args[names.index(flag)]["kind"] != "I32":
                 raise RowError("inwhen=%s: the flag must be an i32 argument" % value)
-            c["inwhen_flag"] = names.index(flag)
             for v in listed.split(","):
                 if v not in names:
                     raise RowError("inwhen names %r, which is no argument" % v)
-                c["inwhen"].append(names.index(v))
+                args[names.index(v)]["inwhen"] = names.index(flag)
         elif key == "result":
             if value != "host":
                 raise RowError("result=%s: only result=host" % value)
@@ -219,9 +219,9 @@ def arg_init(a):
         fields = "k%s_fields, %d" % (a["cur_id"], len(a["fields"]))
     unreserve = a["ref"] if a["kind"] == "Idp" else "nullptr"
     count = a.get("count_index", -1)
-    return ('{"%s", sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %s, %d, %s, %d, %s, %d}'
+    return ('{"%s", sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %s, %d, %d, %s, %d, %s, %d}'
             % (a["name"], a["kind"], a["elem"], a["dir"], "true" if a["nullable"] else "false",
-               a["elem_bytes"], fields, a["rec_bytes"], unreserve, count))
+               a.get("inwhen", -1), a["elem_bytes"], fields, a["rec_bytes"], unreserve, count))
 
 
 def accessor(i, a):
@@ -229,7 +229,7 @@ def accessor(i, a):
     if k in ("H1", "H2"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
-        return ("static_cast<uint16_t>(s.I(%d))" if a["ctype"] == "uint16_t" else "s.I(%d)") % i
+        return "s.I(%d)" % i if a["ctype"] == "int32_t" else "static_cast<%s>(s.I(%d))" % (a["ctype"], i)
     if k == "F64":
         return "s.D(%d)" % i
     if k in ("Cell", "Idp"):
@@ -270,13 +270,11 @@ def write_table(rows, path, stem, includes):
         c = r["c"]
         masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
-        inwhen = sum(1 << i for i in c["inwhen"])
-        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s, %d, 0x%xu,\n'
+        out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
                    '     [](sweep::Slots& s) -> sweep::Outcome { %s }},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
-                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, c["inwhen_flag"], inwhen,
-                      body))
+                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, body))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 

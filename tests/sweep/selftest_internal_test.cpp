@@ -114,7 +114,8 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
         const sweep::Row& row = Fake(c.fake);
         sweep::Case one = sweep::BaseCase(row);
         one[0].rows = c.count;
-        if (row.inWhen != 0) one[static_cast<size_t>(row.inWhenFlag)].i = 1;  // the flag set
+        for (int32_t a = 0; a < row.nArgs; ++a)
+            if (row.args[a].inWhen >= 0) one[static_cast<size_t>(row.args[a].inWhen)].i = 1;  // the flag set
         std::vector<void*> cells(static_cast<size_t>(row.nArgs), nullptr);
         const sweep::Verdict v = sweep::CallAndJudge(row, one, cells.data(), 0);
         EXPECT_TRUE(Mentions(v.faults, c.caught)) << c.fake << " not caught: " << testing::PrintToString(v.faults);

@@ -38,6 +38,7 @@ struct Arg {
     Elem elem;
     Dir dir;
     bool nullable;
+    int32_t inWhen;  // an output left untouched while this i32 argument is non-zero; -1: none
     int32_t elemBytes;
     const Field* fields;
     int32_t nFields;
@@ -67,8 +68,6 @@ struct Row {
     uint32_t zero;
     uint32_t work;  // outputs whose contents are working memory
     int32_t stand[4];
-    int32_t inWhenFlag;  // while this i32 argument is non-zero, the `inWhen` arguments are inputs
-    uint32_t inWhen;
     Outcome (*call)(Slots&);
 };
 
@@ -417,14 +416,14 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
         for (int a = 0; a < row.nArgs; ++a) {
             const Arg& arg = row.args[a];
             const std::string name = arg.name;
-            const bool kept = (row.keep >> a) & 1;
-            const bool asInput = ((row.inWhen >> a) & 1) && s.I(row.inWhenFlag) != 0;
+            const bool asInput = arg.inWhen >= 0 && s.I(arg.inWhen) != 0;
+            const bool kept = ((row.keep >> a) & 1) || asInput;
+            if (asInput && s.Snapshot(a, true) != before[a]) fault(name + " is an input but was written");
             // Inputs stay as they were: handles, pointees and records.
-            if ((arg.dir == Dir::In || asInput) && s.Snapshot(a, true) != before[a])
-                fault(name + " is an input but was written");
+            if (arg.dir == Dir::In && s.Snapshot(a, true) != before[a]) fault(name + " is an input but was written");
             for (const auto& h : s.Handles(a)) {
                 const int32_t n0 = Word(h.h, 0), n1 = h.dims == 2 ? Word(h.h, 1) : 1;
-                if (h.dir == Dir::In || asInput) continue;
+                if (h.dir == Dir::In) continue;
                 if (v.failed && !kept && (n0 != 0 || (h.dims == 2 && n1 != 0)))
                     fault(name + " not emptied on failure (status " + std::to_string(status) + ")");
                 if (n0 < 0 || n1 < 0) {
@@ -441,7 +440,7 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
                     fault(name + " resized with type code " + std::to_string(type));
             }
             // f64 results turn NaN (or 0) on failure.
-            if (v.failed && !kept && !asInput && !s.IsNull(a) && Writes(arg.dir)) {
+            if (v.failed && !kept && !s.IsNull(a) && Writes(arg.dir)) {
                 const double want = (row.zero >> a) & 1 ? 0.0 : kQuietNaN;
                 auto check = [&](const unsigned char* p, const std::string& what) {
                     if (std::bit_cast<uint64_t>(want) != [&] { uint64_t b; std::memcpy(&b, p, 8); return b; }())
