@@ -19,7 +19,7 @@ ELEMS = {"i32": ("I32", 4, "int32_t"), "u8": ("U8", 1, "uint8_t"), "u32": ("U32"
          "c128": ("C128", 16, None), "len": ("Len", 4, "int32_t")}
 DIRS = {"in": "In", "out": "Out", "io": "Io"}
 STYLES = {"ret": "Ret", "ptr": "Ptr", "both": "Both", "cluster": "Cluster", "none": "None"}
-CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work"}
+CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work", "inwhen"}
 
 
 class RowError(Exception):
@@ -55,6 +55,10 @@ def parse_kind(text):
         return k
     if text in ("i32", "len"):
         k.update(kind="I32" if text == "i32" else "Len", ctype="int32_t")
+        return k
+    if text in ("u16", "u32"):
+        # Unsigned selectors by value: swept with the i32 values, converted as a caller would.
+        k.update(kind="I32", ctype="uint16_t" if text == "u16" else "uint32_t")
         return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
@@ -157,6 +161,15 @@ def parse_contract(text, args):
                 c[key].append(names.index(v))
         elif key == "stand":
             c["stand"] = value.split(",")
+        elif key == "inwhen":
+            # Marked on the arguments themselves: the index of the flag that makes them inputs.
+            flag, _, listed = value.partition(":")
+            if flag not in names or args[names.index(flag)]["kind"] != "I32":
+                raise RowError("inwhen=%s: the flag must be an i32 argument" % value)
+            for v in listed.split(","):
+                if v not in names:
+                    raise RowError("inwhen names %r, which is no argument" % v)
+                args[names.index(v)]["inwhen"] = names.index(flag)
         elif key == "result":
             if value != "host":
                 raise RowError("result=%s: only result=host" % value)
@@ -206,9 +219,9 @@ def arg_init(a):
         fields = "k%s_fields, %d" % (a["cur_id"], len(a["fields"]))
     unreserve = a["ref"] if a["kind"] == "Idp" else "nullptr"
     count = a.get("count_index", -1)
-    return ('{"%s", sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %s, %d, %s, %d, %s, %d}'
+    return ('{"%s", sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %s, %d, %d, %s, %d, %s, %d}'
             % (a["name"], a["kind"], a["elem"], a["dir"], "true" if a["nullable"] else "false",
-               a["elem_bytes"], fields, a["rec_bytes"], unreserve, count))
+               a.get("inwhen", -1), a["elem_bytes"], fields, a["rec_bytes"], unreserve, count))
 
 
 def accessor(i, a):
@@ -216,7 +229,7 @@ def accessor(i, a):
     if k in ("H1", "H2"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
-        return "s.I(%d)" % i
+        return "s.I(%d)" % i if a["ctype"] == "int32_t" else "static_cast<%s>(s.I(%d))" % (a["ctype"], i)
     if k == "F64":
         return "s.D(%d)" % i
     if k in ("Cell", "Idp"):

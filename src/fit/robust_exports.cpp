@@ -142,7 +142,7 @@ Status GeneralFrame(bool lar, Handle h, Handle y, Handle& w, bool weightsOut, in
     if (s == 0) s = f.In(y, &ys);
     if (s == 0 && weightsOut) {
         if (nw == 0) {
-            s = f.Resize(w, n, &wio);
+            s = f.Resize(w, n, &wio) != 0 ? OutOfMemoryErr : 0;
             if (s == 0)
                 for (int32_t i = 0; i < n; ++i) wio[i] = 1.0;
         } else {

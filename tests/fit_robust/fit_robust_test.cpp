@@ -130,6 +130,19 @@ TEST_P(FitRobust, GeneralStatusesAndWeightHandback) {
         EXPECT_TRUE(coef.vec().empty() && fit.vec().empty() && cov.rows() == 0 && w.vec().empty());
         EXPECT_TRUE(twtest::IsFailureNaN(mse));
     }
+    // A failed resize of the empty weights array is reported as the fitting family reports any.
+    {
+        Array2D<double> h(5, 2, rows), cov;
+        Array1D<double> coef, fit, w;
+        double mse = 0;
+        int32_t it = 5;
+        TWRTFailResizeAt(1);
+        const int32_t status = GenBisquareFit_Weight_head(h.h(), Array1D<double>(y).h(), w.h(), 0, 0, 1e-6, &it,
+                                                          coef.h(), fit.h(), cov.h(), &mse);
+        TWRTFailResizeAt(0);
+        EXPECT_EQ(status, OutOfMemoryErr);
+        EXPECT_TRUE(w.vec().empty() && coef.vec().empty() && twtest::IsFailureNaN(mse));
+    }
     // Exact data: the mse is below the threshold before any pass, so the weights stay as passed;
     // an empty weights array comes back as ones.
     for (const V& w0 : {V{2, 2, 2, 2, 2}, V{}}) {

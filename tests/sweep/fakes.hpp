@@ -10,3 +10,4 @@ TW_EXTERN_C int32_t SweepFakeWritesInput(Array1DHandle x, double* mean, int32_t*
 TW_EXTERN_C int32_t SweepFakeNoNaN(Array1DHandle x, double* mean, int32_t* status);
 TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x);
 TW_EXTERN_C int32_t SweepFakeCounter(Array1DHandle x, Array1DHandle y);
+TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t coefficientsOnly);

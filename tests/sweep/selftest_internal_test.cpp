@@ -61,6 +61,16 @@ TW_EXTERN_C int32_t SweepFakeNoNaN(Array1DHandle x, double* mean, int32_t* statu
     return ToPointer(status, Mean(x, mean, false, false));
 }
 TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x) { return Count(x) > 0 ? -20000 : EmptyArrayErr; }
+TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t) {
+    Frame f;
+    f.Output<double>(y);
+    f.Result(mse);
+    double* ys = nullptr;
+    const Status s = Count(y) < 1 ? EmptyArrayErr : f.InPlace(y, &ys);
+    for (int32_t i = 0; s == 0 && i < Count(y); ++i) ys[i] *= 2;
+    *mse = 0;
+    return f.Finish(s);
+}
 
 namespace {
 
@@ -98,11 +108,14 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
         {"SweepFakeWritesInput", 4, "x is an input but was written"},
         {"SweepFakeNoNaN", 0, "mean is not NaN on failure"},
         {"SweepFakeStrangeStatus", 4, "status -20000 is not in status.h"},
+        {"SweepFakeIgnoresFlag", 4, "y is an input but was written"},
     };
     for (const auto& c : cases) {
         const sweep::Row& row = Fake(c.fake);
         sweep::Case one = sweep::BaseCase(row);
         one[0].rows = c.count;
+        for (int32_t a = 0; a < row.nArgs; ++a)
+            if (row.args[a].inWhen >= 0) one[static_cast<size_t>(row.args[a].inWhen)].i = 1;  // the flag set
         std::vector<void*> cells(static_cast<size_t>(row.nArgs), nullptr);
         const sweep::Verdict v = sweep::CallAndJudge(row, one, cells.data(), 0);
         EXPECT_TRUE(Mentions(v.faults, c.caught)) << c.fake << " not caught: " << testing::PrintToString(v.faults);

@@ -38,6 +38,7 @@ struct Arg {
     Elem elem;
     Dir dir;
     bool nullable;
+    int32_t inWhen;  // an output left untouched while this i32 argument is non-zero; -1: none
     int32_t elemBytes;
     const Field* fields;
     int32_t nFields;
@@ -415,7 +416,9 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
         for (int a = 0; a < row.nArgs; ++a) {
             const Arg& arg = row.args[a];
             const std::string name = arg.name;
-            const bool kept = (row.keep >> a) & 1;
+            const bool asInput = arg.inWhen >= 0 && s.I(arg.inWhen) != 0;
+            const bool kept = ((row.keep >> a) & 1) || asInput;
+            if (asInput && s.Snapshot(a, true) != before[a]) fault(name + " is an input but was written");
             // Inputs stay as they were: handles, pointees and records.
             if (arg.dir == Dir::In && s.Snapshot(a, true) != before[a]) fault(name + " is an input but was written");
             for (const auto& h : s.Handles(a)) {
