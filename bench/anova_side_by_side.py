@@ -14,7 +14,7 @@ os.environ["TWANLYS_LIB_DIR"] = os.path.abspath(build)
 import numpy as np  # noqa: E402
 import scipy.stats as st  # noqa: E402
 
-import twanlys as tw  # noqa: E402
+from twanlys import lowlevel as tw  # noqa: E402
 
 N, K, RUNS = 10**6, 1000, 15
 rng = np.random.default_rng(1)

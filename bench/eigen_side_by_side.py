@@ -12,7 +12,7 @@ os.environ["TWANLYS_LIB_DIR"] = os.path.abspath(build)
 import numpy as np  # noqa: E402
 import scipy.linalg as sl  # noqa: E402
 
-import twanlys as tw  # noqa: E402
+from twanlys import lowlevel as tw  # noqa: E402
 
 C = np.complex128
 

@@ -13,7 +13,7 @@ os.environ["TWANLYS_LIB_DIR"] = os.path.abspath(build)
 import numpy as np  # noqa: E402
 import scipy.signal as ss  # noqa: E402
 
-import twanlys as tw  # noqa: E402
+from twanlys import lowlevel as tw  # noqa: E402
 
 lib = tw.lib
 P = ctypes.c_void_p

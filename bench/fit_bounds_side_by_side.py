@@ -12,7 +12,7 @@ import numpy as np
 import scipy.linalg
 import scipy.stats
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, P = ctypes.c_double, ctypes.c_void_p
 DP = ctypes.POINTER(ctypes.c_double)

@@ -11,7 +11,7 @@ import numpy as np
 import scipy.optimize
 import scipy.stats
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p
 DP, IP = ctypes.POINTER(ctypes.c_double), ctypes.POINTER(ctypes.c_int32)

@@ -10,7 +10,7 @@ import time
 import numpy as np
 import scipy.interpolate as si
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, P = ctypes.c_double, ctypes.c_void_p
 DP, IP = ctypes.POINTER(D), ctypes.POINTER(ctypes.c_int32)

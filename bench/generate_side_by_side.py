@@ -14,7 +14,7 @@ os.environ["TWANLYS_LIB_DIR"] = os.path.abspath(build)
 
 import numpy as np  # noqa: E402
 
-import twanlys as tw  # noqa: E402
+from twanlys import lowlevel as tw  # noqa: E402
 
 RUNS, N = 15, 10**6
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p

@@ -11,7 +11,7 @@ import timeit
 import numpy as np
 from scipy.spatial.transform import Rotation
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, P = ctypes.c_double, ctypes.c_void_p
 tw.lib.unitVector80_head.argtypes = [P, D, P]

@@ -14,7 +14,7 @@ os.environ["TWANLYS_LIB_DIR"] = os.path.abspath(build)
 import numpy as np  # noqa: E402
 from numpy.polynomial import polynomial as npp  # noqa: E402
 
-import twanlys as tw  # noqa: E402
+from twanlys import lowlevel as tw  # noqa: E402
 
 L = tw.lib
 D, P, I32 = ctypes.c_double, ctypes.c_void_p, ctypes.c_int32

@@ -15,7 +15,7 @@ import numpy as np
 import scipy.ndimage
 import scipy.signal
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 I32, P = ctypes.c_int32, ctypes.c_void_p
 tw.lib.SavitzkyGolayFiltH.argtypes = [P, I32, I32, P, P]

@@ -10,8 +10,6 @@ TWANLYS_PREFIX, the loader's search path, the installation prefix).
 from . import lowlevel
 from .errors import (ArgumentError, NumericalError, SizeError, TwanlysError, TwanlysMemoryError,
                      TwanlysWarning, check)
-# Today's tests and scripts call the low-level names from the package itself.
-from .lowlevel import Array, Scalar, array, empty, f64, i32, lib, matrix, placement, twrt  # noqa: F401
 from .api import build_families as _build_families
 
 # twanlys.stats.median(x), twanlys.fft.re_qxfft80(x, 0, n, 0), ...: one module per public header.

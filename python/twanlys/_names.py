@@ -3,7 +3,7 @@ pages (no dependencies)."""
 import keyword
 import re
 
-_SCALARS = ("i32", "len", "u8", "u32", "f32", "f64")
+_SCALARS = ("i32", "len", "u8", "u16", "u32", "f32", "f64")
 
 
 def snake(name, marks=True):

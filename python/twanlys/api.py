@@ -26,9 +26,10 @@ from ._names import Arg, has_python_form, module_name, python_names
 from ._table import ROWS
 from .errors import check as _check
 
-_DTYPES = {"i32": np.int32, "u8": np.uint8, "u32": np.uint32, "f32": np.float32, "f64": np.float64,
+_DTYPES = {"i32": np.int32, "u8": np.uint8, "u16": np.uint16, "u32": np.uint32, "f32": np.float32, "f64": np.float64,
            "c64": np.complex64, "c128": np.complex128, "len": np.int32}
-_CTYPES = {"i32": ctypes.c_int32, "len": ctypes.c_int32, "u8": ctypes.c_uint8, "u32": ctypes.c_uint32,
+_CTYPES = {"i32": ctypes.c_int32, "len": ctypes.c_int32, "u8": ctypes.c_uint8, "u16": ctypes.c_uint16,
+           "u32": ctypes.c_uint32,
            "f32": ctypes.c_float, "f64": ctypes.c_double}
 
 
@@ -214,6 +215,9 @@ def _doc(row, params, outputs):
     return "\n".join(text)
 
 
+SKIPPED = {}  # export -> why it has no Python function (the tests keep this empty)
+
+
 def build_families(package):
     """Adds a module per family to the package (twanlys.stats, twanlys.fft, ...) and returns
     {export name: function} for every export with a Python form."""
@@ -223,7 +227,11 @@ def build_families(package):
         if not has_python_form(row):
             continue
         name, family, pyname = row[0], row[5], names[row[0]]
-        source, env, params, outputs = _build(row, pyname)
+        try:
+            source, env, params, outputs = _build(row, pyname)
+        except ValueError as e:  # a kind this layer does not know yet: the export stays low-level
+            SKIPPED[name] = str(e)
+            continue
         exec(compile(source, f"<twanlys {name}>", "exec"), env)
         fn = env[pyname]
         fn.__doc__ = _doc(row, params, outputs)

@@ -51,7 +51,7 @@ int32_t FactorialFrame(Handle data, Handle const (&labels)[Factors], int32_t col
     double tails[kRows - 1];
     if (s == 0) s = core(xs, ls, n, full, tails);
     double* out = nullptr;
-    if (s == 0) s = f.Resize2D(table, kRows, cols, &out);
+    if (s == 0 && f.Resize2D(table, kRows, cols, &out) != 0) s = OutOfMemoryErr;
     if (s == 0) {
         for (int r = 0; r < kRows; ++r)
             std::memcpy(out + r * cols, full + r * kAnovaColumns, sizeof(double) * static_cast<size_t>(cols));

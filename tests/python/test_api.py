@@ -30,6 +30,7 @@ class Table(unittest.TestCase):
                             or next(r[5] for r in ROWS if r[0] == name) in ("link", "workspace"), name)
         for row in ROWS:
             self.assertTrue(hasattr(ll.lib, row[0]), row[0])
+        self.assertEqual(tw.api.SKIPPED, {})
         self.assertGreater(len(tw.EXPORTS), 0.9 * len(ROWS))
         for fn in tw.EXPORTS.values():
             self.assertIn("Export ", fn.__doc__)

@@ -8,6 +8,7 @@ import warnings
 import numpy as np
 
 import twanlys as tw
+from twanlys import lowlevel as ll
 
 ROOT = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "..")
 
@@ -28,9 +29,9 @@ class Statuses(unittest.TestCase):
             self.assertIsInstance(caught.exception, tw.TwanlysError)
 
     def test_warning_keeps_going(self):
-        x, y = tw.array(np.ones(5)), tw.array(np.ones(3))
-        mse, status = tw.f64(), tw.i32()
-        tw.lib.MSE_head(x, y, mse.ref, status.ref)
+        x, y = ll.array(np.ones(5)), ll.array(np.ones(3))
+        mse, status = ll.f64(), ll.i32()
+        ll.lib.MSE_head(x, y, mse.ref, status.ref)
         with warnings.catch_warnings(record=True) as seen:
             warnings.simplefilter("always")
             tw.check(status.value, "MSE_head")

@@ -15,7 +15,7 @@ import unittest
 import numpy as np
 import scipy.stats as st
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from test_special_gamma import EPS, incbeta_tolerance, print_report
 
 REPORT = {}

@@ -7,7 +7,7 @@ import unittest
 import numpy as np
 import scipy.signal as ss
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 lib = tw.lib
 EPS = 2.0 ** -52

@@ -14,7 +14,7 @@ import numpy as np
 import scipy.special as sc
 import scipy.stats as st
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from test_special_gamma import EPS, incbeta_tolerance, incgamma_tolerance, print_report
 
 D, I32 = ctypes.c_double, ctypes.c_int32

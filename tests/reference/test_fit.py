@@ -9,7 +9,7 @@ import numpy as np
 import scipy.optimize
 import scipy.stats
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p

@@ -10,7 +10,7 @@ import numpy as np
 import scipy.linalg
 import scipy.stats
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p
 DP, IP = ctypes.POINTER(ctypes.c_double), ctypes.POINTER(ctypes.c_int32)

@@ -8,7 +8,7 @@ import unittest
 import numpy as np
 import scipy.optimize
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, I32, P, U16 = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p, ctypes.c_uint16
 DP, IP = ctypes.POINTER(ctypes.c_double), ctypes.POINTER(ctypes.c_int32)

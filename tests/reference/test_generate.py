@@ -5,7 +5,7 @@ import unittest
 import numpy as np
 from scipy import signal
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 
 def fold(p):

@@ -8,7 +8,7 @@ import numpy as np
 import scipy.signal as ss
 import scipy.special as sp
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 lib = tw.lib
 WORST = {}

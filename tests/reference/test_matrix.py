@@ -4,7 +4,7 @@ import unittest
 
 import numpy as np
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from matrix_common import C128, ill, rel, rnd
 
 SHAPES = [(1, 1), (5, 5), (9, 4), (4, 9), (1, 7), (7, 1), (33, 20)]

@@ -6,7 +6,7 @@ import numpy as np
 import scipy.linalg as sl
 from scipy.linalg import lapack
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from matrix_common import C128, rel as err, rnd, unitary_err
 
 SHAPES = [(5, 5), (7, 4), (4, 7), (1, 3), (3, 1), (40, 25)]

@@ -6,7 +6,7 @@ import numpy as np
 import scipy.linalg as sl
 from scipy.linalg import lapack
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from matrix_common import C128, EPS, rnd, unitary_err
 
 SIZES = [1, 2, 3, 4, 7, 12, 25, 40]

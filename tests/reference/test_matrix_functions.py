@@ -7,7 +7,7 @@ import unittest
 import numpy as np
 import scipy.linalg as sl
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from matrix_common import C128, EPS, rel, rnd
 
 D = ctypes.c_double

@@ -6,7 +6,7 @@ import numpy as np
 import scipy.linalg as sl
 from scipy.linalg import lapack
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 from matrix_common import C128, EPS, ill, rel, rnd
 
 D, I32, P = ctypes.c_double, ctypes.c_int32, ctypes.c_void_p

@@ -5,7 +5,7 @@ import unittest
 
 import numpy as np
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 D, I32, U16, P = ctypes.c_double, ctypes.c_int32, ctypes.c_uint16, ctypes.c_void_p
 PD = ctypes.POINTER(D)

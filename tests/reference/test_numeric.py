@@ -9,7 +9,7 @@ import numpy as np
 import scipy.integrate
 from scipy.spatial.transform import Rotation
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 D, P, U16, I32 = ctypes.c_double, ctypes.c_void_p, ctypes.c_uint16, ctypes.c_int32

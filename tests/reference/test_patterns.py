@@ -9,7 +9,7 @@ import unittest
 import numpy as np
 from scipy import signal, special
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "generate"))
 import wichmann_hill_reference as wh  # noqa: E402

@@ -9,7 +9,7 @@ import numpy as np
 from numpy.polynomial import polynomial as npp
 from scipy.optimize import linear_sum_assignment
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 D, P, I32 = ctypes.c_double, ctypes.c_void_p, ctypes.c_int32

@@ -6,7 +6,7 @@ import unittest
 import numpy as np
 import scipy.integrate
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 D, I32 = ctypes.c_double, ctypes.c_int32

@@ -11,7 +11,7 @@ import numpy as np
 import scipy.signal
 from numpy.lib.stride_tricks import sliding_window_view
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 I32, P = ctypes.c_int32, ctypes.c_void_p

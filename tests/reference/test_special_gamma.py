@@ -14,7 +14,7 @@ import numpy as np
 import scipy
 import scipy.special as sc
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0 ** -52
 D, I32 = ctypes.c_double, ctypes.c_int32

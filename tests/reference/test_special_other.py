@@ -12,7 +12,7 @@ import numpy as np
 import scipy.special as sc
 from scipy.integrate import quad
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0 ** -52
 D, I32 = ctypes.c_double, ctypes.c_int32

@@ -5,7 +5,7 @@ import unittest
 import numpy as np
 import scipy.stats
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 EPS = 2.0**-52
 

@@ -6,7 +6,7 @@ import warnings
 import numpy as np
 from scipy.signal import windows
 
-import twanlys as tw
+from twanlys import lowlevel as tw
 
 LENGTHS = [2, 3, 4, 5, 8, 15, 16, 63, 64, 257, 1000]
 D, I = ctypes.c_double, ctypes.c_int32
