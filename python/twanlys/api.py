@@ -48,12 +48,57 @@ def _record_type(kind):
     return record, fields
 
 
+_TYPE_CODES = {"i32": 3, "u8": 5, "u32": 7, "f32": 9, "f64": 10, "c64": 12, "c128": 13}
+_POOL_LIMIT, _POOL_BYTES = 8, 1 << 26  # handles kept per thread, and the largest block kept
+_ZEROS = (ctypes.c_int32 * 2)(0, 0)
+
+
+class _Pooled(_ll.Array):
+    """A host handle from the thread's pool: resized (the host keeps the block where it can) rather
+    than allocated and filled afresh on every call, so large arrays cost one copy each way."""
+
+    def __init__(self, a, element, dims):
+        self.dtype, self.dims, self.code = a.dtype, dims, _TYPE_CODES[element]
+        spare = _cells.__dict__.setdefault("spare", [])
+        self.h = spare.pop() if spare else _ct_handle(_ll.twrt.TWRTNewArray(a.dtype.itemsize, dims, _ZEROS))
+        if self.h is None or _ll.twrt.HostResizeBlock(self.code, dims, ctypes.byref(self.h), a.size) != 0:
+            self.release()
+            raise MemoryError("the host could not allocate the array")
+        shape = a.shape if dims == 2 else (a.size,)
+        ctypes.memmove(self._block(), (ctypes.c_int32 * dims)(*shape), 4 * dims)
+        if a.size:
+            ctypes.memmove(self._data(), a.ctypes.data, a.nbytes)
+
+    def release(self):
+        h, self.h = self.h, None
+        if not h:
+            return
+        spare = _cells.__dict__.setdefault("spare", [])
+        code, size = ctypes.c_int32(), ctypes.c_int64()
+        _ll.twrt.TWRTBlockInfo(h, ctypes.byref(code), ctypes.byref(size))
+        if len(spare) < _POOL_LIMIT and size.value <= _POOL_BYTES:
+            spare.append(h)
+        else:
+            _ll.twrt.HostDisposeHandle(h)
+
+
+def _release(handle):
+    if isinstance(handle, _Pooled):
+        handle.release()
+
+
+def _ct_handle(h):
+    return ctypes.c_void_p(h) if h else None
+
+
 def _to_handle(value, element, dims):
     a = np.asarray(value, dtype=_dtype(element))
     if dims == 2:
         a = np.atleast_2d(a)
         if a.ndim != 2:
             raise ValueError(f"expected a 2-D array, got {a.ndim} dimensions")
+    if element in _TYPE_CODES:
+        return _Pooled(np.ascontiguousarray(a), element, dims)
     return _ll.Array(a, dims=dims)
 
 
@@ -93,7 +138,7 @@ def _build(row, pyname):
     words = signature.split()
     result, args = words[0], [Arg(w) for w in words[1:]]
     env = {"_ll": _ll, "_np": np, "_ct": ctypes, "_check": _check, "_to_handle": _to_handle, "_cell": _cell,
-           "_dtype": _dtype, "_fn": getattr(_ll.lib, name)}
+           "_dtype": _dtype, "_fn": getattr(_ll.lib, name), "_release": _release}
     params, before, call, after, outputs = [], [], [], [], []
     counted = {a.kind.split(".")[3] for a in args if a.head == "buf"}
     status_var = None
@@ -102,7 +147,7 @@ def _build(row, pyname):
         if a.head in ("h1", "h2"):
             dims = 2 if a.head == "h2" else 1
             if a.direction == "out":
-                before.append(f"{v} = _ll.empty(_dtype({a.element!r}), {dims})")
+                before.append(f"{v} = _to_handle(_np.zeros((0,) * {dims}, _dtype({a.element!r})), {a.element!r}, {dims})")
             else:
                 params.append(a.name)
                 before.append(f"{v} = _to_handle({a.name}, {a.element!r}, {dims})")
@@ -177,29 +222,37 @@ def _build(row, pyname):
         else:
             raise ValueError(f"{name}: kind {a.kind} has no Python form")
 
-    lines = [f"def {pyname}({', '.join(params)}):"]
-    lines += ["    " + b for b in before]
+    handles = [f"_a{i}" for i, a in enumerate(args) if a.head in ("h1", "h2")]
+    handles += [f"_k{i}_{j}" for i, a in enumerate(args) if a.head == "rec" and a.direction == "in"
+                for j, f in enumerate(_record_type(a.kind)[1]) if f.startswith("h")]
+    body = []
     if result == "f64":
         env["_fn"].restype = ctypes.c_double
-        lines.append(f"    _r = _fn({', '.join(call)})")
+        body.append(f"_r = _fn({', '.join(call)})")
         outputs.insert(0, ("result", "_r"))
     elif result == "void":
         env["_fn"].restype = None
-        lines.append(f"    _fn({', '.join(call)})")
+        body.append(f"_fn({', '.join(call)})")
     else:
-        lines.append(f"    _r = _fn({', '.join(call)})")
+        body.append(f"_r = _fn({', '.join(call)})")
     if style in ("ptr", "both") and status_var:
-        lines.append(f"    _check({status_var}.value, {name!r})")
+        body.append(f"_check({status_var}.value, {name!r})")
     elif style in ("ret", "both"):
-        lines.append(f"    _check(_r, {name!r})")
-    lines += ["    " + x for x in after]
+        body.append(f"_check(_r, {name!r})")
     if not outputs:
-        lines.append("    return None")
+        body.append("return None")
     elif len(outputs) == 1:
-        lines.append(f"    return {outputs[0][1]}")
+        body.append(f"return {outputs[0][1]}")
     else:
         env["_T"] = collections.namedtuple(pyname + "_result", [o[0] for o in outputs])
-        lines.append(f"    return _T({', '.join(o[1] for o in outputs)})")
+        body.append(f"return _T({', '.join(o[1] for o in outputs)})")
+    lines = [f"def {pyname}({', '.join(params)}):"]
+    for h in handles:  # so that the finally clause sees every name, whatever failed first
+        lines.append(f"    {h} = None")
+    lines.append("    try:")
+    lines += ["        " + b for b in before + body]
+    lines.append("    finally:")
+    lines += [f"        _release({h})" for h in handles] or ["        pass"]
     return "\n".join(lines), env, params, outputs
 
 
