@@ -479,7 +479,7 @@ inline std::vector<Choice> Variations(const Arg& arg) {
     static const int32_t lens[] = {4, 0, 1, -1, 2, 3, 7, 16, kMin};
     static const double f64s[] = {0.5, 0, 1, -1, 2.5, -0.5, 1e-300, 1e308, -1e308, kQuietNaN, kInf, -kInf, 100};
     static const int32_t counts[] = {0, 1, 2, 3, 5, 10, 17};
-    static const int32_t shapes[][2] = {{0, 0}, {0, 4}, {4, 0}, {1, 1}, {1, 4}, {4, 1}, {2, 3}, {3, 2}, {5, 5}};
+    static const int32_t shapes[][2] = {{0, 0}, {0, 4}, {4, 0}, {1, 1}, {1, 4}, {4, 1}, {2, 3}, {3, 2}, {3, 3}, {5, 5}};
     static const int32_t cubes[][3] = {{0, 0, 0}, {4, 4, 0}, {1, 1, 1}, {3, 3, 3}, {2, 4, 4}, {5, 3, 6}, {6, 5, 3}};
     std::vector<Choice> v(1);
     // What varies: the scalar itself, the pointee of an input pointer, or the fields of an input
