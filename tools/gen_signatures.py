@@ -47,11 +47,11 @@ def parse_kind(text):
     text = text.rstrip("?")
     k = {"nullable": nullable, "elem": "None", "elem_bytes": 0, "dir": "None", "fields": [],
          "rec_bytes": 0, "ref": ""}
-    m = re.fullmatch(r"h([12])\.(\w+)\.(\w+)", text)
+    m = re.fullmatch(r"h([123])\.(\w+)\.(\w+)", text)
     if m:
         e = elem(m.group(2))
         k.update(kind="H" + m.group(1), elem=e[0], elem_bytes=e[1], dir=direction(m.group(3)),
-                 ctype="Array%sDHandle" % m.group(1))
+                 ctype="Array%sDHandle" % m.group(1) if m.group(1) != "3" else "NumericHandle")
         return k
     if text in ("i32", "len"):
         k.update(kind="I32" if text == "i32" else "Len", ctype="int32_t")
@@ -226,7 +226,7 @@ def arg_init(a):
 
 def accessor(i, a):
     k = a["kind"]
-    if k in ("H1", "H2"):
+    if k in ("H1", "H2", "H3"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
         return "s.I(%d)" % i if a["ctype"] == "int32_t" else "static_cast<%s>(s.I(%d))" % (a["ctype"], i)

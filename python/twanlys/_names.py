@@ -12,7 +12,8 @@ def snake(name, marks=True):
     base = re.sub(r"^TW_", "", name)
     if marks:
         base = re.sub(r"(_head|_H|CIN|H)(?=(_?\d+)?(_IDP)?$)", "", base)
-    base = re.sub(r"([a-z0-9])([A-Z])", r"\1_\2", base)
+    base = re.sub(r"([a-z])([A-Z])", r"\1_\2", base)
+    base = re.sub(r"([0-9])([A-Z][a-z])", r"\1_\2", base)
     base = re.sub(r"([A-Z]+)([A-Z][a-z])", r"\1_\2", base)
     base = re.sub(r"_+", "_", base).strip("_").lower()
     return base + "_" if keyword.iskeyword(base) else base

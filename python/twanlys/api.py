@@ -82,6 +82,19 @@ class _Pooled(_ll.Array):
             _ll.twrt.HostDisposeHandle(h)
 
 
+class _Cube(_ll.Array):
+    """A 3-D block (three dimension words, then the elements), which the host makes as raw bytes."""
+
+    def __init__(self, a):
+        self.dtype, self.dims = a.dtype, 3
+        self.h = ctypes.c_void_p(_ll.twrt.HostNewHandle(12 + a.nbytes))
+        if not self.h:
+            raise MemoryError("the host could not allocate the array")
+        ctypes.memmove(self._block(), (ctypes.c_int32 * 3)(*a.shape), 12)
+        if a.size:
+            ctypes.memmove(self._data(), a.ctypes.data, a.nbytes)
+
+
 def _release(handle):
     if isinstance(handle, _Pooled):
         handle.release()
@@ -93,10 +106,12 @@ def _ct_handle(h):
 
 def _to_handle(value, element, dims):
     a = np.asarray(value, dtype=_dtype(element))
-    if dims == 2:
-        a = np.atleast_2d(a)
-        if a.ndim != 2:
-            raise ValueError(f"expected a 2-D array, got {a.ndim} dimensions")
+    if dims >= 2:
+        a = np.atleast_2d(a) if dims == 2 else a
+        if a.ndim != dims:
+            raise ValueError(f"expected a {dims}-D array, got {a.ndim} dimensions")
+    if dims == 3:
+        return _Cube(np.ascontiguousarray(a))
     if element in _TYPE_CODES:
         return _Pooled(np.ascontiguousarray(a), element, dims)
     return _ll.Array(a, dims=dims)
@@ -144,8 +159,8 @@ def _build(row, pyname):
     status_var = None
     for i, a in enumerate(args):
         v = f"_a{i}"
-        if a.head in ("h1", "h2"):
-            dims = 2 if a.head == "h2" else 1
+        if a.head in ("h1", "h2", "h3"):
+            dims = int(a.head[1])
             if a.direction == "out":
                 before.append(f"{v} = _to_handle(_np.zeros((0,) * {dims}, _dtype({a.element!r})), {a.element!r}, {dims})")
             else:
@@ -222,7 +237,7 @@ def _build(row, pyname):
         else:
             raise ValueError(f"{name}: kind {a.kind} has no Python form")
 
-    handles = [f"_a{i}" for i, a in enumerate(args) if a.head in ("h1", "h2")]
+    handles = [f"_a{i}" for i, a in enumerate(args) if a.head in ("h1", "h2", "h3")]
     handles += [f"_k{i}_{j}" for i, a in enumerate(args) if a.head == "rec" and a.direction == "in"
                 for j, f in enumerate(_record_type(a.kind)[1]) if f.startswith("h")]
     body = []

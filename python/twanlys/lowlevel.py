@@ -22,6 +22,8 @@ twrt, lib = load()
 twrt.TWRTNewArray.restype = ctypes.c_void_p
 twrt.TWRTNewArray.argtypes = [ctypes.c_int32, ctypes.c_int32, ctypes.POINTER(ctypes.c_int32)]
 twrt.HostDisposeHandle.argtypes = [ctypes.c_void_p]
+twrt.HostNewHandle.restype = ctypes.c_void_p
+twrt.HostNewHandle.argtypes = [ctypes.c_size_t]
 twrt.TWRTSetPlacement.argtypes = [ctypes.c_int32]
 twrt.TWRTFailResizeAt.argtypes = [ctypes.c_int32]
 twrt.TWRTResizeCount.restype = ctypes.c_int64
@@ -73,7 +75,7 @@ class Array:
         out = np.empty(n, dtype=dtype)
         if n:
             ctypes.memmove(out.ctypes.data, self._data(), out.nbytes)
-        return out.reshape(shape if self.dims == 2 else (n,))
+        return out.reshape(shape if self.dims >= 2 else (n,))
 
 
 def array(a, dtype=np.float64):

@@ -160,6 +160,9 @@ Status PoissonNoise(double* y, int32_t n, double mean, RandomState* st) {
     const double sq = std::sqrt(2.0 * mean);
     const double lnM = std::log(mean);
     const double g = mean * lnM - LnGammaFunc(mean + 1.0);
+    // Past about 1e305 (and at infinity) the envelope overflows: t turns NaN, which the test
+    // below would accept, giving inf or NaN samples as if they were draws.
+    if (!std::isfinite(sq) || !std::isfinite(g)) return NoConvergenceErr;
     Rejections rej(st);
     for (int32_t k = 0; k < n; ++k) {
         double em, yt, t;

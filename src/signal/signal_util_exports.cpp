@@ -94,10 +94,16 @@ Status ReadSettings(Frame& f, Handle level, Handle hysteresis, Handle slope, Tri
     return s;
 }
 
+// A failed resize (the host's own code, or a failed aligned copy) is out of memory.
+template <class T>
+Status ResizeOut(Frame& f, Handle& h, int32_t n, T** data) {
+    return f.Resize(h, n, data) == 0 ? 0 : OutOfMemoryErr;
+}
+
 // The per-channel outputs of both triggers, zero-filled.
 Status ResizeCounts(Frame& f, Handle& counts, Handle& found, int32_t rows, int32_t** c, int32_t** fd) {
-    Status s = f.Resize(counts, rows, c);
-    if (s == 0) s = f.Resize(found, rows, fd);
+    Status s = ResizeOut(f, counts, rows, c);
+    if (s == 0) s = ResizeOut(f, found, rows, fd);
     if (s == 0)
         for (int32_t i = 0; i < rows; ++i) (*c)[i] = (*fd)[i] = 0;
     return s;
@@ -168,9 +174,9 @@ TW_API int32_t Triggerh(Array2DHandle x, Array1DHandle level, Array1DHandle prev
     if (s == 0) s = ReadSettings(f, level, hysteresis, slope, &t);
     int32_t *idx = nullptr, *cnt = nullptr, *fnd = nullptr;
     double* lst = nullptr;
-    if (s == 0) s = f.Resize(indices, static_cast<int32_t>(cells), &idx);
+    if (s == 0) s = ResizeOut(f, indices, static_cast<int32_t>(cells), &idx);
     if (s == 0) s = ResizeCounts(f, counts, found, d.rows, &cnt, &fnd);
-    if (s == 0) s = f.Resize(last, d.rows, &lst);
+    if (s == 0) s = ResizeOut(f, last, d.rows, &lst);
     if (s == 0) {
         for (int64_t i = 0; i < cells; ++i) idx[i] = 0;
         for (int32_t i = 0; i < d.rows; ++i) lst[i] = 0;
@@ -206,8 +212,8 @@ TW_API int32_t Triggerh_86(Array2DHandle x, Array1DHandle level, Array1DHandle a
         for (int32_t c = 0; s == 0 && c < d.rows; ++c) flags[c] = c < Count(armed) ? in[c] : 0;
     }
     int32_t *arm = nullptr, *idx = nullptr, *cnt = nullptr, *fnd = nullptr;
-    if (s == 0) s = f.Resize(armed, d.rows, &arm);
-    if (s == 0) s = f.Resize2D(indices, d.rows, width, &idx);
+    if (s == 0) s = ResizeOut(f, armed, d.rows, &arm);
+    if (s == 0 && f.Resize2D(indices, d.rows, width, &idx) != 0) s = OutOfMemoryErr;
     if (s == 0) s = ResizeCounts(f, counts, found, d.rows, &cnt, &fnd);
     if (s == 0) {
         for (int32_t c = 0; c < d.rows; ++c) arm[c] = flags[c];

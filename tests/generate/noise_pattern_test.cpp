@@ -218,6 +218,17 @@ TEST(NoiseAndPatterns, ZeroRecordCannotHangTheRejectionSamplers) {
     EXPECT_EQ(y.vec(), V(3, 40.0));
 }
 
+// A mean whose envelope overflows cannot be sampled; it must not pass inf or NaN off as draws.
+TEST(NoiseAndPatterns, PoissonRefusesAMeanBeyondTheEnvelope) {
+    // sqrt(2 m) overflows above about 9e307, m ln m above about 2.5e305.
+    for (const double mean : {1e306, 1e308, std::numeric_limits<double>::infinity()}) {
+        Out y{1, 2};
+        RandomState st{1, 2, 3};
+        EXPECT_EQ(PoissonNoiseH(y.h(), 3, mean, -1, &st), NoConvergenceErr) << mean;
+        EXPECT_EQ(y.size(), 0);
+    }
+}
+
 TEST(NoiseAndPatterns, UnipolarSquarePulseAndImpulse) {
     struct Case {
         int32_t n;

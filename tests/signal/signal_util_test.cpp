@@ -189,6 +189,29 @@ TEST_P(SignalUtil, TriggersRefuseANegativeStoredCount) {
     EXPECT_EQ(last.size(), 0);
 }
 
+TEST_P(SignalUtil, TriggersReportAFailedResizeAsOutOfMemory) {
+    const Array2D<double> x(2, 3, {0, 2, 0, 2, 0, 2});
+    const Array1D<double> level{1, 1}, hysteresis, previous{0, 0};
+    const Array1D<int32_t> slope{1, 0};
+    // Triggerh_86 resizes armed, indices, counts, found; Triggerh indices, counts, found, last.
+    for (int32_t k = 1; k <= 4; ++k) {
+        Array1D<int32_t> armed{0, 0}, counts, found, packed;
+        Array2D<int32_t> indices;
+        Array1D<double> last;
+        TWRTFailResizeAt(k);
+        const int32_t s86 = Triggerh_86(x.h(), level.h(), armed.h(), hysteresis.h(), slope.h(), 2, indices.h(),
+                                        counts.h(), found.h());
+        TWRTFailResizeAt(k);
+        int32_t s = 0;
+        Triggerh(x.h(), level.h(), previous.h(), hysteresis.h(), slope.h(), 2, packed.h(), counts.h(), found.h(),
+                 last.h(), &s);
+        TWRTFailResizeAt(0);
+        EXPECT_EQ(s86, OutOfMemoryErr) << "resize " << k;
+        EXPECT_EQ(s, OutOfMemoryErr) << "resize " << k;
+        EXPECT_EQ(armed.size() + indices.rows() + packed.size() + counts.size() + found.size() + last.size(), 0);
+    }
+}
+
 struct Pulse {
     double top, base, amplitude, delay, width, slew, fall, rise, overshoot, undershoot;
     int32_t status;

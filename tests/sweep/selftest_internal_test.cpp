@@ -72,6 +72,30 @@ TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t) 
     return f.Finish(s);
 }
 
+TW_EXTERN_C void SweepFakeBufAlignment(int32_t n, double* x) {
+    const double v = reinterpret_cast<uintptr_t>(x) % alignof(double) == 0 ? 1.0 : 2.0;
+    if (n > 0) std::memcpy(x, &v, sizeof v);
+}
+TW_EXTERN_C int32_t SweepFakeCubeWrites(NumericHandle data, double* sum) {
+    Frame f;
+    f.Result(sum);
+    int32_t d[3];
+    std::memcpy(d, *data, sizeof d);
+    if (d[0] < 1 || d[1] < 1 || d[2] < 1) return f.Finish(EmptyArrayErr);
+    auto* x = static_cast<unsigned char*>(*data) + sizeof d;
+    *sum = 0;
+    for (int32_t k = 0; k < d[0] * d[1] * d[2]; ++k) {
+        double v;
+        std::memcpy(&v, x + k * sizeof v, sizeof v);
+        *sum += v;
+    }
+    double first;
+    std::memcpy(&first, x, sizeof first);
+    first *= 2;
+    std::memcpy(x, &first, sizeof first);
+    return f.Finish(0);
+}
+
 namespace {
 
 const sweep::Row& Fake(const char* name) {
@@ -109,6 +133,7 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
         {"SweepFakeNoNaN", 0, "mean is not NaN on failure"},
         {"SweepFakeStrangeStatus", 4, "status -20000 is not in status.h"},
         {"SweepFakeIgnoresFlag", 4, "y is an input but was written"},
+        {"SweepFakeCubeWrites", 4, "data is an input but was written"},
     };
     for (const auto& c : cases) {
         const sweep::Row& row = Fake(c.fake);
@@ -123,6 +148,11 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
     }
     if (ownArena) DisableAnalysisWorkspaceH(&e), UninitializeAnalysisWorkspaceH(&e);
     EXPECT_EQ(int32_t{e.code}, 0);
+}
+
+TEST(SweepSelfTest, ABarePointerSitsWhereAPackedBlockWouldPutIt) {
+    sweep::Tally tally;
+    EXPECT_TRUE(Mentions(sweep::SweepRow(Fake("SweepFakeBufAlignment"), 2, &tally), "packed and aligned blocks give"));
 }
 
 TEST(SweepSelfTest, ACallCountDiffersBetweenThreads) {

@@ -18,7 +18,7 @@
 
 namespace sweep {
 
-enum class Kind : uint8_t { H1, H2, I32, Len, F64, P, Status, Cluster, Cell, Idp, Rec, Buf, Opaque };
+enum class Kind : uint8_t { H1, H2, I32, Len, F64, P, Status, Cluster, Cell, Idp, Rec, Buf, Opaque, H3 };
 enum class Elem : uint8_t { None, I32, U8, U32, F32, F64, C64, C128, Len, Bytes };
 enum class Dir : uint8_t { None, In, Out, Io };
 enum class Style : uint8_t { Ret, Ptr, Both, Cluster, None };
@@ -75,6 +75,7 @@ struct Row {
 struct Choice {
     int32_t rows = 4;  // handles: count (1-D) or rows
     int32_t cols = 4;
+    int32_t depth = 4;  // 3-D handles
     uint8_t fill = 0;  // data pattern, see Fill()
     int32_t i = 0;     // i32 scalars and pointees, i32 record fields
     double d = 0.5;    // f64 scalars and pointees, f64 record fields
@@ -88,7 +89,8 @@ inline constexpr int32_t kStatusSentinel = 0x5A5A5A5A;
 inline constexpr unsigned char kOutByte = 0xA5;
 inline constexpr int kPatterns = 10;
 
-inline bool IsHandle(Kind k) { return k == Kind::H1 || k == Kind::H2; }
+inline bool IsHandle(Kind k) { return k == Kind::H1 || k == Kind::H2 || k == Kind::H3; }
+inline int Dims(Kind k) { return k == Kind::H3 ? 3 : k == Kind::H2 ? 2 : 1; }
 inline bool Writes(Dir d) { return d == Dir::Out || d == Dir::Io; }
 
 // Values of the data patterns: 0 moderate distinct values, 1 zeros, 2 one NaN, 3 one +Inf,
@@ -200,14 +202,14 @@ public:
     int32_t I(int a) const { return slot_[a].i; }
     double D(int a) const { return slot_[a].d; }
     void** Cell(int a) const { return slot_[a].cell; }
-    void* Ptr(int a) { return slot_[a].null ? nullptr : slot_[a].bytes.data(); }
+    void* Ptr(int a) { return slot_[a].null ? nullptr : slot_[a].bytes.data() + slot_[a].offset; }
     void* Opaque(int) const { return nullptr; }
 
     // Everything an input may not change, and a digest of everything a call leaves.
     // `inputsOnly` leaves out a handle inside a record that the export may work on.
     std::vector<unsigned char> Snapshot(int a, bool inputsOnly = false) const {
         const Slot& s = slot_[a];
-        std::vector<unsigned char> v(s.bytes);
+        std::vector<unsigned char> v(s.bytes.begin() + s.offset, s.bytes.end());
         if (s.h != nullptr) Append(&v, s.h);
         bool nestedIn = true;
         for (int32_t f = 0; f < row_.args[a].nFields; ++f)
@@ -241,12 +243,12 @@ public:
     std::vector<HandleView> Handles(int a) const {
         const Arg& arg = row_.args[a];
         const Slot& s = slot_[a];
-        if (IsHandle(arg.kind)) return {{s.h, arg.elem, arg.elemBytes, arg.dir, arg.kind == Kind::H2 ? 2 : 1}};
+        if (IsHandle(arg.kind)) return {{s.h, arg.elem, arg.elemBytes, arg.dir, Dims(arg.kind)}};
         if (arg.kind == Kind::Rec && s.nested != nullptr && !s.null)
             for (int32_t f = 0; f < arg.nFields; ++f)
                 if (IsHandle(arg.fields[f].kind))
                     return {{s.nested, arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
-                             arg.fields[f].kind == Kind::H2 ? 2 : 1}};
+                             Dims(arg.fields[f].kind)}};
         return {};
     }
     bool IsNull(int a) const { return slot_[a].null; }
@@ -261,6 +263,7 @@ private:
         void** cell = nullptr;
         bool null = false;
         std::vector<unsigned char> bytes;  // pointee or record; 16-byte aligned by the allocator
+        size_t offset = 0;                 // where a bare pointer's elements start in `bytes`
     };
 
     static void Append(std::vector<unsigned char>* v, void** h) {
@@ -269,10 +272,14 @@ private:
     }
 
     static void** MakeArray(Kind kind, Elem e, int32_t elemBytes, const Choice& c) {
-        const int dims = kind == Kind::H2 ? 2 : 1;
-        const int32_t shape[2] = {c.rows, c.cols};
-        void** h = TWRTNewArray(elemBytes, dims, shape);
-        const int64_t n = dims == 2 ? int64_t{std::max(c.rows, 0)} * std::max(c.cols, 0) : std::max(c.rows, 0);
+        const int dims = Dims(kind);
+        const int32_t shape[3] = {c.rows, c.cols, c.depth};
+        int64_t n = 1;
+        for (int d = 0; d < dims; ++d) n *= std::max(shape[d], 0);
+        // The host makes 1-D and 2-D arrays; a 3-D block is a plain one with three words.
+        void** h = dims < 3 ? TWRTNewArray(elemBytes, dims, shape)
+                            : HostNewHandle(static_cast<size_t>(12 + n * elemBytes));
+        if (dims == 3) std::memcpy(*h, shape, 12);
         auto* data = static_cast<unsigned char*>(*h) + 4 * dims;
         FillElements(data, e, elemBytes, n, c.fill);
         for (int64_t k = 0; !c.raw.empty() && k < n * elemBytes; ++k) data[k] = c.raw[static_cast<size_t>(k) % c.raw.size()];
@@ -285,7 +292,8 @@ private:
         s.null = c.null && arg.nullable;
         switch (arg.kind) {
             case Kind::H1:
-            case Kind::H2: s.h = MakeArray(arg.kind, arg.elem, arg.elemBytes, c); break;
+            case Kind::H2:
+            case Kind::H3: s.h = MakeArray(arg.kind, arg.elem, arg.elemBytes, c); break;
             case Kind::I32:
             case Kind::Len: s.i = c.i; break;
             case Kind::F64: s.d = c.d; break;
@@ -321,8 +329,10 @@ private:
                 break;
             case Kind::Buf: {
                 const int32_t n = std::clamp(slot_[arg.countArg].i, 0, 4096);
-                s.bytes.assign(static_cast<size_t>(n) * static_cast<size_t>(arg.elemBytes) + 1, 0);
-                FillElements(s.bytes.data(), arg.elem, arg.elemBytes, n, c.fill);
+                // A bare pointer into a packed host block may be only 4-byte aligned.
+                s.offset = TWRTPlacement() == 0 ? 4 : 0;
+                s.bytes.assign(s.offset + static_cast<size_t>(n) * static_cast<size_t>(arg.elemBytes) + 1, 0);
+                FillElements(s.bytes.data() + s.offset, arg.elem, arg.elemBytes, n, c.fill);
                 break;
             }
             case Kind::Opaque: break;
@@ -422,11 +432,12 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
             // Inputs stay as they were: handles, pointees and records.
             if (arg.dir == Dir::In && s.Snapshot(a, true) != before[a]) fault(name + " is an input but was written");
             for (const auto& h : s.Handles(a)) {
-                const int32_t n0 = Word(h.h, 0), n1 = h.dims == 2 ? Word(h.h, 1) : 1;
+                const int32_t n0 = Word(h.h, 0), n1 = h.dims >= 2 ? Word(h.h, 1) : 1;
+                const int32_t n2 = h.dims == 3 ? Word(h.h, 2) : 1;
                 if (h.dir == Dir::In) continue;
-                if (v.failed && !kept && (n0 != 0 || (h.dims == 2 && n1 != 0)))
+                if (v.failed && !kept && (n0 != 0 || (h.dims >= 2 && n1 != 0) || (h.dims == 3 && n2 != 0)))
                     fault(name + " not emptied on failure (status " + std::to_string(status) + ")");
-                if (n0 < 0 || n1 < 0) {
+                if (n0 < 0 || n1 < 0 || n2 < 0) {
                     if (Writes(h.dir) && !v.failed) fault(name + " has a negative dimension word");
                     continue;
                 }
@@ -434,7 +445,7 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
                 int32_t type = 0;
                 int64_t bytes = 0;
                 TWRTBlockInfo(h.h, &type, &bytes);
-                const int64_t need = 4 * h.dims + int64_t{n0} * n1 * h.elemBytes;
+                const int64_t need = 4 * h.dims + int64_t{n0} * n1 * n2 * h.elemBytes;
                 if (need > bytes) fault(name + " says " + std::to_string(n0) + " elements but the block is smaller");
                 if (type != 0 && TypeCode(h.elem) != 0 && type != TypeCode(h.elem))
                     fault(name + " resized with type code " + std::to_string(type));
@@ -471,7 +482,8 @@ inline std::vector<Choice> Variations(const Arg& arg) {
     static const int32_t lens[] = {4, 0, 1, -1, 2, 3, 7, 16, kMin};
     static const double f64s[] = {0.5, 0, 1, -1, 2.5, -0.5, 1e-300, 1e308, -1e308, kQuietNaN, kInf, -kInf, 100};
     static const int32_t counts[] = {0, 1, 2, 3, 5, 10, 17};
-    static const int32_t shapes[][2] = {{0, 0}, {0, 4}, {4, 0}, {1, 1}, {1, 4}, {4, 1}, {2, 3}, {3, 2}, {5, 5}};
+    static const int32_t shapes[][2] = {{0, 0}, {0, 4}, {4, 0}, {1, 1}, {1, 4}, {4, 1}, {2, 3}, {3, 2}, {3, 3}, {5, 5}};
+    static const int32_t cubes[][3] = {{0, 0, 0}, {4, 4, 0}, {1, 1, 1}, {3, 3, 3}, {2, 4, 4}, {5, 3, 6}, {6, 5, 3}};
     std::vector<Choice> v(1);
     // What varies: the scalar itself, the pointee of an input pointer, or the fields of an input
     // record; the shape and data of a handle, also of one inside a record.
@@ -498,6 +510,8 @@ inline std::vector<Choice> Variations(const Arg& arg) {
         for (int32_t n : counts) v.push_back(Choice{.rows = n});
     if (handle == Kind::H2)
         for (const auto& s : shapes) v.push_back(Choice{.rows = s[0], .cols = s[1]});
+    if (handle == Kind::H3)
+        for (const auto& s : cubes) v.push_back(Choice{.rows = s[0], .cols = s[1], .depth = s[2]});
     if (handle != Kind::Opaque && (arg.dir != Dir::Out || arg.kind == Kind::Rec))
         for (uint8_t p = 1; p < kPatterns; ++p) v.push_back(Choice{.fill = p});
     if (arg.nullable) v.push_back(Choice{.null = true});
