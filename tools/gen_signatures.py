@@ -66,11 +66,12 @@ def parse_kind(text):
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
         e = elem(m.group(2))
-        if e[2] is None:
-            raise RowError("pointer to %r: only i32, len, u8, u32, f32, f64" % m.group(2))
+        base = "ComplexDouble" if e[0] == "C128" else e[2]
+        if base is None:
+            raise RowError("pointer to %r: only i32, len, u8, u32, f32, f64, c128" % m.group(2))
         const = m.group(1) == "cp"
         k.update(kind="P", elem=e[0], elem_bytes=e[1], dir=direction(m.group(3)),
-                 ctype=("const " if const else "") + e[2] + "*")
+                 ctype=("const " if const else "") + base + "*")
         return k
     if text == "status":
         k.update(kind="Status", elem="I32", elem_bytes=4, dir="Out", ctype="int32_t*")

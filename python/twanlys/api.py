@@ -179,6 +179,13 @@ def _build(row, pyname):
         elif a.head in _CTYPES:
             params.append(a.name)
             call.append(f"_ct.{_CTYPES[a.head].__name__}({a.name})")
+        elif a.head in ("p", "cp") and a.element == "c128":
+            # ctypes has no complex scalar: one complex128 element stands in for it
+            params.append(a.name)
+            before.append(f"{v} = _np.array([{a.name}], _np.complex128)")
+            if a.direction == "io":
+                outputs.append((a.name, f"complex({v}[0])"))
+            call.append(f"{v}.ctypes.data_as(_ct.c_void_p)")
         elif a.head in ("p", "cp"):
             ct = _CTYPES[a.element].__name__
             if a.direction == "out":

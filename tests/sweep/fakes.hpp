@@ -8,6 +8,7 @@ TW_EXTERN_C int32_t SweepFakeLeaky(Array1DHandle x, Array1DHandle y);
 TW_EXTERN_C int32_t SweepFakeNoShrink(Array1DHandle x, Array1DHandle y);
 TW_EXTERN_C int32_t SweepFakeWritesInput(Array1DHandle x, double* mean, int32_t* status);
 TW_EXTERN_C int32_t SweepFakeNoNaN(Array1DHandle x, double* mean, int32_t* status);
+TW_EXTERN_C int32_t SweepFakeHalfZero(Array1DHandle x, ComplexDouble* z, int32_t* status);
 TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x);
 TW_EXTERN_C int32_t SweepFakeCounter(Array1DHandle x, Array1DHandle y);
 TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t coefficientsOnly);

@@ -60,6 +60,11 @@ TW_EXTERN_C int32_t SweepFakeWritesInput(Array1DHandle x, double* mean, int32_t*
 TW_EXTERN_C int32_t SweepFakeNoNaN(Array1DHandle x, double* mean, int32_t* status) {
     return ToPointer(status, Mean(x, mean, false, false));
 }
+TW_EXTERN_C int32_t SweepFakeHalfZero(Array1DHandle x, ComplexDouble* z, int32_t* status) {
+    const Status s = Count(x) > 0 ? 0 : EmptyArrayErr;
+    if (s != 0) z->re = 0;
+    return ToPointer(status, s);
+}
 TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x) { return Count(x) > 0 ? -20000 : EmptyArrayErr; }
 TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t) {
     Frame f;
@@ -131,6 +136,7 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
         {"SweepFakeNoShrink", 0, "y not emptied on failure"},
         {"SweepFakeWritesInput", 4, "x is an input but was written"},
         {"SweepFakeNoNaN", 0, "mean is not NaN on failure"},
+        {"SweepFakeHalfZero", 0, "z imag is not 0 on failure"},
         {"SweepFakeStrangeStatus", 4, "status -20000 is not in status.h"},
         {"SweepFakeIgnoresFlag", 4, "y is an input but was written"},
         {"SweepFakeCubeWrites", 4, "data is an input but was written"},

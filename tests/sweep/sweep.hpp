@@ -303,6 +303,7 @@ private:
                 s.bytes.assign(static_cast<size_t>(arg.elemBytes), kOutByte);
                 if (arg.dir != Dir::Out) {
                     if (arg.elem == Elem::F64) std::memcpy(s.bytes.data(), &c.d, 8);
+                    else if (arg.elem == Elem::C128) { const double z[2] = {c.d, -c.d}; std::memcpy(s.bytes.data(), z, 16); }
                     else if (arg.elem == Elem::F32) { const auto f = static_cast<float>(c.d); std::memcpy(s.bytes.data(), &f, 4); }
                     else if (arg.elem == Elem::U8) s.bytes[0] = static_cast<unsigned char>(c.i);
                     else std::memcpy(s.bytes.data(), &c.i, 4);
@@ -458,6 +459,8 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
                         fault(what + " is not " + (want == 0.0 ? "0" : "NaN") + " on failure");
                 };
                 if (arg.kind == Kind::P && arg.elem == Elem::F64) check(s.Pointee(a).data(), name);
+                if (arg.kind == Kind::P && arg.elem == Elem::C128)
+                    for (int part = 0; part < 2; ++part) check(s.Pointee(a).data() + 8 * part, name + (part ? " imag" : " real"));
                 if (arg.kind == Kind::Rec)
                     for (int32_t f = 0; f < arg.nFields; ++f)
                         if (arg.fields[f].kind == Kind::F64)
@@ -487,9 +490,10 @@ inline std::vector<Choice> Variations(const Arg& arg) {
     std::vector<Choice> v(1);
     // What varies: the scalar itself, the pointee of an input pointer, or the fields of an input
     // record; the shape and data of a handle, also of one inside a record.
-    bool ints = arg.kind == Kind::I32 || (arg.kind == Kind::P && arg.elem == Elem::I32);
+    bool ints = arg.kind == Kind::I32 || (arg.kind == Kind::P && (arg.elem == Elem::I32 || arg.elem == Elem::U8));
     bool lengths = arg.kind == Kind::Len || (arg.kind == Kind::P && arg.elem == Elem::Len);
-    bool reals = arg.kind == Kind::F64 || (arg.kind == Kind::P && (arg.elem == Elem::F64 || arg.elem == Elem::F32));
+    bool reals = arg.kind == Kind::F64 ||
+                 (arg.kind == Kind::P && (arg.elem == Elem::F64 || arg.elem == Elem::F32 || arg.elem == Elem::C128));
     Kind handle = IsHandle(arg.kind) ? arg.kind : Kind::Opaque;
     for (int32_t f = 0; arg.kind == Kind::Rec && f < arg.nFields; ++f) {
         ints = ints || arg.fields[f].kind == Kind::I32;
