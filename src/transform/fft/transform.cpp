@@ -233,16 +233,27 @@ Status FftRealInverse(const FftTable* t, double* in, double* out, ptrdiff_t inSt
 }
 
 void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out) {
-    // Centred, X[k] goes to (k + n/2) mod n, so X[0] is at n/2 for both parities: the frequencies
-    // up to the middle then fill the back, those above it the front. Each part is a plain run.
+    // Centred, X[k] goes to (k + n/2) mod n, so X[0] is at n/2 for both parities. The cells of one
+    // side (X[k], or its conjugate when centred) lie in the lower half of out's lanes and are
+    // written from h first; the other side is their mirror. h may thus be the upper half of out's
+    // lanes: the first pass writes below it (but for h[0], read beforehand), the second reads
+    // nothing of it.
     const int32_t half = (n - 1) / 2;
     const int32_t o = shift != 0 ? n / 2 : 0;
-    const int32_t up = shift != 0 ? o - n : 0;  // where X[k], k > n/2, goes: k + up
-    std::complex<double>* low = out + o;
-    low[0] = {h[0], 0.0};
-    for (int32_t k = 1; k <= half; ++k) low[k] = {h[k], h[n - k]};
-    for (int32_t k = n - half; k < n; ++k) out[k + up] = {h[n - k], -h[k]};
-    if (n % 2 == 0) out[(n / 2 + o) % n] = {h[n / 2], 0.0};
+    const double h0 = h[0];
+    const double nyquist = n % 2 == 0 ? h[n / 2] : 0.0;
+    if (shift != 0) {
+        std::complex<double>* low = out + o;  // X[k] at low[k], its conjugate at low[-k]
+        for (int32_t k = 1; k <= half; ++k) low[-k] = {h[k], -h[n - k]};
+        for (int32_t k = 1; k <= half; ++k) low[k] = std::conj(low[-k]);
+        low[0] = {h0, 0.0};
+        if (n % 2 == 0) out[0] = {nyquist, 0.0};
+    } else {
+        for (int32_t k = 1; k <= half; ++k) out[k] = {h[k], h[n - k]};
+        for (int32_t k = 1; k <= half; ++k) out[n - k] = std::conj(out[k]);
+        out[0] = {h0, 0.0};
+        if (n % 2 == 0) out[n / 2] = {nyquist, 0.0};
+    }
 }
 
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out) {
