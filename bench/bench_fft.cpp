@@ -1,11 +1,20 @@
 // FFT speed beside FFTW (ESTIMATE and MEASURE plans), for the core transforms on a cached table
-// and for the exports' whole path (frame included). Run bench/fft_side_by_side.sh for the ratios
-// and NumPy's timings in the same session.
+// and for the exports' whole path (frame, cached table, resize of y, copies). Run
+// bench/fft_side_by_side.py for the ratios and NumPy's timings in the same session.
+//
+// `bench_bench_fft --calls <TwReal|TwComplex|TwExportReal|TwExportComplex> <n> <calls>` makes that
+// many calls and nothing else of note, for instruction counts under
+// `valgrind --tool=callgrind --toggle-collect=Measured`.
 #include <benchmark/benchmark.h>
 #include <fftw3.h>
 
 #include <cmath>
 #include <complex>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <functional>
+#include <memory>
 #include <vector>
 
 #include "transform/fft/fft.hpp"
@@ -26,55 +35,58 @@ void SetRate(benchmark::State& state, int64_t n) {
     state.SetItemsProcessed(state.iterations() * n);
 }
 
-void TwReal(benchmark::State& state) {
-    const int32_t n = static_cast<int32_t>(state.range(0));
+// One repeated call of each kind, set up for length n: the cores on their cached table, the
+// exports on a cached work cell with 64-byte aligned host blocks resized by the host's default.
+struct Case {
+    std::function<void()> call;
+    std::function<void()> release;
+};
+
+Case TwReal(int32_t n) {
     FftTable* t = tw::CreateFftTable(n);
-    std::vector<double> in(static_cast<size_t>(n)), out(in.size());
-    Fill(in.data(), in.size());
-    for (auto _ : state) {
-        tw::FftRealForward(t, in.data(), out.data(), 1, 1, n);
-        benchmark::DoNotOptimize(out.data());
-    }
-    tw::DestroyFftTable(t);
-    SetRate(state, n);
+    auto in = std::make_shared<std::vector<double>>(static_cast<size_t>(n));
+    auto out = std::make_shared<std::vector<double>>(in->size());
+    Fill(in->data(), in->size());
+    return {[=] { tw::FftRealForward(t, in->data(), out->data(), 1, 1, n); }, [=] { tw::DestroyFftTable(t); }};
 }
 
-void TwComplex(benchmark::State& state) {
-    const int32_t n = static_cast<int32_t>(state.range(0));
+Case TwComplex(int32_t n) {
     FftTable* t = tw::CreateFftTable(n);
-    std::vector<double> in(2 * static_cast<size_t>(n)), out(in.size());
-    Fill(in.data(), in.size());
+    auto in = std::make_shared<std::vector<double>>(2 * static_cast<size_t>(n));
+    auto out = std::make_shared<std::vector<double>>(in->size());
+    Fill(in->data(), in->size());
+    return {[=] {
+                double* i = in->data();
+                double* o = out->data();
+                tw::FftComplexForward(t, i, i + 1, o, o + 1, 2, 2, n);
+            },
+            [=] { tw::DestroyFftTable(t); }};
+}
+
+template <class In, class Export>
+Case TwExport(int32_t n, Export call) {
+    twrt::Placement aligned(true);
+    std::vector<In> v(static_cast<size_t>(n));
+    Fill(reinterpret_cast<double*>(v.data()), v.size() * sizeof(In) / sizeof(double));
+    auto x = std::make_shared<twrt::Array1D<In>>(v);
+    auto y = std::make_shared<twrt::Array1D<std::complex<double>>>(n);
+    auto cell = std::make_shared<void*>(nullptr);
+    return {[=] { call(x->h(), y->h(), cell.get()); }, [] { TWRTRunCleanups(2); }};
+}
+
+Case TwExportReal(int32_t n) { return TwExport<double>(n, ReQXFFTH); }
+Case TwExportComplex(int32_t n) { return TwExport<std::complex<double>>(n, CxQXFFTH); }
+
+template <Case (*Make)(int32_t)>
+void Run(benchmark::State& state) {
+    const int32_t n = static_cast<int32_t>(state.range(0));
+    const Case c = Make(n);
+    c.call();  // the exports build their table and size y on the first call, which is not timed
     for (auto _ : state) {
-        tw::FftComplexForward(t, in.data(), in.data() + 1, out.data(), out.data() + 1, 2, 2, n);
-        benchmark::DoNotOptimize(out.data());
+        c.call();
+        benchmark::ClobberMemory();
     }
-    tw::DestroyFftTable(t);
-    SetRate(state, n);
-}
-
-// The exports on a cached table, with 64-byte aligned host blocks.
-void TwExportReal(benchmark::State& state) {
-    const int32_t n = static_cast<int32_t>(state.range(0));
-    twrt::Placement aligned(true);
-    std::vector<double> v(static_cast<size_t>(n));
-    Fill(v.data(), v.size());
-    twrt::Array1D<double> x(v);
-    twrt::Array1D<std::complex<double>> y(n);
-    void* cell = nullptr;
-    for (auto _ : state) benchmark::DoNotOptimize(ReQXFFTH(x.h(), y.h(), &cell));
-    TWRTRunCleanups(2);
-    SetRate(state, n);
-}
-
-void TwExportComplex(benchmark::State& state) {
-    const int32_t n = static_cast<int32_t>(state.range(0));
-    twrt::Placement aligned(true);
-    std::vector<std::complex<double>> v(static_cast<size_t>(n));
-    Fill(reinterpret_cast<double*>(v.data()), 2 * v.size());
-    twrt::Array1D<std::complex<double>> x(v), y(n);
-    void* cell = nullptr;
-    for (auto _ : state) benchmark::DoNotOptimize(CxQXFFTH(x.h(), y.h(), &cell));
-    TWRTRunCleanups(2);
+    c.release();
     SetRate(state, n);
 }
 
@@ -110,20 +122,58 @@ void FftwComplex(benchmark::State& state) {
     RunPlan(state, p, in, out, n);
 }
 
+// TW_FFT_BENCH_SIZES="n,n,..." replaces the list.
 void Sizes(benchmark::internal::Benchmark* b) {
-    for (int64_t n : kSizes) b->Arg(n);
+    std::vector<int64_t> sizes = kSizes;
+    if (const char* list = std::getenv("TW_FFT_BENCH_SIZES")) {
+        sizes.clear();
+        for (char* end = nullptr;; list = end + 1) {
+            const long long n = std::strtoll(list, &end, 10);
+            if (end == list) break;
+            sizes.push_back(n);
+            if (*end != ',') break;
+        }
+    }
+    for (int64_t n : sizes) b->Arg(n);
     b->Unit(benchmark::kMicrosecond);
 }
 
-BENCHMARK(TwReal)->Apply(Sizes);
+BENCHMARK(Run<TwReal>)->Name("TwReal")->Apply(Sizes);
 BENCHMARK(FftwReal<FFTW_ESTIMATE>)->Apply(Sizes);
 BENCHMARK(FftwReal<FFTW_MEASURE>)->Apply(Sizes);
-BENCHMARK(TwExportReal)->Apply(Sizes);
-BENCHMARK(TwComplex)->Apply(Sizes);
+BENCHMARK(Run<TwExportReal>)->Name("TwExportReal")->Apply(Sizes);
+BENCHMARK(Run<TwComplex>)->Name("TwComplex")->Apply(Sizes);
 BENCHMARK(FftwComplex<FFTW_ESTIMATE>)->Apply(Sizes);
 BENCHMARK(FftwComplex<FFTW_MEASURE>)->Apply(Sizes);
-BENCHMARK(TwExportComplex)->Apply(Sizes);
+BENCHMARK(Run<TwExportComplex>)->Name("TwExportComplex")->Apply(Sizes);
 
 }  // namespace
 
-BENCHMARK_MAIN();
+// Kept out of line so that callgrind can count its instructions alone.
+extern "C" __attribute__((noinline)) void Measured(const void* c, long calls) {
+    for (long i = 0; i < calls; ++i) static_cast<const Case*>(c)->call();
+}
+
+int main(int argc, char** argv) {
+    if (argc == 5 && std::strcmp(argv[1], "--calls") == 0) {
+        const struct {
+            const char* name;
+            Case (*make)(int32_t);
+        } kinds[] = {{"TwReal", TwReal}, {"TwComplex", TwComplex}, {"TwExportReal", TwExportReal},
+                     {"TwExportComplex", TwExportComplex}};
+        for (const auto& k : kinds) {
+            if (std::strcmp(argv[2], k.name) != 0) continue;
+            const Case c = k.make(static_cast<int32_t>(std::atol(argv[3])));
+            c.call();  // the first call builds what later calls find cached
+            Measured(&c, std::atol(argv[4]));
+            c.release();
+            return 0;
+        }
+        std::fprintf(stderr, "unknown kind %s\n", argv[2]);
+        return 2;
+    }
+    benchmark::Initialize(&argc, argv);
+    benchmark::RunSpecifiedBenchmarks();
+    benchmark::Shutdown();
+    return 0;
+}

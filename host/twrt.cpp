@@ -14,6 +14,7 @@ namespace {
 struct Prefix {
     void* raw;
     size_t bytes;
+    size_t capacity;  // bytes the block may grow to where it stands
     int32_t dims;
     int32_t type;  // type code of the resize that made the block, 0 for a new array
 };
@@ -24,6 +25,9 @@ std::atomic<int64_t> g_allocs{0};
 std::atomic<int64_t> g_live{0};
 std::atomic<int32_t> g_failedTotal{-1};
 std::atomic<int32_t> g_aligned{0};
+std::atomic<int32_t> g_resizeMode{0};
+
+constexpr size_t kSlack = 128 + sizeof(Prefix);
 
 // Blocks may start at any 4-byte boundary, so the prefix is copied, never dereferenced in place.
 Prefix ReadPrefix(const void* block) {
@@ -32,26 +36,42 @@ Prefix ReadPrefix(const void* block) {
     return p;
 }
 
-void* AllocBlock(size_t bytes, int32_t dims, int32_t type = 0) {
+// Where the block of a raw allocation starts under the current placement.
+unsigned char* PlaceBlock(unsigned char* raw, int32_t dims) {
     const size_t header = dims == 2 ? 8 : 4;
-    const size_t slack = 128 + sizeof(Prefix);
-    auto* raw = static_cast<unsigned char*>(std::calloc(1, bytes + slack));
-    if (raw == nullptr) return nullptr;
-    unsigned char* data;
     if (g_aligned.load(std::memory_order_relaxed)) {
         auto at = reinterpret_cast<uintptr_t>(raw + sizeof(Prefix) + header + 63) & ~uintptr_t{63};
-        data = reinterpret_cast<unsigned char*>(at);
-    } else {
-        // The block starts 16-aligned, so 1-D element data sit at 4 mod 8.
-        auto at = reinterpret_cast<uintptr_t>(raw + sizeof(Prefix) + 15) & ~uintptr_t{15};
-        data = reinterpret_cast<unsigned char*>(at) + header;
+        return reinterpret_cast<unsigned char*>(at) - header;
     }
-    unsigned char* block = data - header;
-    const Prefix p{raw, bytes, dims, type};
+    // The block starts 16-aligned, so 1-D element data sit at 4 mod 8.
+    auto at = reinterpret_cast<uintptr_t>(raw + sizeof(Prefix) + 15) & ~uintptr_t{15};
+    return reinterpret_cast<unsigned char*>(at);
+}
+
+void* SetUpBlock(unsigned char* raw, size_t bytes, int32_t dims, int32_t type) {
+    unsigned char* block = PlaceBlock(raw, dims);
+    const Prefix p{raw, bytes, bytes + kSlack - static_cast<size_t>(block - raw), dims, type};
     std::memcpy(block - sizeof(Prefix), &p, sizeof p);
     g_allocs.fetch_add(1, std::memory_order_relaxed);
-    g_live.fetch_add(1, std::memory_order_relaxed);
     return block;
+}
+
+void* AllocBlock(size_t bytes, int32_t dims, int32_t type = 0, bool zeroed = true) {
+    void* raw = zeroed ? std::calloc(1, bytes + kSlack) : std::malloc(bytes + kSlack);
+    if (raw == nullptr) return nullptr;
+    g_live.fetch_add(1, std::memory_order_relaxed);
+    return SetUpBlock(static_cast<unsigned char*>(raw), bytes, dims, type);
+}
+
+// Grows a block that has no room where it stands, keeping its leading bytes and its placement.
+void* ReallocBlock(void* block, size_t bytes, int32_t type) {
+    const Prefix old = ReadPrefix(block);
+    const size_t offset = static_cast<size_t>(static_cast<unsigned char*>(block) - static_cast<unsigned char*>(old.raw));
+    auto* raw = static_cast<unsigned char*>(std::realloc(old.raw, bytes + kSlack));
+    if (raw == nullptr) return nullptr;
+    unsigned char* moved = PlaceBlock(raw, old.dims);
+    if (moved != raw + offset) std::memmove(moved, raw + offset, old.bytes);
+    return SetUpBlock(raw, bytes, old.dims, type);
 }
 
 void FreeBlock(void* block) {
@@ -131,15 +151,30 @@ int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int3
         return TWRTResizeFailed;
     const size_t header = dims == 2 ? 8 : 4;
     const size_t bytes = header + static_cast<size_t>(totalElements) * static_cast<size_t>(elem);
-    // Always move the block, so that a caller holding a stale element pointer is caught.
-    void* fresh = AllocBlock(bytes, dims, typeCode);
-    if (fresh == nullptr) return TWRTResizeFailed;
+    const int32_t mode = g_resizeMode.load(std::memory_order_relaxed);
     void* old = **handle;
-    if (old != nullptr) {
-        std::memcpy(fresh, old, std::min(bytes, ReadPrefix(old).bytes));
+    const Prefix before = old != nullptr ? ReadPrefix(old) : Prefix{};
+    void* block = nullptr;
+    if (old == nullptr || (mode & TWRTResizeMove)) {
+        // A fresh block every time, so that a caller holding a stale element pointer is caught.
+        block = AllocBlock(bytes, dims, typeCode, false);
+        if (block == nullptr) return TWRTResizeFailed;
+        if (old != nullptr) std::memcpy(block, old, std::min(bytes, before.bytes));
         FreeBlock(old);
+    } else if (bytes <= before.capacity) {
+        block = old;
+        Prefix p = before;
+        p.bytes = bytes;
+        p.type = typeCode;
+        std::memcpy(static_cast<unsigned char*>(block) - sizeof(Prefix), &p, sizeof p);
+    } else {
+        block = ReallocBlock(old, bytes, typeCode);
+        if (block == nullptr) return TWRTResizeFailed;
     }
-    **handle = fresh;
+    const size_t kept = std::max(before.bytes, header);
+    if ((mode & TWRTResizePoison) && bytes > kept)
+        std::memset(static_cast<unsigned char*>(block) + kept, kTWRTPoisonByte, bytes - kept);
+    **handle = block;
     return 0;
 }
 
@@ -190,6 +225,8 @@ int32_t TWRTBlockInfo(TWRTHandle handle, int32_t* typeCode, int64_t* bytes) {
 }
 int64_t TWRTResizeCount(void) { return g_resizes.load(std::memory_order_relaxed); }
 int64_t TWRTAllocCount(void) { return g_allocs.load(std::memory_order_relaxed); }
+void TWRTSetResizeMode(int32_t mode) { g_resizeMode.store(mode & (TWRTResizeMove | TWRTResizePoison), std::memory_order_relaxed); }
+int32_t TWRTResizeMode(void) { return g_resizeMode.load(std::memory_order_relaxed); }
 void TWRTSetPlacement(int32_t aligned) { g_aligned.store(aligned != 0, std::memory_order_relaxed); }
 int32_t TWRTPlacement(void) { return g_aligned.load(std::memory_order_relaxed); }
 

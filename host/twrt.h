@@ -26,7 +26,8 @@ TWRTHandle TWRTNewArray(int32_t elementSize, int32_t dims, const int32_t* shape)
 void HostDisposeHandle(TWRTHandle handle);
 
 /* The host entries. Resize keeps the leading bytes, may move the block, and returns 0 or
- * TWRTResizeFailed. It does not write the dimension words. */
+ * TWRTResizeFailed. It does not write the dimension words. By default it keeps the block where
+ * its size allows, otherwise reallocates it, and fills no new byte. */
 int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int32_t totalElements);
 int32_t HostSetCleanupProc(TWRTCleanupProc proc, void* record, int32_t mode);
 
@@ -50,6 +51,12 @@ int32_t TWRTBlockInfo(TWRTHandle handle, int32_t* typeCode, int64_t* bytes);
 /* 0: packed, 1-D element data at 4 mod 8 as the original host; 1: element data 64-byte aligned. */
 void TWRTSetPlacement(int32_t aligned);
 int32_t TWRTPlacement(void);
+/* Resize modes, bits that tests combine: move the block on every resize (catches stale element
+ * pointers), and fill the bytes a resize adds with kTWRTPoisonByte (catches reads of cells never
+ * written). 0 is the default behaviour. */
+enum { TWRTResizeMove = 1, TWRTResizePoison = 2, kTWRTPoisonByte = 0x7F };
+void TWRTSetResizeMode(int32_t mode);
+int32_t TWRTResizeMode(void);
 /* Element size of a type code, 0 for an unknown code. */
 int32_t TWRTElementSize(int32_t typeCode);
 

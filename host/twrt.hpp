@@ -123,4 +123,16 @@ private:
     int32_t old_;
 };
 
+// Chooses how resizes behave (TWRTResizeMove, TWRTResizePoison) while it lives.
+class ResizeMode {
+public:
+    explicit ResizeMode(int32_t mode) : old_(TWRTResizeMode()) { TWRTSetResizeMode(mode); }
+    ~ResizeMode() { TWRTSetResizeMode(old_); }
+    ResizeMode(const ResizeMode&) = delete;
+    ResizeMode& operator=(const ResizeMode&) = delete;
+
+private:
+    int32_t old_;
+};
+
 }  // namespace twrt

@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "frame/host_link.hpp"
+#include "twanlys/link.h"
 
 namespace tw {
 namespace {
@@ -122,3 +123,15 @@ Status StateLevelsCore(const double* x, double, double dt, int32_t n, int32_t me
 }
 
 }  // namespace tw
+
+// An instance-data cell of the measurements holds one bin buffer.
+TW_API int32_t MeasurementUnreserveProc(void** cell) {
+    if (cell == nullptr || *cell == nullptr) return 0;
+    auto* record = static_cast<tw::BinBuffer*>(*cell);
+    tw::PlainFree(record->bins);
+    record->bins = nullptr;
+    record->size = 0;
+    tw::PlainFree(record);
+    *cell = nullptr;
+    return 0;
+}

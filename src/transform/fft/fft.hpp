@@ -90,7 +90,7 @@ Status FftComplexInverse(const FftTable* t, const double* inRe, const double* in
                          double* outIm, ptrdiff_t inStride, ptrdiff_t outStride, int32_t n);
 
 // The spectrum of a half-complex sequence h of length n, in the usual order (shift 0) or centred
-// with X[0] at n/2.
+// with X[0] at n/2. h may be the upper half of out's lanes, reinterpret_cast<double*>(out) + n.
 void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out);
 // The reverse: reads only the non-negative frequencies of a spectrum in either order.
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out);

@@ -41,19 +41,19 @@ Status RealForward(Handle x, Handle& y, void** cell, int32_t start, int32_t size
     if (s == 0) s = f.Resize(y, size, &out);
     const double* xs = nullptr;
     if (s == 0) s = f.In(x, &xs);
-    // One block for the half-complex result (transformed at unit stride, where the kernels are
-    // fastest, then unpacked into y) and, when the window reaches past x, the zero-padded input.
-    const bool pad = s == 0 && size > count - start;  // start is known to lie inside x only then
-    tw::Scratch<double> work;
-    if (s == 0) s = work.Allocate(static_cast<size_t>(size) * (pad ? 2 : 1));
-    const double* source = xs + (s == 0 ? start : 0);
-    if (s == 0 && pad) {
-        CopyWindow(xs, count, start, size, work.get() + size);
-        source = work.get() + size;
+    if (s != 0) return f.Finish(s);
+    // No scratch: the half-complex result goes to the upper half of y's lanes, at unit stride
+    // where the kernels are fastest, and is unpacked from there in place. A window reaching past
+    // x is zero-padded into the lower half, which the transform leaves alone.
+    double* lanes = Lanes(out);
+    const double* source = xs + start;
+    if (size > count - start) {
+        CopyWindow(xs, count, start, size, lanes);
+        source = lanes;
     }
-    if (s == 0) s = tw::FftRealForward(table, source, work.get(), 1, 1, size);
-    if (s == 0) tw::FftUnpackHalfComplex(work.get(), size, shift, out);
-    return f.Finish(tw::MergeRelease(s, work.Release()));
+    s = tw::FftRealForward(table, source, lanes + size, 1, 1, size);
+    if (s == 0) tw::FftUnpackHalfComplex(lanes + size, size, shift, out);
+    return f.Finish(s);
 }
 
 template <bool InstanceData>

@@ -1,6 +1,8 @@
 #include "transform/fft/holder.hpp"
 
+#include "frame/frame.hpp"
 #include "frame/host_link.hpp"
+#include "twanlys/link.h"
 
 namespace tw {
 namespace {
@@ -45,3 +47,16 @@ Status AcquireTableHolder(void** cell, int32_t n, bool registerCleanup, FftTable
 }
 
 }  // namespace tw
+
+// The instance-data record of the transforms holds a table holder in each slot.
+TW_API int32_t TransformUnreserveProc(void** cell) {
+    if (cell == nullptr || *cell == nullptr) return 0;
+    auto* record = static_cast<tw::InstanceRecord*>(*cell);
+    for (void*& slot : record->slot) {
+        tw::ReleaseTableHolder(slot);
+        slot = nullptr;
+    }
+    tw::PlainFree(record);
+    *cell = nullptr;
+    return 0;
+}

@@ -1,3 +1,5 @@
+#include <emmintrin.h>
+
 #include <algorithm>
 #include <utility>
 
@@ -233,16 +235,33 @@ Status FftRealInverse(const FftTable* t, double* in, double* out, ptrdiff_t inSt
 }
 
 void FftUnpackHalfComplex(const double* h, int32_t n, int32_t shift, std::complex<double>* out) {
-    // Centred, X[k] goes to (k + n/2) mod n, so X[0] is at n/2 for both parities: the frequencies
-    // up to the middle then fill the back, those above it the front. Each part is a plain run.
+    // Centred, X[k] goes to (k + n/2) mod n, so X[0] is at n/2 for both parities. The cells of one
+    // side (X[k] at k, or its conjugate at n/2 - k when centred) lie in the lower half of out's
+    // lanes and are written from h first; the other side is their mirror. h may thus be the upper
+    // half of out's lanes: the first pass writes below it (but for h[0], read beforehand), the
+    // second reads nothing of it. Only moves and sign flips: the values are h's bits.
     const int32_t half = (n - 1) / 2;
-    const int32_t o = shift != 0 ? n / 2 : 0;
-    const int32_t up = shift != 0 ? o - n : 0;  // where X[k], k > n/2, goes: k + up
-    std::complex<double>* low = out + o;
-    low[0] = {h[0], 0.0};
-    for (int32_t k = 1; k <= half; ++k) low[k] = {h[k], h[n - k]};
-    for (int32_t k = n - half; k < n; ++k) out[k + up] = {h[n - k], -h[k]};
-    if (n % 2 == 0) out[(n / 2 + o) % n] = {h[n / 2], 0.0};
+    const bool centred = shift != 0;
+    const int32_t o = centred ? n / 2 : 0;
+    const double h0 = h[0];
+    const double nyquist = n % 2 == 0 ? h[n / 2] : 0.0;
+    double* y = reinterpret_cast<double*>(out);
+    const __m128d conj = _mm_set_pd(-0.0, 0.0);
+    const __m128d first = centred ? conj : _mm_setzero_pd();
+    // Cell of X[k] (or of its conjugate) on the first side, and of the mirror on the other.
+    const auto near = [&](int32_t k) { return y + 2 * static_cast<ptrdiff_t>(centred ? o - k : k); };
+    const auto far = [&](int32_t k) { return y + 2 * static_cast<ptrdiff_t>(centred ? o + k : n - k); };
+    int32_t k = 1;
+    for (; k + 1 <= half; k += 2) {
+        const __m128d a = _mm_loadu_pd(h + k);          // h[k], h[k+1]
+        const __m128d b = _mm_loadu_pd(h + n - k - 1);  // h[n-k-1], h[n-k]
+        _mm_storeu_pd(near(k), _mm_xor_pd(_mm_shuffle_pd(a, b, 2), first));
+        _mm_storeu_pd(near(k + 1), _mm_xor_pd(_mm_shuffle_pd(a, b, 1), first));
+    }
+    if (k <= half) _mm_storeu_pd(near(k), _mm_xor_pd(_mm_set_pd(h[n - k], h[k]), first));
+    for (k = 1; k <= half; ++k) _mm_storeu_pd(far(k), _mm_xor_pd(_mm_loadu_pd(near(k)), conj));
+    out[o] = {h0, 0.0};
+    if (n % 2 == 0) out[centred ? 0 : n / 2] = {nyquist, 0.0};
 }
 
 void FftPackHalfComplex(const std::complex<double>* in, int32_t n, int32_t shift, double* out) {
