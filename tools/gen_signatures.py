@@ -56,17 +56,22 @@ def parse_kind(text):
     if text in ("i32", "len"):
         k.update(kind="I32" if text == "i32" else "Len", ctype="int32_t")
         return k
+    if text == "u8":
+        # A byte by value (or a byte field of a record) varies as an i32 does, cut to its low byte.
+        k.update(kind="I32", elem="U8", elem_bytes=1, ctype="uint8_t")
+        return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
         return k
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
         e = elem(m.group(2))
-        if e[2] is None:
-            raise RowError("pointer to %r: only i32, len, u8, u32, f32, f64" % m.group(2))
+        ctype = e[2] or {"C128": "ComplexDouble"}.get(e[0])
+        if ctype is None:
+            raise RowError("pointer to %r: only i32, len, u8, u32, f32, f64, c128" % m.group(2))
         const = m.group(1) == "cp"
         k.update(kind="P", elem=e[0], elem_bytes=e[1], dir=direction(m.group(3)),
-                 ctype=("const " if const else "") + e[2] + "*")
+                 ctype=("const " if const else "") + ctype + "*")
         return k
     if text == "status":
         k.update(kind="Status", elem="I32", elem_bytes=4, dir="Out", ctype="int32_t*")
@@ -81,21 +86,22 @@ def parse_kind(text):
     if m:
         k.update(kind="Idp", ctype="void**", ref=m.group(1))
         return k
-    m = re.fullmatch(r"rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
+    m = re.fullmatch(r"(c?)rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
     if m:
         fields, offset = [], 0
-        for f in m.group(3).split(","):
+        const, name, size_text, field_text, dir_text = m.groups()
+        for f in field_text.split(","):
             fk = parse_kind(f)
             if fk["kind"] not in ("I32", "Len", "F64", "H1", "H2"):
                 raise RowError("record field %r: scalars and handles only" % f)
-            size = 8 if fk["kind"] in ("F64", "H1", "H2") else 4
+            size = 8 if fk["kind"] in ("F64", "H1", "H2") else fk["elem_bytes"] or 4
             fk["offset"] = offset
             offset += size
             fields.append(fk)
-        k.update(kind="Rec", ctype=m.group(1) + "*", rec_bytes=int(m.group(2)), fields=fields,
-                 dir=direction(m.group(4)), ref=m.group(1))
+        k.update(kind="Rec", ctype=("const " if const else "") + name + "*", rec_bytes=int(size_text),
+                 fields=fields, dir=direction(dir_text), ref=name)
         if offset > k["rec_bytes"]:
-            raise RowError("record %s: fields need %d bytes, row says %d" % (m.group(1), offset, k["rec_bytes"]))
+            raise RowError("record %s: fields need %d bytes, row says %d" % (name, offset, k["rec_bytes"]))
         return k
     m = re.fullmatch(r"buf\.(\w+)\.(\w+)\.(\w+)", text)
     if m:
@@ -216,7 +222,7 @@ def accessor(i, a):
     if k in ("H1", "H2"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
-        return "s.I(%d)" % i
+        return "static_cast<uint8_t>(s.I(%d))" % i if a["elem"] == "U8" else "s.I(%d)" % i
     if k == "F64":
         return "s.D(%d)" % i
     if k in ("Cell", "Idp"):

@@ -190,7 +190,7 @@ public:
     ~Slots() {
         for (Slot& s : slot_) {
             HostDisposeHandle(s.h);
-            HostDisposeHandle(s.nested);
+            for (void** h : s.nested) HostDisposeHandle(h);
         }
     }
 
@@ -208,10 +208,11 @@ public:
         const Slot& s = slot_[a];
         std::vector<unsigned char> v(s.bytes);
         if (s.h != nullptr) Append(&v, s.h);
-        bool nestedIn = true;
-        for (int32_t f = 0; f < row_.args[a].nFields; ++f)
-            if (IsHandle(row_.args[a].fields[f].kind)) nestedIn = row_.args[a].fields[f].dir == Dir::In;
-        if (s.nested != nullptr && (nestedIn || !inputsOnly)) Append(&v, s.nested);
+        for (int32_t f = 0, k = 0; f < row_.args[a].nFields; ++f)
+            if (IsHandle(row_.args[a].fields[f].kind) && static_cast<size_t>(k) < s.nested.size()) {
+                if (row_.args[a].fields[f].dir == Dir::In || !inputsOnly) Append(&v, s.nested[static_cast<size_t>(k)]);
+                ++k;
+            }
         return v;
     }
     // Addresses of handles inside records differ from run to run and are left out, and so are
@@ -241,12 +242,13 @@ public:
         const Arg& arg = row_.args[a];
         const Slot& s = slot_[a];
         if (IsHandle(arg.kind)) return {{s.h, arg.elem, arg.elemBytes, arg.dir, arg.kind == Kind::H2 ? 2 : 1}};
-        if (arg.kind == Kind::Rec && s.nested != nullptr && !s.null)
-            for (int32_t f = 0; f < arg.nFields; ++f)
+        std::vector<HandleView> v;
+        if (arg.kind == Kind::Rec && !s.null)
+            for (int32_t f = 0; f < arg.nFields && v.size() < s.nested.size(); ++f)
                 if (IsHandle(arg.fields[f].kind))
-                    return {{s.nested, arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
-                             arg.fields[f].kind == Kind::H2 ? 2 : 1}};
-        return {};
+                    v.push_back({s.nested[v.size()], arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
+                                 arg.fields[f].kind == Kind::H2 ? 2 : 1});
+        return v;
     }
     bool IsNull(int a) const { return slot_[a].null; }
     const std::vector<unsigned char>& Pointee(int a) const { return slot_[a].bytes; }
@@ -254,7 +256,7 @@ public:
 private:
     struct Slot {
         void** h = nullptr;       // handle argument
-        void** nested = nullptr;  // handle inside a record
+        std::vector<void**> nested;  // handles inside a record, in field order
         int32_t i = 0;
         double d = 0;
         void** cell = nullptr;
@@ -294,6 +296,7 @@ private:
                 s.bytes.assign(static_cast<size_t>(arg.elemBytes), kOutByte);
                 if (arg.dir != Dir::Out) {
                     if (arg.elem == Elem::F64) std::memcpy(s.bytes.data(), &c.d, 8);
+                    else if (arg.elem == Elem::C128) for (int k = 0; k < 2; ++k) std::memcpy(s.bytes.data() + 8 * k, &c.d, 8);
                     else if (arg.elem == Elem::F32) { const auto f = static_cast<float>(c.d); std::memcpy(s.bytes.data(), &f, 4); }
                     else if (arg.elem == Elem::U8) s.bytes[0] = static_cast<unsigned char>(c.i);
                     else std::memcpy(s.bytes.data(), &c.i, 4);
@@ -310,11 +313,11 @@ private:
                     const Field& fd = arg.fields[f];
                     unsigned char* at = s.bytes.data() + fd.offset;
                     if (IsHandle(fd.kind)) {
-                        s.nested = MakeArray(fd.kind, fd.elem, fd.elemBytes, c);
-                        std::memcpy(at, &s.nested, sizeof s.nested);
+                        s.nested.push_back(MakeArray(fd.kind, fd.elem, fd.elemBytes, c));
+                        std::memcpy(at, &s.nested.back(), sizeof(void**));
                     } else if (arg.dir != Dir::Out) {
                         if (fd.kind == Kind::F64) std::memcpy(at, &c.d, 8);
-                        else std::memcpy(at, &c.i, 4);
+                        else std::memcpy(at, &c.i, fd.elem == Elem::U8 ? 1 : 4);
                     }
                 }
                 break;
@@ -444,6 +447,8 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
                         fault(what + " is not " + (want == 0.0 ? "0" : "NaN") + " on failure");
                 };
                 if (arg.kind == Kind::P && arg.elem == Elem::F64) check(s.Pointee(a).data(), name);
+                for (int k = 0; arg.kind == Kind::P && arg.elem == Elem::C128 && k < 2; ++k)
+                    check(s.Pointee(a).data() + 8 * k, name + (k == 0 ? " (real part)" : " (imaginary part)"));
                 if (arg.kind == Kind::Rec)
                     for (int32_t f = 0; f < arg.nFields; ++f)
                         if (arg.fields[f].kind == Kind::F64)
