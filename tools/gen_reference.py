@@ -21,7 +21,7 @@ KINDS = {"h1": "1-D array", "h2": "2-D array", "p": "pointer to", "cp": "pointer
 def describe(a):
     if a.head in ("h1", "h2", "p", "cp", "buf"):
         return f"{KINDS[a.head]} {a.element}, {a.direction}" + (", may be null" if a.optional else "")
-    if a.head == "rec":
+    if a.head in ("rec", "crec"):
         return f"{a.kind.split('.')[1].split('[')[0]} record, {a.direction}"
     return KINDS.get(a.head, a.kind)
 

@@ -60,6 +60,10 @@ def parse_kind(text):
         # Unsigned selectors by value: swept with the i32 values, converted as a caller would.
         k.update(kind="I32", ctype="uint16_t" if text == "u16" else "uint32_t")
         return k
+    if text == "u8":
+        # A byte by value (or a byte field of a record) varies as an i32 does, cut to its low byte.
+        k.update(kind="I32", elem="U8", elem_bytes=1, ctype="uint8_t")
+        return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
         return k
@@ -86,21 +90,22 @@ def parse_kind(text):
     if m:
         k.update(kind="Idp", ctype="void**", ref=m.group(1))
         return k
-    m = re.fullmatch(r"rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
+    m = re.fullmatch(r"(c?)rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
     if m:
         fields, offset = [], 0
-        for f in m.group(3).split(","):
+        const, name, size_text, field_text, dir_text = m.groups()
+        for f in field_text.split(","):
             fk = parse_kind(f)
             if fk["kind"] not in ("I32", "Len", "F64", "H1", "H2"):
                 raise RowError("record field %r: scalars and handles only" % f)
-            size = 8 if fk["kind"] in ("F64", "H1", "H2") else 4
+            size = 8 if fk["kind"] in ("F64", "H1", "H2") else fk["elem_bytes"] or 4
             fk["offset"] = offset
             offset += size
             fields.append(fk)
-        k.update(kind="Rec", ctype=m.group(1) + "*", rec_bytes=int(m.group(2)), fields=fields,
-                 dir=direction(m.group(4)), ref=m.group(1))
+        k.update(kind="Rec", ctype=("const " if const else "") + name + "*", rec_bytes=int(size_text),
+                 fields=fields, dir=direction(dir_text), ref=name)
         if offset > k["rec_bytes"]:
-            raise RowError("record %s: fields need %d bytes, row says %d" % (m.group(1), offset, k["rec_bytes"]))
+            raise RowError("record %s: fields need %d bytes, row says %d" % (name, offset, k["rec_bytes"]))
         return k
     m = re.fullmatch(r"buf\.(\w+)\.(\w+)\.(\w+)", text)
     if m:

@@ -41,7 +41,7 @@ def _dtype(code):
 
 def _record_type(kind):
     """A packed ctypes Structure for rec.T[B]{fields}.D, and its field kinds."""
-    m = re.match(r"rec\.(\w+)\[(\d+)\]\{(.*)\}", kind)
+    m = re.match(r"c?rec\.(\w+)\[(\d+)\]\{(.*)\}", kind)
     fields = m.group(3).split(",")
     layout = [(f"f{i}", ctypes.c_void_p if f.startswith("h") else _CTYPES[f]) for i, f in enumerate(fields)]
     record = type(m.group(1), (ctypes.Structure,), {"_pack_": 1, "_fields_": layout})
@@ -180,12 +180,16 @@ def _build(row, pyname):
             params.append(a.name)
             call.append(f"_ct.{_CTYPES[a.head].__name__}({a.name})")
         elif a.head in ("p", "cp") and a.element == "c128":
-            # ctypes has no complex scalar: one complex128 element stands in for it
-            params.append(a.name)
-            before.append(f"{v} = _np.array([{a.name}], _np.complex128)")
-            if a.direction == "io":
-                outputs.append((a.name, f"complex({v}[0])"))
-            call.append(f"{v}.ctypes.data_as(_ct.c_void_p)")
+            # A complex scalar by pointer: two doubles, real part first.
+            env["_C128"] = ctypes.c_double * 2
+            if a.direction == "out":
+                before.append(f"{v} = _C128()")
+            else:
+                params.append(a.name)
+                before.append(f"{v} = _C128(complex({a.name}).real, complex({a.name}).imag)")
+            if a.direction != "in":
+                outputs.append((a.name, f"complex({v}[0], {v}[1])"))
+            call.append(f"_ct.byref({v})")
         elif a.head in ("p", "cp"):
             ct = _CTYPES[a.element].__name__
             if a.direction == "out":
@@ -212,7 +216,7 @@ def _build(row, pyname):
             if a.direction != "in":
                 outputs.append((a.name, f"{a.name}_"))
             call.append(f"{a.name}_.ctypes.data_as(_ct.c_void_p)")
-        elif a.head == "rec":
+        elif a.head in ("rec", "crec"):
             record, fields = _record_type(a.kind)
             env[f"_R{i}"] = record
             if a.direction == "out":

@@ -77,7 +77,7 @@ void DecimateStream(const T* x, int32_t n, int32_t factor, bool average, Decimat
         c->offset = (factor - r) % factor;
     } else if (c->partial != 0) {
         for (int32_t i = 0; i < n; ++i) c->sum += x[i];
-        c->partial += n;
+        c->partial = static_cast<int32_t>(std::min<int64_t>(int64_t{c->partial} + n, INT32_MAX));
         c->offset = std::max(0, c->offset - n);
     } else if (c->offset < n) {
         T sum{};

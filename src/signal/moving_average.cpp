@@ -12,10 +12,13 @@ int32_t DecimatedMovingSum(T* x, int32_t n, int32_t factor, T* sum, int32_t* cou
     T s = *sum;
     for (int32_t i = 0; i < n; ++i) {
         s += x[i];
-        if (++taken >= factor) {
+        // Compared before counting, so that a carried count near the i32 limit cannot overflow.
+        if (taken >= factor - 1) {
             x[produced++] = s;
             s = T{};
             taken = 0;
+        } else {
+            ++taken;
         }
     }
     *sum = s;

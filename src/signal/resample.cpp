@@ -154,11 +154,14 @@ Status ResampleConstBlock(const Table& t, double filterRatio, const T* v, int64_
         if (*produced == capacity) return ResampleSizeErr;
         y[(*produced)++] = TableOutput(v, st->index, {st->left, st->right, st->scale}, coef);
         const double next = *produced * st->ratio + t0;
-        // The state keeps an i32 index: absurd ratios saturate rather than overflow.
-        const double whole = std::clamp(std::floor(next), -2147483648.0, 2147483647.0);
+        // The state keeps an i32 index: absurd ratios saturate rather than overflow, and a
+        // saturated index keeps fraction 0 (the filter stays within the table).
+        const double down = std::floor(next);
+        const double whole = std::clamp(down, -2147483648.0, 2147483647.0);
+        const double frac = whole == down ? next - whole : 0.0;
         st->index = static_cast<int32_t>(whole);
-        if (next - whole != st->frac) {
-            st->frac = next - whole;
+        if (frac != st->frac) {
+            st->frac = frac;
             if (const Status s = recompute()) return s;
         }
     }

@@ -127,6 +127,9 @@ Status ResampleConst(Handle x, ResampleState* record, const ResampleSettings* se
     const double ratio = reset != 0 ? settings.ratio : st.ratio;
     if (s == 0 && !(ratio > 0 && std::isfinite(ratio))) s = BadDataRangeErr;
     if (s == 0 && reset != 0 && !(std::fabs(settings.start) < 2147483647.0)) s = BadDataRangeErr;
+    // A carried fraction outside [0, 1) is no state a call leaves; it would place the filter
+    // anywhere.
+    if (s == 0 && reset == 0 && !(st.frac >= 0 && st.frac < 1)) s = BadDataRangeErr;
     const double* cells = nullptr;
     if (s == 0) s = f.In(table, &cells);
     Table t = TableOf(cells, Count(table), settings.oversample,

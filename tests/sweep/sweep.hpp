@@ -193,7 +193,7 @@ public:
     ~Slots() {
         for (Slot& s : slot_) {
             HostDisposeHandle(s.h);
-            HostDisposeHandle(s.nested);
+            for (void** h : s.nested) HostDisposeHandle(h);
         }
     }
 
@@ -211,10 +211,11 @@ public:
         const Slot& s = slot_[a];
         std::vector<unsigned char> v(s.bytes.begin() + s.offset, s.bytes.end());
         if (s.h != nullptr) Append(&v, s.h);
-        bool nestedIn = true;
-        for (int32_t f = 0; f < row_.args[a].nFields; ++f)
-            if (IsHandle(row_.args[a].fields[f].kind)) nestedIn = row_.args[a].fields[f].dir == Dir::In;
-        if (s.nested != nullptr && (nestedIn || !inputsOnly)) Append(&v, s.nested);
+        for (int32_t f = 0, k = 0; f < row_.args[a].nFields; ++f)
+            if (IsHandle(row_.args[a].fields[f].kind) && static_cast<size_t>(k) < s.nested.size()) {
+                if (row_.args[a].fields[f].dir == Dir::In || !inputsOnly) Append(&v, s.nested[static_cast<size_t>(k)]);
+                ++k;
+            }
         return v;
     }
     // Addresses of handles inside records differ from run to run and are left out, and so are
@@ -244,12 +245,13 @@ public:
         const Arg& arg = row_.args[a];
         const Slot& s = slot_[a];
         if (IsHandle(arg.kind)) return {{s.h, arg.elem, arg.elemBytes, arg.dir, Dims(arg.kind)}};
-        if (arg.kind == Kind::Rec && s.nested != nullptr && !s.null)
-            for (int32_t f = 0; f < arg.nFields; ++f)
+        std::vector<HandleView> v;
+        if (arg.kind == Kind::Rec && !s.null)
+            for (int32_t f = 0; f < arg.nFields && v.size() < s.nested.size(); ++f)
                 if (IsHandle(arg.fields[f].kind))
-                    return {{s.nested, arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
-                             Dims(arg.fields[f].kind)}};
-        return {};
+                    v.push_back({s.nested[v.size()], arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
+                                 Dims(arg.fields[f].kind)});
+        return v;
     }
     bool IsNull(int a) const { return slot_[a].null; }
     const std::vector<unsigned char>& Pointee(int a) const { return slot_[a].bytes; }
@@ -257,7 +259,7 @@ public:
 private:
     struct Slot {
         void** h = nullptr;       // handle argument
-        void** nested = nullptr;  // handle inside a record
+        std::vector<void**> nested;  // handles inside a record, in field order
         int32_t i = 0;
         double d = 0;
         void** cell = nullptr;
@@ -320,11 +322,11 @@ private:
                     const Field& fd = arg.fields[f];
                     unsigned char* at = s.bytes.data() + fd.offset;
                     if (IsHandle(fd.kind)) {
-                        s.nested = MakeArray(fd.kind, fd.elem, fd.elemBytes, c);
-                        std::memcpy(at, &s.nested, sizeof s.nested);
+                        s.nested.push_back(MakeArray(fd.kind, fd.elem, fd.elemBytes, c));
+                        std::memcpy(at, &s.nested.back(), sizeof(void**));
                     } else if (arg.dir != Dir::Out) {
                         if (fd.kind == Kind::F64) std::memcpy(at, &c.d, 8);
-                        else std::memcpy(at, &c.i, 4);
+                        else std::memcpy(at, &c.i, fd.elem == Elem::U8 ? 1 : 4);
                     }
                 }
                 break;
