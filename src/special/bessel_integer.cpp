@@ -112,6 +112,10 @@ double BesselIn(int32_t order, double x) {
     // would overflow to NaN.
     if (ax < 3.0e-8) return sign * (std::pow(0.5 * ax, dn) / FactorialFunc(static_cast<int32_t>(n)));
     if (LogLeadingTerm(n, ax) + ax * ax / (4.0 * (dn + 1.0)) < kLogUnderflow) return sign * 0.0;
+    // The result below is I_0 times a ratio in (0, 1]: once I_0 overflows so does it, and the
+    // start of the recurrence would grow without bound with x.
+    const double i0 = BesselI0(ax);
+    if (!IsFinite(i0)) return sign * kInf;
     int64_t m = 2 * (n + static_cast<int64_t>(std::sqrt(100.0 * dn)));
     // The start must also lie well past the turning point of the recurrence (m^2 - n^2 >= 78 |x|):
     // the stated start alone leaves I_3(600) 12 % off.
@@ -134,7 +138,7 @@ double BesselIn(int32_t order, double x) {
         }
         if (j == n) ans = bip;
     }
-    return sign * (BesselI0(x) * ans / bi);
+    return sign * (i0 * ans / bi);
 }
 
 double BesselKn(int32_t order, double x) {
