@@ -56,8 +56,15 @@ def parse_kind(text):
     if text in ("i32", "len"):
         k.update(kind="I32" if text == "i32" else "Len", ctype="int32_t")
         return k
+    # Narrower scalars by value take the i32 and f64 values, converted at the call.
+    if text in ("u8", "u16", "u32"):
+        k.update(kind="I32", ctype={"u8": "uint8_t", "u16": "uint16_t", "u32": "uint32_t"}[text])
+        return k
     if text == "f64":
         k.update(kind="F64", ctype="double")
+        return k
+    if text == "f32":
+        k.update(kind="F64", ctype="float")
         return k
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
@@ -81,7 +88,7 @@ def parse_kind(text):
     if m:
         k.update(kind="Idp", ctype="void**", ref=m.group(1))
         return k
-    m = re.fullmatch(r"rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
+    m = re.fullmatch(r"c?rec\.(\w+)\[(\d+)\]\{([^}]*)\}\.(\w+)", text)
     if m:
         fields, offset = [], 0
         for f in m.group(3).split(","):
@@ -92,7 +99,7 @@ def parse_kind(text):
             fk["offset"] = offset
             offset += size
             fields.append(fk)
-        k.update(kind="Rec", ctype=m.group(1) + "*", rec_bytes=int(m.group(2)), fields=fields,
+        k.update(kind="Rec", ctype=("const " if text.startswith("c") else "") + m.group(1) + "*", rec_bytes=int(m.group(2)), fields=fields,
                  dir=direction(m.group(4)), ref=m.group(1))
         if offset > k["rec_bytes"]:
             raise RowError("record %s: fields need %d bytes, row says %d" % (m.group(1), offset, k["rec_bytes"]))
@@ -133,13 +140,13 @@ def parse_signature(sig):
         args.append(a)
     names = [a["name"] for a in args]
     for a in args:
-        if a["kind"] == "Buf" and a["ref"] not in names:
+        if a["kind"] == "Buf" and a["ref"] not in names and not a["ref"].isdigit():
             raise RowError("bare pointer %s counts with %r, which is no argument" % (a["name"], a["ref"]))
     return result, args
 
 
 def parse_contract(text, args):
-    c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False,
+    c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False, "result_oom": False,
          "nosweep": False}
     names = [a["name"] for a in args]
     for tok in text.split():
@@ -158,9 +165,9 @@ def parse_contract(text, args):
         elif key == "stand":
             c["stand"] = value.split(",")
         elif key == "result":
-            if value != "host":
-                raise RowError("result=%s: only result=host" % value)
-            c["result_host"] = True
+            if value not in ("host", "oom"):
+                raise RowError("result=%s: result=host or result=oom" % value)
+            c["result_host" if value == "host" else "result_oom"] = True
         elif key == "nosweep":
             c["nosweep"] = True
     return c
@@ -216,9 +223,9 @@ def accessor(i, a):
     if k in ("H1", "H2"):
         return "s.H(%d)" % i
     if k in ("I32", "Len"):
-        return "s.I(%d)" % i
+        return "s.I(%d)" % i if a["ctype"] == "int32_t" else "static_cast<%s>(s.I(%d))" % (a["ctype"], i)
     if k == "F64":
-        return "s.D(%d)" % i
+        return "s.D(%d)" % i if a["ctype"] == "double" else "sweep::ToF32(s.D(%d))" % i
     if k in ("Cell", "Idp"):
         return "s.Cell(%d)" % i
     if k == "Opaque":
@@ -233,7 +240,9 @@ def write_table(rows, path, stem, includes):
         for i, a in enumerate(r["args"]):
             a["cur_id"] = "%s_%d" % (r["name"], i)
             if a["kind"] == "Buf":
-                a["count_index"] = [b["name"] for b in r["args"]].index(a["ref"])
+                # A fixed count n is coded as -(n + 1).
+                a["count_index"] = (-int(a["ref"]) - 1 if a["ref"].isdigit()
+                                    else [b["name"] for b in r["args"]].index(a["ref"]))
             if a["fields"]:
                 out.append("inline constexpr sweep::Field k%s_fields[] = {%s};" % (a["cur_id"], ", ".join(
                     "{sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %d, %d}"
@@ -258,10 +267,11 @@ def write_table(rows, path, stem, includes):
         masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
         out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
-                   '     [](sweep::Slots& s) -> sweep::Outcome { %s }},'
+                   '     [](sweep::Slots&%s) -> sweep::Outcome { %s }, %s},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
-                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, body))
+                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand,
+                      " s" if r["args"] else "", body, str(c["result_oom"]).lower()))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "frame/workspace.hpp"
+#include "twanlys/status.h"
 #include "twrt.h"
 
 namespace sweep {
@@ -43,7 +44,7 @@ struct Arg {
     int32_t nFields;
     int32_t recBytes;
     int32_t (*unreserve)(void**);
-    int32_t countArg;
+    int32_t countArg;  // the argument that counts a bare pointer; -(n + 1) for a fixed count n
 };
 
 struct Outcome {
@@ -68,6 +69,7 @@ struct Row {
     uint32_t work;  // outputs whose contents are working memory
     int32_t stand[4];
     Outcome (*call)(Slots&);
+    bool resultOom = false;  // ptr style whose result is 2 when it stores OutOfMemoryErr
 };
 
 // What one argument gets in one call.
@@ -88,6 +90,13 @@ inline constexpr unsigned char kOutByte = 0xA5;
 inline constexpr int kPatterns = 10;
 
 inline bool IsHandle(Kind k) { return k == Kind::H1 || k == Kind::H2; }
+
+// An f32 argument by value from the f64 values: out of range is an infinity, as on the wire.
+inline float ToF32(double d) {
+    if (std::isfinite(d) && std::fabs(d) > static_cast<double>(std::numeric_limits<float>::max()))
+        return std::copysign(std::numeric_limits<float>::infinity(), d);
+    return static_cast<float>(d);
+}
 inline bool Writes(Dir d) { return d == Dir::Out || d == Dir::Io; }
 
 // Values of the data patterns: 0 moderate distinct values, 1 zeros, 2 one NaN, 3 one +Inf,
@@ -190,7 +199,7 @@ public:
     ~Slots() {
         for (Slot& s : slot_) {
             HostDisposeHandle(s.h);
-            HostDisposeHandle(s.nested);
+            for (void** h : s.nested) HostDisposeHandle(h);
         }
     }
 
@@ -208,10 +217,12 @@ public:
         const Slot& s = slot_[a];
         std::vector<unsigned char> v(s.bytes);
         if (s.h != nullptr) Append(&v, s.h);
-        bool nestedIn = true;
-        for (int32_t f = 0; f < row_.args[a].nFields; ++f)
-            if (IsHandle(row_.args[a].fields[f].kind)) nestedIn = row_.args[a].fields[f].dir == Dir::In;
-        if (s.nested != nullptr && (nestedIn || !inputsOnly)) Append(&v, s.nested);
+        size_t k = 0;
+        for (int32_t f = 0; f < row_.args[a].nFields && k < s.nested.size(); ++f)
+            if (IsHandle(row_.args[a].fields[f].kind)) {
+                if (row_.args[a].fields[f].dir == Dir::In || !inputsOnly) Append(&v, s.nested[k]);
+                ++k;
+            }
         return v;
     }
     // Addresses of handles inside records differ from run to run and are left out, and so are
@@ -241,12 +252,14 @@ public:
         const Arg& arg = row_.args[a];
         const Slot& s = slot_[a];
         if (IsHandle(arg.kind)) return {{s.h, arg.elem, arg.elemBytes, arg.dir, arg.kind == Kind::H2 ? 2 : 1}};
-        if (arg.kind == Kind::Rec && s.nested != nullptr && !s.null)
-            for (int32_t f = 0; f < arg.nFields; ++f)
+        std::vector<HandleView> v;
+        size_t k = 0;
+        if (arg.kind == Kind::Rec && !s.null)
+            for (int32_t f = 0; f < arg.nFields && k < s.nested.size(); ++f)
                 if (IsHandle(arg.fields[f].kind))
-                    return {{s.nested, arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
-                             arg.fields[f].kind == Kind::H2 ? 2 : 1}};
-        return {};
+                    v.push_back({s.nested[k++], arg.fields[f].elem, arg.fields[f].elemBytes, arg.fields[f].dir,
+                                 arg.fields[f].kind == Kind::H2 ? 2 : 1});
+        return v;
     }
     bool IsNull(int a) const { return slot_[a].null; }
     const std::vector<unsigned char>& Pointee(int a) const { return slot_[a].bytes; }
@@ -254,7 +267,7 @@ public:
 private:
     struct Slot {
         void** h = nullptr;       // handle argument
-        void** nested = nullptr;  // handle inside a record
+        std::vector<void**> nested;  // handles inside a record, in field order
         int32_t i = 0;
         double d = 0;
         void** cell = nullptr;
@@ -310,8 +323,9 @@ private:
                     const Field& fd = arg.fields[f];
                     unsigned char* at = s.bytes.data() + fd.offset;
                     if (IsHandle(fd.kind)) {
-                        s.nested = MakeArray(fd.kind, fd.elem, fd.elemBytes, c);
-                        std::memcpy(at, &s.nested, sizeof s.nested);
+                        void** h = MakeArray(fd.kind, fd.elem, fd.elemBytes, c);
+                        s.nested.push_back(h);
+                        std::memcpy(at, &h, sizeof h);
                     } else if (arg.dir != Dir::Out) {
                         if (fd.kind == Kind::F64) std::memcpy(at, &c.d, 8);
                         else std::memcpy(at, &c.i, 4);
@@ -319,7 +333,7 @@ private:
                 }
                 break;
             case Kind::Buf: {
-                const int32_t n = std::clamp(slot_[arg.countArg].i, 0, 4096);
+                const int32_t n = arg.countArg < 0 ? -arg.countArg - 1 : std::clamp(slot_[arg.countArg].i, 0, 4096);
                 s.bytes.assign(static_cast<size_t>(n) * static_cast<size_t>(arg.elemBytes) + 1, 0);
                 FillElements(s.bytes.data(), arg.elem, arg.elemBytes, n, c.fill);
                 break;
@@ -378,7 +392,8 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
         switch (row.style) {
             case Style::Ret: status = result; break;
             case Style::Ptr:
-                if (result != 0 && !(row.resultHost && hostFailed && result == TWRTResizeFailed))
+                if (result != 0 && !(row.resultHost && hostFailed && result == TWRTResizeFailed) &&
+                    !(row.resultOom && result == 2 && (statusArg < 0 || s.IsNull(statusArg) || stored == OutOfMemoryErr)))
                     fault("result " + std::to_string(result) + " where the status goes through the pointer");
                 status = stored;
                 known = statusArg >= 0 && !s.IsNull(statusArg);
