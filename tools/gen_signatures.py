@@ -67,6 +67,9 @@ def parse_kind(text):
     if text == "f64":
         k.update(kind="F64", ctype="double")
         return k
+    if text == "f32":
+        k.update(kind="F64", ctype="float")
+        return k
     m = re.fullmatch(r"(c?p)\.(\w+)\.(\w+)", text)
     if m:
         e = elem(m.group(2))
@@ -143,13 +146,13 @@ def parse_signature(sig):
         args.append(a)
     names = [a["name"] for a in args]
     for a in args:
-        if a["kind"] == "Buf" and a["ref"] not in names:
+        if a["kind"] == "Buf" and a["ref"] not in names and not a["ref"].isdigit():
             raise RowError("bare pointer %s counts with %r, which is no argument" % (a["name"], a["ref"]))
     return result, args
 
 
 def parse_contract(text, args):
-    c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False,
+    c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False, "result_oom": False,
          "nosweep": False}
     names = [a["name"] for a in args]
     for tok in text.split():
@@ -177,9 +180,9 @@ def parse_contract(text, args):
                     raise RowError("inwhen names %r, which is no argument" % v)
                 args[names.index(v)]["inwhen"] = names.index(flag)
         elif key == "result":
-            if value != "host":
-                raise RowError("result=%s: only result=host" % value)
-            c["result_host"] = True
+            if value not in ("host", "oom"):
+                raise RowError("result=%s: result=host or result=oom" % value)
+            c["result_host" if value == "host" else "result_oom"] = True
         elif key == "nosweep":
             c["nosweep"] = True
     return c
@@ -237,7 +240,7 @@ def accessor(i, a):
     if k in ("I32", "Len"):
         return "s.I(%d)" % i if a["ctype"] == "int32_t" else "static_cast<%s>(s.I(%d))" % (a["ctype"], i)
     if k == "F64":
-        return "s.D(%d)" % i
+        return "s.D(%d)" % i if a["ctype"] == "double" else "sweep::ToF32(s.D(%d))" % i
     if k in ("Cell", "Idp"):
         return "s.Cell(%d)" % i
     if k == "Opaque":
@@ -252,7 +255,9 @@ def write_table(rows, path, stem, includes):
         for i, a in enumerate(r["args"]):
             a["cur_id"] = "%s_%d" % (r["name"], i)
             if a["kind"] == "Buf":
-                a["count_index"] = [b["name"] for b in r["args"]].index(a["ref"])
+                # A fixed count n is coded as -(n + 1).
+                a["count_index"] = (-int(a["ref"]) - 1 if a["ref"].isdigit()
+                                    else [b["name"] for b in r["args"]].index(a["ref"]))
             if a["fields"]:
                 out.append("inline constexpr sweep::Field k%s_fields[] = {%s};" % (a["cur_id"], ", ".join(
                     "{sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %d, %d}"
@@ -277,10 +282,11 @@ def write_table(rows, path, stem, includes):
         masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
         out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
-                   '     [](sweep::Slots& s) -> sweep::Outcome { %s }},'
+                   '     [](sweep::Slots&%s) -> sweep::Outcome { %s }, %s},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
-                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand, body))
+                      str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand,
+                      " s" if r["args"] else "", body, str(c["result_oom"]).lower()))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 

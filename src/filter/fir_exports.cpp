@@ -82,6 +82,7 @@ template <class T>
 Status RunNarrowband(Handle x, const NarrowFilterSpec* spec, Handle& y) {
     Frame f;
     f.Output<T>(y);
+    if (spec == nullptr) return f.Finish(EmptyArrayErr);
     const int32_t n = Count(x);
     const NarrowbandTaps taps{spec->filterClass, spec->interpolation, nullptr, Count(spec->model), nullptr,
                               Count(spec->image)};
@@ -170,10 +171,11 @@ Status SinglePurpose(Stream kind, Handle x, Handle& y, double gain, int32_t fact
                      uint8_t reset, int32_t startPhase, int32_t* delay) {
     Frame f;
     f.Output<double>(y);
+    // The state is worked in place: a failure empties it with y, also that of an empty block.
+    f.Output<double>(state);
     const int32_t n = Count(x), taps = Count(h);
     double* out = nullptr;
     if (n < 1) return f.Finish(f.Resize(y, 0, &out));
-    f.Output<double>(state);
     Status s = taps < 1 ? OrderNotPositiveErr : factor < 1 ? BadDataRangeErr : *delay < 0 ? NegativeArgumentErr : 0;
     const int64_t cells = s != 0                      ? 0
                           : kind == Stream::Interpolator ? MultiRateStateLength(kInterpolate, taps, factor, 1)
@@ -244,12 +246,12 @@ TW_API int32_t FIRNarrowCoef_head(double* fs, double* firstEdge, double* secondE
 }
 
 TW_API int32_t FIRnarrowFilter_head(Array1DHandle x, NarrowFilterSpec* spec, Array1DHandle y, int32_t* status) {
-    return ToPointer(status, spec == nullptr ? EmptyArrayErr : RunNarrowband<double>(x, spec, y));
+    return ToPointer(status, RunNarrowband<double>(x, spec, y));
 }
 
 TW_API int32_t CxSigFIRnarrowFilter_head(Array1DHandle x, NarrowFilterSpec* spec, Array1DHandle y,
                                          int32_t* status) {
-    return ToPointer(status, spec == nullptr ? EmptyArrayErr : RunNarrowband<cdouble>(x, spec, y));
+    return ToPointer(status, RunNarrowband<cdouble>(x, spec, y));
 }
 
 TW_API int32_t ppMultiRateFIRH_DBL(Array1DHandle x, Array1DHandle y, Array1DHandle state, int32_t mode, int32_t L,

@@ -21,6 +21,8 @@ void CopyOut(T* dst, const T* src, size_t count) {
 // Real general matrix; both outputs are emptied before anything else.
 Status RealEigen(Handle a, int32_t output, Handle& values, Handle& vectors, int32_t* host) {
     Frame f;
+    f.Output<cdouble>(values);
+    f.Output2D<cdouble>(vectors);
     cdouble *pv = nullptr, *pz = nullptr;
     Status s = Out1D(f, values, 0, &pv, host);
     if (s == 0) s = Out2D(f, vectors, 0, 0, &pz, host);
@@ -353,11 +355,20 @@ Status VBack(Handle& v, int32_t job, int32_t side, int32_t ilo, int32_t ihi, Han
     if (s == 0) s = view;
     if (s == 0) s = f.In(scale, &ps);
     if (s == 0 && Screen(pv, n * n)) s = NanInfErr;
+    // Limits the driver refuses leave V as it is (its info is ignored); they are tested here, in
+    // 64 bits, so that no limit wraps on the way.
+    const int64_t lo = int64_t{ilo} + 1, hi = int64_t{ihi} + 1;
+    const bool runs = lo >= 1 && lo <= n && hi >= std::min<int64_t>(lo, n) && hi <= n;
+    // The driver swaps rows by the permutation entries outside lo..hi unchecked: one that names
+    // no row would reach outside V.
+    if (s == 0 && runs && (job == 1 || job == 3))
+        for (int64_t i = 1; i <= n; ++i)
+            if ((i < lo || i > hi) && !(ps[i - 1] >= 1 && ps[i - 1] < static_cast<double>(n) + 1)) s = IndexRangeErr;
     Scratch<T> work;
-    if (s == 0) s = work.Allocate(Square(n));
-    if (s == 0) s = TransposeMatrix<T>(pv, n, n, work.get());
-    if (s == 0) {
-        Gebak(kJobs[job], side == 0 ? 'L' : 'R', n, ilo + 1, ihi + 1, ps, n, work.get(), n);
+    if (s == 0 && runs) s = work.Allocate(Square(n));
+    if (s == 0 && runs) s = TransposeMatrix<T>(pv, n, n, work.get());
+    if (s == 0 && runs) {
+        Gebak(kJobs[job], side == 0 ? 'L' : 'R', n, static_cast<int>(lo), static_cast<int>(hi), ps, n, work.get(), n);
         s = TransposeMatrix<T>(work.get(), n, n, pv);
     }
     return f.Finish(MergeRelease(s, work.Release()));

@@ -218,10 +218,28 @@ WorkParts Parts(double* base, int32_t width) {
     return {base, base + 3 * w, base + 4 * w, base + 5 * w};
 }
 
+void EmptyF64(Handle& h) {
+    if (h == nullptr) return;
+    HostResize(TypeF64, 1, &h, 0);
+    if (*h != nullptr) std::memset(*h, 0, 4);
+}
+
 Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectState* stateRecord, Handle& work,
                    int32_t mode) {
-    // Without its records a stream has nowhere to report; refused like the other measurements.
-    if (settingsRecord == nullptr || stateRecord == nullptr) return MeasureNullRecordErr;
+    // Without its records a stream has nowhere to report; refused like the other measurements,
+    // and a failure still empties the outputs and the work buffer that are there.
+    if (settingsRecord == nullptr || stateRecord == nullptr) {
+        if (settingsRecord != nullptr) {
+            Handle outs[3];
+            std::memcpy(outs, &settingsRecord->locations, sizeof outs);
+            for (Handle& h : outs) EmptyF64(h);
+            std::memcpy(&settingsRecord->locations, outs, sizeof outs);
+            const int32_t none = 0;
+            std::memcpy(&settingsRecord->count, &none, sizeof none);
+        }
+        EmptyF64(work);
+        return MeasureNullRecordErr;
+    }
     PeakDetectSettings set;
     PeakDetectState st;
     std::memcpy(&set, settingsRecord, sizeof set);
@@ -292,10 +310,7 @@ Status StreamPeaks(Handle raw, PeakDetectSettings* settingsRecord, PeakDetectSta
     ScratchFree(peaks);
     s = f.Finish(s);
     if (s < 0 || final) {
-        if (work != nullptr) {
-            HostResize(TypeF64, 1, &work, 0);
-            if (*work != nullptr) std::memset(*work, 0, 4);
-        }
+        EmptyF64(work);
         st = {};
     } else {
         // The record points into the host's block, wherever the host placed it.

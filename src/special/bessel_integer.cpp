@@ -112,6 +112,10 @@ double BesselIn(int32_t order, double x) {
     // would overflow to NaN.
     if (ax < 3.0e-8) return sign * (std::pow(0.5 * ax, dn) / FactorialFunc(static_cast<int32_t>(n)));
     if (LogLeadingTerm(n, ax) + ax * ax / (4.0 * (dn + 1.0)) < kLogUnderflow) return sign * 0.0;
+    // The result below is I_0 times a ratio in (0, 1]: once I_0 overflows so does it, and the
+    // start of the recurrence would grow without bound with x.
+    const double i0 = BesselI0(ax);
+    if (!IsFinite(i0)) return sign * kInf;
     int64_t m = 2 * (n + static_cast<int64_t>(std::sqrt(100.0 * dn)));
     // The start must also lie well past the turning point of the recurrence (m^2 - n^2 >= 78 |x|):
     // the stated start alone leaves I_3(600) 12 % off.
@@ -134,7 +138,7 @@ double BesselIn(int32_t order, double x) {
         }
         if (j == n) ans = bip;
     }
-    return sign * (BesselI0(x) * ans / bi);
+    return sign * (i0 * ans / bi);
 }
 
 double BesselKn(int32_t order, double x) {
@@ -152,7 +156,8 @@ double BesselKn(int32_t order, double x) {
     if (n == 0) return BesselK0(x);
     if (n == 1) return BesselK1(x);
     double km = BesselK0(x), k = BesselK1(x);
-    for (int64_t j = 1; j < n && IsFinite(k); ++j) {
+    // Once both terms are 0 (underflowed starts) every later one is too: stop there.
+    for (int64_t j = 1; j < n && IsFinite(k) && !(k == 0.0 && km == 0.0); ++j) {
         const double kp = km + (2.0 * static_cast<double>(j) / x) * k;
         km = k;
         k = kp;

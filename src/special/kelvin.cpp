@@ -28,7 +28,8 @@ double BlockChange(double before, double after) { return std::fabs(before - afte
 template <bool Digamma>
 bool KelvinSeries(double ax, int64_t n, double* re, double* im) {
     double term = 1.0;
-    for (int64_t j = 1; j <= n && term != 0.0; ++j) term *= 0.5 * ax / static_cast<double>(j);
+    // An infinite term stays infinite and a zero one zero: either way the rest of the product is known.
+    for (int64_t j = 1; j <= n && term != 0.0 && IsFinite(term); ++j) term *= 0.5 * ax / static_cast<double>(j);
     if (term == 0.0) {  // (x/2)^n / n! underflows: so does every term
         *re = *im = 0.0;
         return true;

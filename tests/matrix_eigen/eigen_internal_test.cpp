@@ -98,3 +98,34 @@ TEST(QzRetry, FailedExchangeIsRetriedByTheDriver) {
 }
 
 }  // namespace
+
+namespace {
+
+// Undoing a permutation swaps rows by the entries outside ilo..ihi; an entry that names no row is
+// refused, and limits the driver would refuse leave V as it is.
+TEST(EigenVBack, PermutationEntriesAreScreened) {
+    const std::vector<double> v0 = {1, 2, 3, 4, 5, 6, 7, 8, 9};
+    struct Case {
+        std::vector<double> scale;
+        int32_t ilo, ihi, status;
+        std::vector<int> rows;  // source row of each result row; empty: V emptied
+    } cases[] = {
+        {{3, 7, 3}, 1, 1, 0, {2, 1, 0}},                  // row 1 swaps with row 3, row 3 stays
+        {{4, 1, 3}, 1, 1, -20017, {}},                     // row 4 of 3
+        {{std::nan(""), 1, 3}, 1, 1, -20017, {}},          // not a row at all
+        {{0.5, 1, 3}, 1, 1, -20017, {}},                   // row 0
+        {{4, 1, 3}, 5, 5, 0, {0, 1, 2}},                   // ilo past the end: nothing done
+        {{4, 1, 3}, 0, 2, 0, {0, 1, 2}},                   // every row balanced: no entry read
+    };
+    for (const Case& c : cases) {
+        twrt::Array2D<double> v(3, 3, v0);
+        twrt::Array1D<double> scale(c.scale);
+        EXPECT_EQ(EigenVBack_head(v.h(), 1, 1, c.ilo, c.ihi, scale.h()), c.status) << c.scale[0];
+        ASSERT_EQ(v.rows(), c.rows.empty() ? 0 : 3);
+        for (size_t r = 0; r < c.rows.size(); ++r)
+            for (int32_t j = 0; j < 3; ++j)
+                EXPECT_EQ(v.at(int32_t(r), j), v0[size_t(c.rows[r]) * 3 + size_t(j)]) << r;
+    }
+}
+
+}  // namespace

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "frame/workspace.hpp"
+#include "twanlys/status.h"
 #include "twrt.h"
 
 namespace sweep {
@@ -44,7 +45,7 @@ struct Arg {
     int32_t nFields;
     int32_t recBytes;
     int32_t (*unreserve)(void**);
-    int32_t countArg;
+    int32_t countArg;  // the argument that counts a bare pointer; -(n + 1) for a fixed count n
 };
 
 struct Outcome {
@@ -69,6 +70,7 @@ struct Row {
     uint32_t work;  // outputs whose contents are working memory
     int32_t stand[4];
     Outcome (*call)(Slots&);
+    bool resultOom = false;  // ptr style whose result is 2 when it stores OutOfMemoryErr
 };
 
 // What one argument gets in one call.
@@ -91,6 +93,13 @@ inline constexpr int kPatterns = 10;
 
 inline bool IsHandle(Kind k) { return k == Kind::H1 || k == Kind::H2 || k == Kind::H3; }
 inline int Dims(Kind k) { return k == Kind::H3 ? 3 : k == Kind::H2 ? 2 : 1; }
+
+// An f32 argument by value from the f64 values: out of range is an infinity, as on the wire.
+inline float ToF32(double d) {
+    if (std::isfinite(d) && std::fabs(d) > static_cast<double>(std::numeric_limits<float>::max()))
+        return std::copysign(std::numeric_limits<float>::infinity(), d);
+    return static_cast<float>(d);
+}
 inline bool Writes(Dir d) { return d == Dir::Out || d == Dir::Io; }
 
 // Values of the data patterns: 0 moderate distinct values, 1 zeros, 2 one NaN, 3 one +Inf,
@@ -186,7 +195,10 @@ inline int32_t TypeCode(Elem e) {
 class Slots {
 public:
     Slots(const Row& row, const Case& c, void** cells) : row_(row), slot_(static_cast<size_t>(row.nArgs)) {
-        for (int32_t a = 0; a < row.nArgs; ++a) Build(a, c[static_cast<size_t>(a)], cells[a]);
+        // Bare pointers last: their element count comes from another argument, which may follow.
+        for (int pass = 0; pass < 2; ++pass)
+            for (int32_t a = 0; a < row.nArgs; ++a)
+                if ((row.args[a].kind == Kind::Buf) == (pass == 1)) Build(a, c[static_cast<size_t>(a)], cells[a]);
     }
     Slots(const Slots&) = delete;
     Slots& operator=(const Slots&) = delete;
@@ -331,7 +343,7 @@ private:
                 }
                 break;
             case Kind::Buf: {
-                const int32_t n = std::clamp(slot_[arg.countArg].i, 0, 4096);
+                const int32_t n = arg.countArg < 0 ? -arg.countArg - 1 : std::clamp(slot_[arg.countArg].i, 0, 4096);
                 // A bare pointer into a packed host block may be only 4-byte aligned.
                 s.offset = TWRTPlacement() == 0 ? 4 : 0;
                 s.bytes.assign(s.offset + static_cast<size_t>(n) * static_cast<size_t>(arg.elemBytes) + 1, 0);
@@ -392,7 +404,8 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
         switch (row.style) {
             case Style::Ret: status = result; break;
             case Style::Ptr:
-                if (result != 0 && !(row.resultHost && hostFailed && result == TWRTResizeFailed))
+                if (result != 0 && !(row.resultHost && hostFailed && result == TWRTResizeFailed) &&
+                    !(row.resultOom && result == 2 && (statusArg < 0 || s.IsNull(statusArg) || stored == OutOfMemoryErr)))
                     fault("result " + std::to_string(result) + " where the status goes through the pointer");
                 status = stored;
                 known = statusArg >= 0 && !s.IsNull(statusArg);
