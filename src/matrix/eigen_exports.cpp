@@ -57,7 +57,7 @@ Status ComplexEigen(Handle& a, int32_t hermitian, int32_t output, Handle& values
     Scratch<cdouble> work;
     const bool wantV = output != 0;
     if (s == 0) s = work.Allocate(static_cast<size_t>(n) + (wantV ? Square(n) : 0));
-    cdouble* vecs = wantV ? work.get() + n : nullptr;
+    cdouble* vecs = s == 0 && wantV ? work.get() + n : nullptr;
     if (s == 0)
         s = hermitian != 0 ? HermitianEigen(pa, n, output, work.get(), vecs) : CxGeneralEigen(pa, n, output, work.get(), vecs);
     cdouble *pv = nullptr, *pz = nullptr;
@@ -83,7 +83,7 @@ Status Symmetric(Handle& a, int32_t output, Handle& values, int32_t* host) {
     if (s == 0) s = f.In2D(a, &pa);
     Scratch<double> work;
     if (s == 0) s = work.Allocate(static_cast<size_t>(n) + (wantV ? Square(n) : 0));
-    double* vecs = wantV ? work.get() + n : nullptr;
+    double* vecs = s == 0 && wantV ? work.get() + n : nullptr;
     if (s == 0) s = SymmetricEigen(pa, n, output, work.get(), vecs);
     double *pv = nullptr, *pz = nullptr;
     if (s == 0) s = Out1D(f, values, n, &pv, host);
@@ -156,7 +156,7 @@ Status Schur(Handle& a, int32_t wantQ, uint32_t order, Handle& q, Handle& values
     Scratch<cdouble> w;
     if (s == 0) s = work.Allocate(Square(n) * (withQ ? 2 : 1));
     if (s == 0) s = w.Allocate(static_cast<size_t>(n));
-    T* qb = withQ ? work.get() + Square(n) : nullptr;
+    T* qb = s == 0 && withQ ? work.get() + Square(n) : nullptr;
     if (s == 0) {
         if constexpr (kIsComplex<T>)
             s = CxSchurDecomp(pa, n, order, nullptr, nullptr, qb, work.get(), w.get());
@@ -277,9 +277,12 @@ Status TmiQz(Handle& a, Handle& b, Handle& q, Handle& z, Handle& alpha, Handle& 
     Scratch<cdouble> al;
     if (s == 0) s = work.Allocate(6 * Square(n) + static_cast<size_t>(n));
     if (s == 0) s = al.Allocate(static_cast<size_t>(n));
-    T* blocks[6];
-    for (int k = 0; k < 6; ++k) blocks[k] = work.get() + Square(n) * static_cast<size_t>(k);
-    T* bt = work.get() + 6 * Square(n);
+    T* blocks[6] = {};
+    T* bt = nullptr;
+    if (s == 0) {  // the blocks exist only once the allocation stood
+        for (int k = 0; k < 6; ++k) blocks[k] = work.get() + Square(n) * static_cast<size_t>(k);
+        bt = work.get() + 6 * Square(n);
+    }
     if (s == 0)
         s = QzWithRetry<T>(!kIsComplex<T>, pa, pb, n, 0, 1, 0, blocks[0], blocks[1], blocks[2], blocks[3], al.get(),
                            bt, wantR ? blocks[4] : nullptr, wantL ? blocks[5] : nullptr);

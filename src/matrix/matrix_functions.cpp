@@ -86,7 +86,10 @@ template <class T> Status MatrixExp(T* a, int32_t n) {
     }
     int32_t s = 0;
     if (norm >= 0.5) {
-        s = static_cast<int32_t>(std::log(norm) / std::log(2.0) + 1.0);
+        // A row sum of finite entries can still overflow; n entries below 2^1024 sum below 2^(1024 + log2 n).
+        const double bits = std::isfinite(norm) ? std::log(norm) / std::log(2.0)
+                                                : 1024.0 + std::log2(static_cast<double>(n));
+        s = static_cast<int32_t>(bits + 1.0);
         // Division by 2^s through the exponent, so that s = 1025 (2^s not representable) still scales.
         for (size_t i = 0; i < nn; ++i) a[i] = ScaleByPowerOf2(a[i], -s);
     }
