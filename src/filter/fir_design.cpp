@@ -132,7 +132,9 @@ Status NarrowbandDesign(double fs, double f1, double f2, double c, double ripple
         std::swap(ripple, ds);
         break;
     }
-    if (!(f1 > 0.0) || !(f2 > f1) || !(f2 < half) || !(ds > 0.0) || !(ripple > 0.0)) return DesignParameterErr;
+    // An infinite rate leaves no finite design (and the stage search below would not end).
+    if (!(f1 > 0.0) || !(f2 > f1) || !(f2 < half) || !(ds > 0.0) || !(ripple > 0.0) || !std::isfinite(half))
+        return DesignParameterErr;
     const double target = ripple / 2.0;
     const double w = target / ds;
 
@@ -142,7 +144,7 @@ Status NarrowbandDesign(double fs, double f1, double f2, double c, double ripple
         double l = std::floor(fs / (f1 + f2 + std::sqrt((f2 - f1) * fs)) + 0.5);
         while (l * f2 >= half) l -= 1.0;
         // A wide transition can round the estimate to 0: one stage is then the only choice.
-        L = l < 1.0 ? 1 : static_cast<int32_t>(std::min(l, 1e9));
+        L = !(l >= 1.0) ? 1 : static_cast<int32_t>(std::min(l, 1e9));
         I = L == 1 ? 0 : KaiserLength(0.5 * ripple * ds, (fs / L - f2 - f1) / fs);
         M = KaiserLength(0.5 * ripple * ds, (L * f2 - L * f1) / fs);
         const int32_t single = KaiserLength(ripple * ds, (f2 - f1) / fs);

@@ -63,7 +63,7 @@ Status RunDirect(Cells<In> x, Cells<Out> y, int32_t n, Handle a, int32_t na, Han
         if (s == 0 && na > 0) s = PrepareState(*ys, na - 1, keep, &yc);
     } else if constexpr (std::is_same_v<In, Out>) {
         s = PrepareState(xs, nb - 1 + (na > 0 ? na - 1 : 0), keep, &xc);
-        yc = Cells<Out>(xc.p + static_cast<int64_t>(nb - 1) * static_cast<int64_t>(sizeof(In)));
+        if (s == 0) yc = Cells<Out>(xc.p + static_cast<int64_t>(nb - 1) * static_cast<int64_t>(sizeof(In)));
     }
     if (s == 0) s = tw::IirDirectFilter(x, y, n, Elements<C>(a), na, Elements<C>(b), nb, xc, yc);
     return s;

@@ -373,8 +373,10 @@ void Balanc(T* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
         }
     }
     for (int32_t i = k; i <= l; ++i) scale[i] = 1;
-    for (bool noconv = true; noconv;) {
-        noconv = false;
+    // Subnormal entries can make the scalings cycle; a hundred passes is far beyond what any
+    // matrix of normal numbers needs.
+    for (int32_t pass = 0, noconv = 1; noconv && pass < 100; ++pass) {
+        noconv = 0;
         for (int32_t i = k; i <= l; ++i) {
             double c = 0, r = 0;
             for (int32_t j = k; j <= l; ++j) {
@@ -386,19 +388,21 @@ void Balanc(T* a, int32_t n, int32_t* low, int32_t* igh, double* scale) {
             if (c == 0 || r == 0 || !std::isfinite(c + r)) continue;
             double g = r / radix, f = 1;
             const double s = c + r;
-            while (c < g) {
+            // The factors stay within the normal range, as subnormal or overflowing entries would
+            // otherwise drive them (and the passes) on for a very long time.
+            while (c < g && f < 0x1p500 && c < 0x1p1000) {
                 f *= radix;
                 c *= b2;
             }
             g = r * radix;
-            while (c >= g) {
+            while (c >= g && f > 0x1p-500 && c > 0x1p-1000) {
                 f /= radix;
                 c /= b2;
             }
             if ((c + r) / f >= 0.95 * s) continue;
             g = 1 / f;
             scale[i] *= f;
-            noconv = true;
+            noconv = 1;
             for (int32_t j = k; j < n; ++j) A(i, j) *= g;
             for (int32_t j = 0; j <= l; ++j) A(j, i) *= f;
         }

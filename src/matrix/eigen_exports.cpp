@@ -233,10 +233,10 @@ Status Qz80(Handle& a, Handle& b, int32_t mode, uint32_t order, Handle& alpha, H
     Scratch<cdouble> al;
     if (s == 0) s = work.Allocate(3 * Square(n) + static_cast<size_t>(n));
     if (s == 0) s = al.Allocate(static_cast<size_t>(n));
-    T* q = work.get();
-    T* z = q + Square(n);
-    T* right = z + Square(n);
-    T* bt = right + Square(n);
+    T* q = s == 0 ? work.get() : nullptr;  // the blocks exist only once the allocation stood
+    T* z = q != nullptr ? q + Square(n) : nullptr;
+    T* right = z != nullptr ? z + Square(n) : nullptr;
+    T* bt = right != nullptr ? right + Square(n) : nullptr;
     if (s == 0)
         s = QzWithRetry<T>(true, pa, pb, n, 1, mode != 0 ? 1 : 0, static_cast<int32_t>(order), nullptr, nullptr, q, z,
                            al.get(), bt, right, nullptr);
@@ -328,8 +328,8 @@ Status GenEigen(Handle a, Handle b, int32_t wantVectors, Handle& values, Handle&
     Scratch<cdouble> al;
     if (s == 0) s = work.Allocate((wantV ? Square(n) : 0) + static_cast<size_t>(n));
     if (s == 0) s = al.Allocate(static_cast<size_t>(n));
-    T* bt = work.get();
-    T* right = wantV ? bt + n : nullptr;
+    T* bt = s == 0 ? work.get() : nullptr;
+    T* right = s == 0 && wantV ? bt + n : nullptr;
     if (s == 0)
         s = QzWithRetry<T>(true, pa, pb, n, 1, 0, 0, nullptr, nullptr, nullptr, nullptr, al.get(), bt, right, nullptr);
     cdouble *pv = nullptr, *pz = nullptr;

@@ -142,9 +142,9 @@ Status Divisor(Handle a, Handle b, double tol, Handle& gcd, Handle& qa, Handle& 
     if (s == 0) s = work.Allocate(Sz(std::max(na, nb)) + Sz(na) + Sz(nb));
     int32_t ng = 0, nu = 0, nv = 0;
     double res = kNaN;
-    T* g = work.get();
-    T* u = g + std::max(na, nb);
-    T* v = u + na;
+    T* g = s == 0 ? work.get() : nullptr;  // the parts exist only once the allocation stood
+    T* u = g != nullptr ? g + std::max(na, nb) : nullptr;
+    T* v = u != nullptr ? u + na : nullptr;
     if (s == 0) s = PolyGcd<T>(pa, na, pb, nb, tol, g, &ng, u, &nu, v, &nv, &res);
     T *pg = nullptr, *pu = nullptr, *pv = nullptr;
     if (s == 0) s = Out(f, gcd, ng, &pg);
