@@ -26,6 +26,7 @@ std::atomic<int64_t> g_live{0};
 std::atomic<int32_t> g_failedTotal{-1};
 std::atomic<int32_t> g_aligned{0};
 std::atomic<int32_t> g_resizeMode{0};
+std::atomic<int64_t> g_blockLimit{0};
 
 constexpr size_t kSlack = 128 + sizeof(Prefix);
 
@@ -151,6 +152,8 @@ int32_t HostResizeBlock(int32_t typeCode, int32_t dims, TWRTHandle* handle, int3
         return TWRTResizeFailed;
     const size_t header = dims == 2 ? 8 : 4;
     const size_t bytes = header + static_cast<size_t>(totalElements) * static_cast<size_t>(elem);
+    const int64_t limit = g_blockLimit.load(std::memory_order_relaxed);
+    if (limit > 0 && bytes > static_cast<size_t>(limit)) return TWRTResizeFailed;
     const int32_t mode = g_resizeMode.load(std::memory_order_relaxed);
     void* old = **handle;
     const Prefix before = old != nullptr ? ReadPrefix(old) : Prefix{};
@@ -227,6 +230,7 @@ int64_t TWRTResizeCount(void) { return g_resizes.load(std::memory_order_relaxed)
 int64_t TWRTAllocCount(void) { return g_allocs.load(std::memory_order_relaxed); }
 void TWRTSetResizeMode(int32_t mode) { g_resizeMode.store(mode & (TWRTResizeMove | TWRTResizePoison), std::memory_order_relaxed); }
 int32_t TWRTResizeMode(void) { return g_resizeMode.load(std::memory_order_relaxed); }
+void TWRTSetBlockLimit(int64_t bytes) { g_blockLimit.store(bytes < 0 ? 0 : bytes, std::memory_order_relaxed); }
 void TWRTSetPlacement(int32_t aligned) { g_aligned.store(aligned != 0, std::memory_order_relaxed); }
 int32_t TWRTPlacement(void) { return g_aligned.load(std::memory_order_relaxed); }
 

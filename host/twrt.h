@@ -57,6 +57,9 @@ int32_t TWRTPlacement(void);
 enum { TWRTResizeMove = 1, TWRTResizePoison = 2, kTWRTPoisonByte = 0x7F };
 void TWRTSetResizeMode(int32_t mode);
 int32_t TWRTResizeMode(void);
+/* Largest block, in bytes with its dimension words, that a resize grants (0: no limit, the
+ * default). A larger request fails as it would on a host short of memory. */
+void TWRTSetBlockLimit(int64_t bytes);
 /* Element size of a type code, 0 for an unknown code. */
 int32_t TWRTElementSize(int32_t typeCode);
 

@@ -53,4 +53,15 @@ TEST(HostResize, ModesKeepElementsAndPlaceBlocksAsStated) {
     }
 }
 
+TEST(HostResize, BlockLimitRefusesLargerRequestsAndKeepsTheBlock) {
+    twrt::Array1D<double> a(std::vector<double>{1, 2, 3});
+    TWRTSetBlockLimit(4 + 8 * 100);  // dimension word and 100 elements
+    EXPECT_EQ(Resize(a, 100), 0);
+    void** h = a.h();
+    EXPECT_EQ(HostResizeBlock(10, 1, &h, 101), TWRTResizeFailed);
+    TWRTSetBlockLimit(0);
+    EXPECT_EQ(a[2], 3.0);
+    EXPECT_EQ(Resize(a, 101), 0);
+}
+
 }  // namespace
