@@ -3,8 +3,10 @@
 // package left it, whatever the flag, so a warning (precision reduced) still carries its value.
 //
 // Refusals made here, before the package is reached, leave out untouched as the package's own
-// input error does: a null pointer or a NaN in the order or in z is SpecialFunctionInputErr (the
-// package itself has no NaN test and would convert a NaN order to an integer).
+// refusals do: a null pointer or a NaN in the order or in z is SpecialFunctionInputErr (the package
+// itself has no NaN test and would convert a NaN order to an integer); an infinite part of z is
+// SpecialFunctionDomainErr, the flag the package gives any |z| beyond its range (its modulus
+// would make a NaN of |z| when both parts are infinite).
 #include <cstdint>
 #include <cstring>
 
@@ -46,6 +48,7 @@ enum class Fn { J, Y, I, K, H };
 // One Bessel value of real order: the package's driver and the status of its flag.
 Status Bessel(Fn fn, double v, Cx z, int kode, int m, ComplexDouble* out) {
     if (IsNaN(v) || IsNaN(z.re) || IsNaN(z.im)) return SpecialFunctionInputErr;
+    if (!IsFinite(z.re) || !IsFinite(z.im)) return SpecialFunctionDomainErr;
     double cyr[1] = {0.0}, cyi[1] = {0.0};
     Cx old = LoadCx(out);
     cyr[0] = old.re;
@@ -152,6 +155,7 @@ TW_API AnalysisStatus TW_CxAiry(const ComplexDouble* z, const int32_t* function,
     if (z == nullptr || scaling == nullptr || out == nullptr) return SpecialFunctionInputErr;
     const Cx zz = LoadCx(z);
     if (IsNaN(zz.re) || IsNaN(zz.im)) return SpecialFunctionInputErr;
+    if (!IsFinite(zz.re) || !IsFinite(zz.im)) return SpecialFunctionDomainErr;
     const int id = (f - 1) % 2, kode = PlusOne(LoadI32(scaling));
     const Cx old = LoadCx(out);
     double re = old.re, im = old.im;

@@ -164,6 +164,11 @@ class Statuses(unittest.TestCase):
         self.assertEqual(J(1, 2e9 + 0j), (-20117, SENTINEL))
         self.assertEqual(K(0, -2e9j), (-20117, SENTINEL))
         self.assertEqual(airy(3e6 + 0j, 1)[0], -20117)
+        # An infinite part is out of range the same way, also where |z| itself would be NaN.
+        inf = math.inf
+        for call in (lambda: J(1, complex(inf, 0)), lambda: K(0, complex(inf, -inf)),
+                     lambda: H(1, complex(-inf, inf), 0, 1), lambda: airy(complex(inf, inf), 3)):
+            self.assertEqual(call(), (-20117, SENTINEL))
 
     def test_spherical_forms_pass_an_inner_status_on_as_internal_error_unmultiplied(self):
         st, got = Js(1, 4e4 + 0j)
