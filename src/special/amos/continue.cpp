@@ -322,7 +322,8 @@ L100:
     if (nw < 0) goto L130;
     return;
 L110:
-    // Increment fnu + nn - 1 up to fnul, compute and recur backward.
+    // Increment fnu + nn - 1 up to fnul, compute and recur backward. nui is the integer part of
+    // fnul - dfnu + 1, so no step is taken once dfnu is above fnul.
     nui = static_cast<int>(fnul - dfnu + 1.0);
     nui = std::max(nui, 0);
     zbuni(zr, zi, fnu, kode, nn, cyr, cyi, &nw, nui, &nlast, fnul, tol, elim, alim);

@@ -1,5 +1,9 @@
 // The drivers of the complex Bessel and Airy package, after Amos, TOMS 644: argument checks, the
 // machine-dependent limits, and the reduction of J, Y, H, Ai, Bi to I and K.
+//
+// Integer parts of orders and moduli are taken in double precision throughout, as in the revised
+// form of the package: rounding to single precision first would make 3 - 1e-7 an order 3 with a
+// fractional part of the wrong sign, which costs about 1e-7 of accuracy just below an integer.
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
