@@ -41,6 +41,35 @@ TW_API void TW_Airy(double x, double* ai, double* bi, double* aip, double* bip);
 TW_API void TW_KelvinI(double x, int32_t n, double* ber, double* bei);
 TW_API void TW_KelvinK(double x, int32_t n, double* ker, double* kei);
 
+/* Complex Bessel functions of real order v >= 0 and complex z: J, Y, I, K and the Hankel function
+ * of the first (kind 0) or second (kind 1) kind. scaling 1 gives the scaled forms
+ * exp(-|Im z|) J, exp(-|Im z|) Y, exp(-|Re z|) I, exp(z) K, exp(-i z) H1 and exp(i z) H2; 0 the
+ * functions themselves. The status tells an input error, overflow, reduced or lost precision;
+ * out holds the value computed, also when the status is not 0. */
+TW_API AnalysisStatus TW_CxBesselJr(const double* v, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselYr(const double* v, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselIr(const double* v, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselKr(const double* v, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselHr(const double* v, const ComplexDouble* z, const int32_t* kind,
+                                    const int32_t* scaling, ComplexDouble* out);
+/* Spherical forms: the function of order + 1/2 times (pi/2)/z. Any non-zero status of the inner
+ * function ends as InternalErr with out holding the inner value, not multiplied. */
+TW_API AnalysisStatus TW_CxBesselJs(const double* order, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselYs(const double* order, const ComplexDouble* z, const int32_t* scaling,
+                                    ComplexDouble* out);
+TW_API AnalysisStatus TW_CxBesselHs(const double* order, const ComplexDouble* z, const int32_t* kind,
+                                    const int32_t* scaling, ComplexDouble* out);
+/* Complex Airy functions: function 1 Ai, 2 Ai', 3 Bi, 4 Bi'; scaling 1 gives exp(zeta) Ai,
+ * exp(zeta) Ai' and exp(-|Re zeta|) Bi, Bi' with zeta = (2/3) z^(3/2). Another function is
+ * InvalidSelectorErr, out untouched. */
+TW_API AnalysisStatus TW_CxAiry(const ComplexDouble* z, const int32_t* function, const int32_t* scaling,
+                                ComplexDouble* out);
+
 /* Elliptic integrals in the parameter m (not the modulus k): F(phi | m) and E(phi | m); NaN as phi
  * selects the complete K(m), E(m). */
 TW_API void TW_Elliptic1(double m, double phi, double* out);

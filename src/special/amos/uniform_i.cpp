@@ -1,0 +1,692 @@
+// I for large order by the uniform asymptotic expansions, after Amos, TOMS 644: zuoik (the overflow
+// and underflow pre-test), zuni1 (Debye expansion, |arg z| <= pi/3), zuni2 (Airy-type expansion,
+// pi/3 < |arg z| <= pi/2) and zbuni (either one, with backward recurrence from a larger order).
+#include <algorithm>
+
+#include "special/amos/amos.hpp"
+
+namespace tw::amos {
+
+void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double* yr, double* yi, int* nuf,
+           double tol, double elim, double alim) {
+    namespace d = data::zuoik;
+    double cwrkr[16], cwrki[16];
+    double phir = 0.0, phii = 0.0, argr = 0.0, argi = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0,
+           zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0, sumr = 0.0, sumi = 0.0;
+    double czr = 0.0, czi = 0.0, aarg = 0.0, str = 0.0, sti = 0.0;
+    int init = 0, idum = 0, nw = 0;
+    *nuf = 0;
+    int nn = n;
+    double zrr = zr;
+    double zri = zi;
+    if (zr < 0.0) {
+        zrr = -zr;
+        zri = -zi;
+    }
+    const double zbr = zrr;
+    const double zbi = zri;
+    double ax = std::fabs(zr) * 1.7321;
+    double ay = std::fabs(zi);
+    const int iform = ay > ax ? 2 : 1;
+    double gnu = std::fmax(fnu, 1.0);
+    if (ikflg != 1) {
+        const double fnn = static_cast<double>(nn);
+        const double gnn = fnu + fnn - 1.0;
+        gnu = std::fmax(gnn, fnn);
+    }
+    // The rotated argument for the Airy-type expansion (only used when iform = 2).
+    double znr = zri;
+    double zni = -zrr;
+    if (zi <= 0.0) znr = -znr;
+    if (iform != 2) {
+        init = 0;
+        zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi,
+              cwrkr, cwrki);
+        czr = zeta2r - zeta1r;
+        czi = zeta2i - zeta1i;
+    } else {
+        zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
+              &bsumr, &bsumi);
+        czr = zeta2r - zeta1r;
+        czi = zeta2i - zeta1i;
+        aarg = zabs(argr, argi);
+    }
+    if (kode != 1) {
+        czr = czr - zbr;
+        czi = czi - zbi;
+    }
+    if (ikflg != 1) {
+        czr = -czr;
+        czi = -czi;
+    }
+    double aphi = zabs(phir, phii);
+    double rcz = czr;
+    // Overflow test.
+    if (rcz > elim) {
+        *nuf = -1;
+        return;
+    }
+    if (rcz >= alim) {
+        rcz = rcz + std::log(aphi);
+        if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
+        if (rcz > elim) {
+            *nuf = -1;
+            return;
+        }
+    } else {
+        // Underflow test.
+        bool under = rcz < -elim;
+        if (!under && rcz <= -alim) {
+            rcz = rcz + std::log(aphi);
+            if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
+            if (rcz > -elim) {
+                const double ascle = 1.0e+3 * kD1Mach1 / tol;
+                zlog(phir, phii, &str, &sti, &idum);
+                czr = czr + str;
+                czi = czi + sti;
+                if (iform != 1) {
+                    zlog(argr, argi, &str, &sti, &idum);
+                    czr = czr - 0.25 * str - d::AIC;
+                    czi = czi - 0.25 * sti;
+                }
+                ax = std::exp(rcz) / tol;
+                ay = czi;
+                czr = ax * std::cos(ay);
+                czi = ax * std::sin(ay);
+                zuchk(czr, czi, &nw, ascle, tol);
+                under = nw != 0;
+            } else {
+                under = true;
+            }
+        }
+        if (under) {
+            for (int i = 1; i <= nn; ++i) {
+                yr[i - 1] = d::ZEROR;
+                yi[i - 1] = d::ZEROI;
+            }
+            *nuf = nn;
+            return;
+        }
+    }
+    if (ikflg == 2 || n == 1) return;
+    // Set underflows on I sequences, from the top order down.
+    while (true) {
+        gnu = fnu + static_cast<double>(nn - 1);
+        if (iform != 2) {
+            init = 0;
+            zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr,
+                  &sumi, cwrkr, cwrki);
+            czr = zeta2r - zeta1r;
+            czi = zeta2i - zeta1i;
+        } else {
+            zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr,
+                  &asumi, &bsumr, &bsumi);
+            czr = zeta2r - zeta1r;
+            czi = zeta2i - zeta1i;
+            aarg = zabs(argr, argi);
+        }
+        if (kode != 1) {
+            czr = czr - zbr;
+            czi = czi - zbi;
+        }
+        aphi = zabs(phir, phii);
+        rcz = czr;
+        bool under = rcz < -elim;
+        if (!under) {
+            if (rcz > -alim) return;
+            rcz = rcz + std::log(aphi);
+            if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
+            if (rcz > -elim) {
+                const double ascle = 1.0e+3 * kD1Mach1 / tol;
+                zlog(phir, phii, &str, &sti, &idum);
+                czr = czr + str;
+                czi = czi + sti;
+                if (iform != 1) {
+                    zlog(argr, argi, &str, &sti, &idum);
+                    czr = czr - 0.25 * str - d::AIC;
+                    czi = czi - 0.25 * sti;
+                }
+                ax = std::exp(rcz) / tol;
+                ay = czi;
+                czr = ax * std::cos(ay);
+                czi = ax * std::sin(ay);
+                zuchk(czr, czi, &nw, ascle, tol);
+                if (nw == 0) return;
+            }
+        }
+        yr[nn - 1] = d::ZEROR;
+        yi[nn - 1] = d::ZEROI;
+        nn = nn - 1;
+        *nuf = *nuf + 1;
+        if (nn == 0) return;
+    }
+}
+
+void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, int* nlast,
+           double fnul, double tol, double elim, double alim) {
+    namespace d = data::zuni1;
+    double bry[3], cwrkr[16], cwrki[16], cssr[3], csrr[3], cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
+    double phir = 0.0, phii = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0, zeta2i = 0.0, sumr = 0.0, sumi = 0.0;
+    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0, rast = 0.0;
+    int iflag = 0, init = 0, nn = 0, nuf = 0, nw = 0;
+    *nz = 0;
+    int nd = n;
+    *nlast = 0;
+    // Computed values with exponents between alim and elim in magnitude are scaled to keep
+    // intermediate arithmetic on scale, exp(alim) = exp(elim)*tol.
+    const double cscl = 1.0 / tol;
+    const double crsc = tol;
+    cssr[0] = cscl;
+    cssr[1] = d::CONER;
+    cssr[2] = crsc;
+    csrr[0] = crsc;
+    csrr[1] = d::CONER;
+    csrr[2] = cscl;
+    bry[0] = 1.0e+3 * kD1Mach1 / tol;
+    // Check for underflow and overflow on the first member.
+    double fn = std::fmax(fnu, 1.0);
+    init = 0;
+    zunik(zr, zi, fn, 1, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi, cwrkr,
+          cwrki);
+    if (kode != 1) {
+        str = zr + zeta2r;
+        sti = zi + zeta2i;
+        rast = fn / zabs(str, sti);
+        str = str * rast * rast;
+        sti = -sti * rast * rast;
+        s1r = str - zeta1r;
+        s1i = sti - zeta1i;
+    } else {
+        s1r = zeta2r - zeta1r;
+        s1i = zeta2i - zeta1i;
+    }
+    rs1 = s1r;
+    if (std::fabs(rs1) > elim) {
+        if (rs1 > 0.0) {
+            *nz = -1;
+            return;
+        }
+        *nz = n;
+        for (int i = 1; i <= n; ++i) {
+            yr[i - 1] = d::ZEROR;
+            yi[i - 1] = d::ZEROI;
+        }
+        return;
+    }
+L30:
+    nn = std::min(2, nd);
+    for (int i = 1; i <= nn; ++i) {
+        fn = fnu + static_cast<double>(nd - i);
+        init = 0;
+        zunik(zr, zi, fn, 1, 0, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi, cwrkr,
+              cwrki);
+        if (kode != 1) {
+            str = zr + zeta2r;
+            sti = zi + zeta2i;
+            rast = fn / zabs(str, sti);
+            str = str * rast * rast;
+            sti = -sti * rast * rast;
+            s1r = str - zeta1r;
+            s1i = sti - zeta1i + zi;
+        } else {
+            s1r = zeta2r - zeta1r;
+            s1i = zeta2i - zeta1i;
+        }
+        // Test for underflow and overflow.
+        rs1 = s1r;
+        if (std::fabs(rs1) > elim) goto L110;
+        if (i == 1) iflag = 2;
+        if (std::fabs(rs1) >= alim) {
+            // Refine the test and scale.
+            const double aphi = zabs(phir, phii);
+            rs1 = rs1 + std::log(aphi);
+            if (std::fabs(rs1) > elim) goto L110;
+            if (i == 1) iflag = 1;
+            if (rs1 >= 0.0) {
+                if (i == 1) iflag = 3;
+            }
+        }
+        // Scale s1 if |s1| < ascle.
+        s2r = phir * sumr - phii * sumi;
+        s2i = phir * sumi + phii * sumr;
+        str = std::exp(s1r) * cssr[iflag - 1];
+        s1r = str * std::cos(s1i);
+        s1i = str * std::sin(s1i);
+        str = s2r * s1r - s2i * s1i;
+        s2i = s2r * s1i + s2i * s1r;
+        s2r = str;
+        if (iflag == 1) {
+            zuchk(s2r, s2i, &nw, bry[0], tol);
+            if (nw != 0) goto L110;
+        }
+        cyr[i - 1] = s2r;
+        cyi[i - 1] = s2i;
+        const int m = nd - i + 1;
+        yr[m - 1] = s2r * csrr[iflag - 1];
+        yi[m - 1] = s2i * csrr[iflag - 1];
+    }
+    if (nd > 2) {
+        // Recur backward for the rest.
+        rast = 1.0 / zabs(zr, zi);
+        str = zr * rast;
+        sti = -zi * rast;
+        const double rzr = (str + str) * rast;
+        const double rzi = (sti + sti) * rast;
+        bry[1] = 1.0 / bry[0];
+        bry[2] = kD1Mach2;
+        s1r = cyr[0];
+        s1i = cyi[0];
+        s2r = cyr[1];
+        s2i = cyi[1];
+        double c1r = csrr[iflag - 1];
+        double ascle = bry[iflag - 1];
+        int k = nd - 2;
+        fn = static_cast<double>(k);
+        for (int i = 3; i <= nd; ++i) {
+            double c2r = s2r;
+            double c2i = s2i;
+            s2r = s1r + (fnu + fn) * (rzr * c2r - rzi * c2i);
+            s2i = s1i + (fnu + fn) * (rzr * c2i + rzi * c2r);
+            s1r = c2r;
+            s1i = c2i;
+            c2r = s2r * c1r;
+            c2i = s2i * c1r;
+            yr[k - 1] = c2r;
+            yi[k - 1] = c2i;
+            k = k - 1;
+            fn = fn - 1.0;
+            if (iflag >= 3) continue;
+            str = std::fabs(c2r);
+            sti = std::fabs(c2i);
+            const double c2m = std::fmax(str, sti);
+            if (c2m <= ascle) continue;
+            iflag = iflag + 1;
+            ascle = bry[iflag - 1];
+            s1r = s1r * c1r;
+            s1i = s1i * c1r;
+            s2r = c2r;
+            s2i = c2i;
+            s1r = s1r * cssr[iflag - 1];
+            s1i = s1i * cssr[iflag - 1];
+            s2r = s2r * cssr[iflag - 1];
+            s2i = s2i * cssr[iflag - 1];
+            c1r = csrr[iflag - 1];
+        }
+    }
+    return;
+L110:
+    // Set underflow and update parameters.
+    if (rs1 > 0.0) {
+        *nz = -1;
+        return;
+    }
+    yr[nd - 1] = d::ZEROR;
+    yi[nd - 1] = d::ZEROI;
+    *nz = *nz + 1;
+    nd = nd - 1;
+    if (nd == 0) return;
+    zuoik(zr, zi, fnu, kode, 1, nd, yr, yi, &nuf, tol, elim, alim);
+    if (nuf < 0) {
+        *nz = -1;
+        return;
+    }
+    nd = nd - nuf;
+    *nz = *nz + nuf;
+    if (nd == 0) return;
+    fn = fnu + static_cast<double>(nd - 1);
+    if (fn >= fnul) goto L30;
+    *nlast = nd;
+}
+
+void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, int* nlast,
+           double fnul, double tol, double elim, double alim) {
+    namespace d = data::zuni2;
+    double bry[3], cssr[3], csrr[3], cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
+    double phir = 0.0, phii = 0.0, argr = 0.0, argi = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0,
+           zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0;
+    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0, rast = 0.0;
+    double air = 0.0, aii = 0.0, dair = 0.0, daii = 0.0;
+    int iflag = 0, nn = 0, nuf = 0, nw = 0, nai = 0, ndai = 0, idum = 0;
+    *nz = 0;
+    int nd = n;
+    *nlast = 0;
+    // Computed values with exponents between alim and elim in magnitude are scaled to keep
+    // intermediate arithmetic on scale, exp(alim) = exp(elim)*tol.
+    const double cscl = 1.0 / tol;
+    const double crsc = tol;
+    cssr[0] = cscl;
+    cssr[1] = d::CONER;
+    cssr[2] = crsc;
+    csrr[0] = crsc;
+    csrr[1] = d::CONER;
+    csrr[2] = cscl;
+    bry[0] = 1.0e+3 * kD1Mach1 / tol;
+    // zn is in the right half plane after rotation by ci or -ci.
+    double znr = zi;
+    double zni = -zr;
+    const double zbr = zr;
+    double zbi = zi;
+    double cidi = -d::CONER;
+    const int inu = static_cast<int>(fnu);
+    const double ang = d::HPI * (fnu - static_cast<double>(inu));
+    double c2r = std::cos(ang);
+    double c2i = std::sin(ang);
+    const double car = c2r;
+    const double sar = c2i;
+    int in = inu + n - 1;
+    in = in % 4 + 1;
+    str = c2r * d::CIPR[in - 1] - c2i * d::CIPI[in - 1];
+    c2i = c2r * d::CIPI[in - 1] + c2i * d::CIPR[in - 1];
+    c2r = str;
+    if (zi <= 0.0) {
+        znr = -znr;
+        zbi = -zbi;
+        cidi = -cidi;
+        c2i = -c2i;
+    }
+    // Check for underflow and overflow on the first member.
+    double fn = std::fmax(fnu, 1.0);
+    zunhj(znr, zni, fn, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
+          &bsumr, &bsumi);
+    if (kode != 1) {
+        str = zbr + zeta2r;
+        sti = zbi + zeta2i;
+        rast = fn / zabs(str, sti);
+        str = str * rast * rast;
+        sti = -sti * rast * rast;
+        s1r = str - zeta1r;
+        s1i = sti - zeta1i;
+    } else {
+        s1r = zeta2r - zeta1r;
+        s1i = zeta2i - zeta1i;
+    }
+    rs1 = s1r;
+    if (std::fabs(rs1) > elim) {
+        if (rs1 > 0.0) {
+            *nz = -1;
+            return;
+        }
+        *nz = n;
+        for (int i = 1; i <= n; ++i) {
+            yr[i - 1] = d::ZEROR;
+            yi[i - 1] = d::ZEROI;
+        }
+        return;
+    }
+L40:
+    nn = std::min(2, nd);
+    for (int i = 1; i <= nn; ++i) {
+        fn = fnu + static_cast<double>(nd - i);
+        zunhj(znr, zni, fn, 0, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
+              &bsumr, &bsumi);
+        if (kode != 1) {
+            str = zbr + zeta2r;
+            sti = zbi + zeta2i;
+            rast = fn / zabs(str, sti);
+            str = str * rast * rast;
+            sti = -sti * rast * rast;
+            s1r = str - zeta1r;
+            s1i = sti - zeta1i + std::fabs(zi);
+        } else {
+            s1r = zeta2r - zeta1r;
+            s1i = zeta2i - zeta1i;
+        }
+        // Test for underflow and overflow.
+        rs1 = s1r;
+        if (std::fabs(rs1) > elim) goto L120;
+        if (i == 1) iflag = 2;
+        if (std::fabs(rs1) >= alim) {
+            // Refine the test and scale.
+            const double aphi = zabs(phir, phii);
+            const double aarg = zabs(argr, argi);
+            rs1 = rs1 + std::log(aphi) - 0.25 * std::log(aarg) - d::AIC;
+            if (std::fabs(rs1) > elim) goto L120;
+            if (i == 1) iflag = 1;
+            if (rs1 >= 0.0) {
+                if (i == 1) iflag = 3;
+            }
+        }
+        // Scale s1 to keep intermediate arithmetic on scale near exponent extremes.
+        zairy(argr, argi, 0, 2, &air, &aii, &nai, &idum);
+        zairy(argr, argi, 1, 2, &dair, &daii, &ndai, &idum);
+        str = dair * bsumr - daii * bsumi;
+        sti = dair * bsumi + daii * bsumr;
+        str = str + (air * asumr - aii * asumi);
+        sti = sti + (air * asumi + aii * asumr);
+        s2r = phir * str - phii * sti;
+        s2i = phir * sti + phii * str;
+        str = std::exp(s1r) * cssr[iflag - 1];
+        s1r = str * std::cos(s1i);
+        s1i = str * std::sin(s1i);
+        str = s2r * s1r - s2i * s1i;
+        s2i = s2r * s1i + s2i * s1r;
+        s2r = str;
+        if (iflag == 1) {
+            zuchk(s2r, s2i, &nw, bry[0], tol);
+            if (nw != 0) goto L120;
+        }
+        if (zi <= 0.0) s2i = -s2i;
+        str = s2r * c2r - s2i * c2i;
+        s2i = s2r * c2i + s2i * c2r;
+        s2r = str;
+        cyr[i - 1] = s2r;
+        cyi[i - 1] = s2i;
+        const int j = nd - i + 1;
+        yr[j - 1] = s2r * csrr[iflag - 1];
+        yi[j - 1] = s2i * csrr[iflag - 1];
+        str = -c2i * cidi;
+        c2i = c2r * cidi;
+        c2r = str;
+    }
+    if (nd > 2) {
+        // Recur backward for the rest.
+        const double raz = 1.0 / zabs(zr, zi);
+        str = zr * raz;
+        sti = -zi * raz;
+        const double rzr = (str + str) * raz;
+        const double rzi = (sti + sti) * raz;
+        bry[1] = 1.0 / bry[0];
+        bry[2] = kD1Mach2;
+        s1r = cyr[0];
+        s1i = cyi[0];
+        s2r = cyr[1];
+        s2i = cyi[1];
+        double c1r = csrr[iflag - 1];
+        double ascle = bry[iflag - 1];
+        int k = nd - 2;
+        fn = static_cast<double>(k);
+        for (int i = 3; i <= nd; ++i) {
+            c2r = s2r;
+            c2i = s2i;
+            s2r = s1r + (fnu + fn) * (rzr * c2r - rzi * c2i);
+            s2i = s1i + (fnu + fn) * (rzr * c2i + rzi * c2r);
+            s1r = c2r;
+            s1i = c2i;
+            c2r = s2r * c1r;
+            c2i = s2i * c1r;
+            yr[k - 1] = c2r;
+            yi[k - 1] = c2i;
+            k = k - 1;
+            fn = fn - 1.0;
+            if (iflag >= 3) continue;
+            str = std::fabs(c2r);
+            sti = std::fabs(c2i);
+            const double c2m = std::fmax(str, sti);
+            if (c2m <= ascle) continue;
+            iflag = iflag + 1;
+            ascle = bry[iflag - 1];
+            s1r = s1r * c1r;
+            s1i = s1i * c1r;
+            s2r = c2r;
+            s2i = c2i;
+            s1r = s1r * cssr[iflag - 1];
+            s1i = s1i * cssr[iflag - 1];
+            s2r = s2r * cssr[iflag - 1];
+            s2i = s2i * cssr[iflag - 1];
+            c1r = csrr[iflag - 1];
+        }
+    }
+    return;
+L120:
+    if (rs1 > 0.0) {
+        *nz = -1;
+        return;
+    }
+    // Set underflow and update parameters.
+    yr[nd - 1] = d::ZEROR;
+    yi[nd - 1] = d::ZEROI;
+    *nz = *nz + 1;
+    nd = nd - 1;
+    if (nd == 0) return;
+    zuoik(zr, zi, fnu, kode, 1, nd, yr, yi, &nuf, tol, elim, alim);
+    if (nuf < 0) {
+        *nz = -1;
+        return;
+    }
+    nd = nd - nuf;
+    *nz = *nz + nuf;
+    if (nd == 0) return;
+    fn = fnu + static_cast<double>(nd - 1);
+    if (fn < fnul) {
+        *nlast = nd;
+        return;
+    }
+    in = inu + nd - 1;
+    in = in % 4 + 1;
+    c2r = car * d::CIPR[in - 1] - sar * d::CIPI[in - 1];
+    c2i = car * d::CIPI[in - 1] + sar * d::CIPR[in - 1];
+    if (zi <= 0.0) c2i = -c2i;
+    goto L40;
+}
+
+void zbuni(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, int nui,
+           int* nlast, double fnul, double tol, double elim, double alim) {
+    double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0}, bry[3];
+    int nw = 0;
+    *nz = 0;
+    const double ax = std::fabs(zr) * 1.7321;
+    const double ay = std::fabs(zi);
+    const int iform = ay > ax ? 2 : 1;
+    if (nui == 0) {
+        if (iform != 2)
+            zuni1(zr, zi, fnu, kode, n, yr, yi, &nw, nlast, fnul, tol, elim, alim);
+        else
+            zuni2(zr, zi, fnu, kode, n, yr, yi, &nw, nlast, fnul, tol, elim, alim);
+        if (nw < 0) {
+            *nz = nw == -2 ? -2 : -1;
+            return;
+        }
+        *nz = nw;
+        return;
+    }
+    // Compute at order fnu + n - 1 + nui (where the expansion holds) and recur backward.
+    double fnui = static_cast<double>(nui);
+    const double dfnu = fnu + static_cast<double>(n - 1);
+    const double gnu = dfnu + fnui;
+    if (iform != 2)
+        zuni1(zr, zi, gnu, kode, 2, cyr, cyi, &nw, nlast, fnul, tol, elim, alim);
+    else
+        zuni2(zr, zi, gnu, kode, 2, cyr, cyi, &nw, nlast, fnul, tol, elim, alim);
+    if (nw < 0) {
+        *nz = nw == -2 ? -2 : -1;
+        return;
+    }
+    if (nw != 0) {
+        *nlast = n;
+        return;
+    }
+    double str = zabs(cyr[0], cyi[0]);
+    // Scale the backward recurrence, bry[0] the underflow limit.
+    bry[0] = 1.0e+3 * kD1Mach1 / tol;
+    bry[1] = 1.0 / bry[0];
+    bry[2] = bry[1];
+    int iflag = 2;
+    double ascle = bry[1];
+    double csclr = 1.0;
+    if (str <= bry[0]) {
+        iflag = 1;
+        ascle = bry[0];
+        csclr = 1.0 / tol;
+    } else if (str >= bry[1]) {
+        iflag = 3;
+        ascle = bry[2];
+        csclr = tol;
+    }
+    double cscrr = 1.0 / csclr;
+    double s1r = cyr[1] * csclr;
+    double s1i = cyi[1] * csclr;
+    double s2r = cyr[0] * csclr;
+    double s2i = cyi[0] * csclr;
+    const double raz = 1.0 / zabs(zr, zi);
+    str = zr * raz;
+    double sti = -zi * raz;
+    const double rzr = (str + str) * raz;
+    const double rzi = (sti + sti) * raz;
+    for (int i = 1; i <= nui; ++i) {
+        str = s2r;
+        sti = s2i;
+        s2r = (dfnu + fnui) * (rzr * str - rzi * sti) + s1r;
+        s2i = (dfnu + fnui) * (rzr * sti + rzi * str) + s1i;
+        s1r = str;
+        s1i = sti;
+        fnui = fnui - 1.0;
+        if (iflag >= 3) continue;
+        str = s2r * cscrr;
+        sti = s2i * cscrr;
+        const double c1r = std::fabs(str);
+        const double c1i = std::fabs(sti);
+        const double c1m = std::fmax(c1r, c1i);
+        if (c1m <= ascle) continue;
+        iflag = iflag + 1;
+        ascle = bry[iflag - 1];
+        s1r = s1r * cscrr;
+        s1i = s1i * cscrr;
+        s2r = str;
+        s2i = sti;
+        csclr = csclr * tol;
+        cscrr = 1.0 / csclr;
+        s1r = s1r * csclr;
+        s1i = s1i * csclr;
+        s2r = s2r * csclr;
+        s2i = s2i * csclr;
+    }
+    yr[n - 1] = s2r * cscrr;
+    yi[n - 1] = s2i * cscrr;
+    if (n == 1) return;
+    const int nl = n - 1;
+    fnui = static_cast<double>(nl);
+    int k = nl;
+    for (int i = 1; i <= nl; ++i) {
+        str = s2r;
+        sti = s2i;
+        s2r = (fnu + fnui) * (rzr * str - rzi * sti) + s1r;
+        s2i = (fnu + fnui) * (rzr * sti + rzi * str) + s1i;
+        s1r = str;
+        s1i = sti;
+        str = s2r * cscrr;
+        sti = s2i * cscrr;
+        yr[k - 1] = str;
+        yi[k - 1] = sti;
+        fnui = fnui - 1.0;
+        k = k - 1;
+        if (iflag >= 3) continue;
+        const double c1r = std::fabs(str);
+        const double c1i = std::fabs(sti);
+        const double c1m = std::fmax(c1r, c1i);
+        if (c1m <= ascle) continue;
+        iflag = iflag + 1;
+        ascle = bry[iflag - 1];
+        s1r = s1r * cscrr;
+        s1i = s1i * cscrr;
+        s2r = str;
+        s2i = sti;
+        csclr = csclr * tol;
+        cscrr = 1.0 / csclr;
+        s1r = s1r * csclr;
+        s1i = s1i * csclr;
+        s2r = s2r * csclr;
+        s2i = s2i * csclr;
+    }
+}
+
+}  // namespace tw::amos
