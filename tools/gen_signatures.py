@@ -6,8 +6,8 @@
 writes into OUTDIR:
   STEM_table.inc      one sweep::Row per built row, with a thunk that calls the export
   STEM_check.cpp      static_asserts that every declaration has the row's type
-  status_values.inc   the status codes of status.h (with --status)
-Stdlib only; a malformed row stops the build with its line number."""
+  status_values.inc   the status codes of status.h, with their names (with --status)
+Stdlib only; a malformed row or status set stops the build with its line number."""
 
 import argparse
 import os
@@ -19,7 +19,13 @@ ELEMS = {"i32": ("I32", 4, "int32_t"), "u8": ("U8", 1, "uint8_t"), "u32": ("U32"
          "c128": ("C128", 16, None), "len": ("Len", 4, "int32_t")}
 DIRS = {"in": "In", "out": "Out", "io": "Io"}
 STYLES = {"ret": "Ret", "ptr": "Ptr", "both": "Both", "cluster": "Cluster", "none": "None"}
-CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work", "inwhen"}
+CONTRACT_KEYS = {"fail", "keep", "zero", "stand", "result", "nosweep", "work", "inwhen", "st"}
+STATUS_H = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "include", "twanlys", "status.h")
+
+
+def status_codes(path):
+    """Name to value for every code of status.h, success included."""
+    return {n: int(v) for n, v in re.findall(r"^\s*(\w+)\s*=\s*(-?\d+)\s*,", open(path).read(), re.M)}
 
 
 class RowError(Exception):
@@ -151,9 +157,30 @@ def parse_signature(sig):
     return result, args
 
 
-def parse_contract(text, args):
+def expand_statuses(value, sets, codes):
+    """The statuses of a row's st= token: set names and status names, joined by commas; +Name adds a
+    status, -Name takes one away (in order, so st=fft,-FftSizeErr is fft without it)."""
+    allowed = []
+    for item in value.split(","):
+        sign, word = (item[0], item[1:]) if item[:1] in "+-" else ("+", item)
+        if word in sets:
+            names = sets[word]
+        elif word in codes:
+            names = [word]
+        else:
+            raise RowError("st=%s: %r is neither a status set nor a status of status.h" % (value, word))
+        if sign == "+":
+            allowed += [n for n in names if n not in allowed]
+        else:
+            allowed = [n for n in allowed if n not in names]
+    if "NoErr" in allowed:
+        raise RowError("st=%s: success needs no listing" % value)
+    return allowed
+
+
+def parse_contract(text, args, sets=None, codes=None):
     c = {"fail_nonzero": False, "keep": [], "zero": [], "work": [], "stand": [], "result_host": False, "result_oom": False,
-         "nosweep": False}
+         "nosweep": False, "st": None, "st_text": ""}
     names = [a["name"] for a in args]
     for tok in text.split():
         key, _, value = tok.partition("=")
@@ -185,15 +212,44 @@ def parse_contract(text, args):
             c["result_host" if value == "host" else "result_oom"] = True
         elif key == "nosweep":
             c["nosweep"] = True
+        elif key == "st":
+            c["st"] = expand_statuses(value, sets or {}, codes or {})
+            c["st_text"] = value
     return c
 
 
-def read_table(path):
-    rows = []
+def parse_set(words, sets, codes):
+    """@set NAME MEMBER..., members being status names or sets defined above."""
+    if len(words) < 3 or not re.fullmatch(r"[a-z][a-z0-9_]*", words[1]):
+        raise RowError("@set wants a lower-case name and at least one member")
+    if words[1] in sets or words[1] in codes:
+        raise RowError("status set %r is defined twice" % words[1])
+    members = []
+    for w in words[2:]:
+        if w in sets:
+            members += [n for n in sets[w] if n not in members]
+        elif w in codes and w != "NoErr":
+            members += [w] if w not in members else []
+        else:
+            raise RowError("%r is neither a status of status.h nor a set defined above" % w)
+    sets[words[1]] = members
+
+
+def read_table(path, status_h=STATUS_H):
+    rows, sets, codes = [], {}, status_codes(status_h)
     with open(path) as f:
         for number, line in enumerate(f, 1):
             line = line.rstrip("\n")
             if not line or line.startswith("#") or line.startswith("name\t"):
+                continue
+            if line.startswith("@"):
+                words = line.split()
+                try:
+                    if words[0] != "@set":
+                        raise RowError("unknown directive %r" % words[0])
+                    parse_set(words, sets, codes)
+                except RowError as e:
+                    sys.exit("%s:%d: %s" % (path, number, e))
                 continue
             cols = line.split("\t")
             if len(cols) != 5:
@@ -205,7 +261,9 @@ def read_table(path):
                 if style not in STYLES:
                     raise RowError("style %r of a built row: one of %s" % (style, ", ".join(STYLES)))
                 result, args = parse_signature(sig)
-                c = parse_contract(contract, args)
+                c = parse_contract(contract, args, sets, codes)
+                if c["st"] is not None and style == "none":
+                    raise RowError("st= on a row of style none, which gives no status")
                 statuses = [a for a in args if a["kind"] == "Status"]
                 if style in ("ptr", "both") and len(statuses) != 1:
                     raise RowError("style %s needs one status argument" % style)
@@ -262,6 +320,8 @@ def write_table(rows, path, stem, includes):
                 out.append("inline constexpr sweep::Field k%s_fields[] = {%s};" % (a["cur_id"], ", ".join(
                     "{sweep::Kind::%s, sweep::Elem::%s, sweep::Dir::%s, %d, %d}"
                     % (f["kind"], f["elem"], f["dir"], f["elem_bytes"], f["offset"]) for f in a["fields"])))
+        if r["c"]["st"]:
+            out.append("inline constexpr int32_t k%s_statuses[] = {%s};" % (r["name"], ", ".join(r["c"]["st"])))
         if r["args"]:
             out.append("inline constexpr sweep::Arg k%s_args[] = {" % r["name"])
             out.append("    " + ",\n    ".join(arg_init(a) for a in r["args"]) + "};")
@@ -281,12 +341,15 @@ def write_table(rows, path, stem, includes):
         c = r["c"]
         masks = [sum(1 << i for i in c[key]) for key in ("keep", "zero", "work")]
         stand = "{%s}" % ", ".join(c["stand"]) if c["stand"] else "{}"
+        # No st= token: the row does not say, and any status of status.h passes (nAllowed -1).
+        allowed = ("k%s_statuses, %d" % (r["name"], len(c["st"])) if c["st"]
+                   else "nullptr, %d" % (-1 if c["st"] is None else 0))
         out.append('    {"%s", sweep::Style::%s, sweep::Result::%s, %s, %d, %s, %s, %s, 0x%xu, 0x%xu, 0x%xu, %s,\n'
-                   '     [](sweep::Slots&%s) -> sweep::Outcome { %s }, %s},'
+                   '     [](sweep::Slots&%s) -> sweep::Outcome { %s }, %s, %s, "%s"},'
                    % (r["name"], r["style"], kind, ("k%s_args" % r["name"]) if r["args"] else "nullptr",
                       len(r["args"]), str(c["fail_nonzero"]).lower(), str(c["result_host"]).lower(),
                       str(c["nosweep"]).lower(), masks[0], masks[1], masks[2], stand,
-                      " s" if r["args"] else "", body, str(c["result_oom"]).lower()))
+                      " s" if r["args"] else "", body, str(c["result_oom"]).lower(), allowed, c["st_text"]))
     out.append("};")
     write(path, "\n".join(out) + "\n")
 
@@ -315,7 +378,9 @@ def write_statuses(status_h, path):
     if len(values) < 10:
         sys.exit("%s: no status values found" % status_h)
     write(path, "// Generated by tools/gen_signatures.py from status.h; do not edit.\n"
-          "inline constexpr int32_t kStatusValues[] = {%s};\n" % ", ".join(v for _, v in values))
+          "inline constexpr int32_t kStatusValues[] = {%s};\n"
+          "inline constexpr const char* kStatusNames[] = {%s};\n"
+          % (", ".join(v for _, v in values), ", ".join('"%s"' % n for n, _ in values)))
 
 
 def write(path, text):
@@ -334,7 +399,7 @@ def main():
     p.add_argument("--status")
     p.add_argument("--include", action="append", default=[])
     o = p.parse_args()
-    rows = read_table(o.table)
+    rows = read_table(o.table, o.status or STATUS_H)
     os.makedirs(o.outdir, exist_ok=True)
     stem = o.name.lower()
     write_table(rows, os.path.join(o.outdir, stem + "_table.inc"), o.name, o.include)

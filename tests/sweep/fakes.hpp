@@ -14,3 +14,4 @@ TW_EXTERN_C int32_t SweepFakeCounter(Array1DHandle x, Array1DHandle y);
 TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t coefficientsOnly);
 TW_EXTERN_C void SweepFakeBufAlignment(int32_t n, double* x);
 TW_EXTERN_C int32_t SweepFakeCubeWrites(NumericHandle data, double* sum);
+TW_EXTERN_C int32_t SweepFakeOffSet(Array1DHandle x);

@@ -21,6 +21,7 @@ struct Tally {
     int64_t failed = 0;  // calls that reported a failure
     int rows = 0;
     int skipped = 0;
+    int unlisted = 0;  // swept rows that give a status but name no status set
 };
 
 // Random cases per row. The sanitizer tree sets TW_SWEEP_RANDOM lower to stay within its time.
@@ -67,6 +68,7 @@ inline std::vector<std::string> SweepRow(const Row& row, int random, Tally* tall
         return faults;
     }
     ++tally->rows;
+    tally->unlisted += row.nAllowed < 0 && row.style != Style::None ? 1 : 0;
     const bool trace = std::getenv("TW_SWEEP_TRACE") != nullptr;
     const auto start = std::chrono::steady_clock::now();
     std::vector<void*> cells(static_cast<size_t>(row.nArgs), nullptr);

@@ -66,6 +66,7 @@ TW_EXTERN_C int32_t SweepFakeHalfZero(Array1DHandle x, ComplexDouble* z, int32_t
     return ToPointer(status, s);
 }
 TW_EXTERN_C int32_t SweepFakeStrangeStatus(Array1DHandle x) { return Count(x) > 0 ? -20000 : EmptyArrayErr; }
+TW_EXTERN_C int32_t SweepFakeOffSet(Array1DHandle x) { return Count(x) > 0 ? DivideByZeroErr : EmptyArrayErr; }
 TW_EXTERN_C int32_t SweepFakeIgnoresFlag(Array1DHandle y, double* mse, int32_t) {
     Frame f;
     f.Output<double>(y);
@@ -138,6 +139,7 @@ TEST(SweepSelfTest, EachFaultIsCaught) {
         {"SweepFakeNoNaN", 0, "mean is not NaN on failure"},
         {"SweepFakeHalfZero", 0, "z imag is not 0 on failure"},
         {"SweepFakeStrangeStatus", 4, "status -20000 is not in status.h"},
+        {"SweepFakeOffSet", 4, "status -20060 DivideByZeroErr is outside the row's set st=wide,-DivideByZeroErr"},
         {"SweepFakeIgnoresFlag", 4, "y is an input but was written"},
         {"SweepFakeCubeWrites", 4, "data is an input but was written"},
     };

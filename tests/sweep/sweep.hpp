@@ -71,6 +71,11 @@ struct Row {
     int32_t stand[4];
     Outcome (*call)(Slots&);
     bool resultOom = false;  // ptr style whose result is 2 when it stores OutOfMemoryErr
+    // The statuses the row allows besides 0; nAllowed -1 when the row names none (then any of
+    // status.h passes). `statusSet` is the row's st= token, for messages.
+    const int32_t* allowed = nullptr;
+    int32_t nAllowed = -1;
+    const char* statusSet = "";
 };
 
 // What one argument gets in one call.
@@ -363,6 +368,13 @@ private:
 inline bool KnownStatus(int32_t s) {
     return std::find(std::begin(kStatusValues), std::end(kStatusValues), s) != std::end(kStatusValues);
 }
+inline std::string StatusName(int32_t s) {
+    const auto* at = std::find(std::begin(kStatusValues), std::end(kStatusValues), s);
+    return std::to_string(s) + (at != std::end(kStatusValues) ? std::string(" ") + kStatusNames[at - kStatusValues] : "");
+}
+inline bool AllowedStatus(const Row& row, int32_t s) {
+    return s == 0 || row.nAllowed < 0 || std::find(row.allowed, row.allowed + row.nAllowed, s) != row.allowed + row.nAllowed;
+}
 
 struct Verdict {
     std::vector<std::string> faults;
@@ -431,6 +443,8 @@ inline Verdict CallAndJudge(const Row& row, const Case& c, void** cells, int32_t
         if (known && status == kStatusSentinel) fault("no status stored");
         else if (known && !KnownStatus(status) && !(hostFailed && status == TWRTResizeFailed))
             fault("status " + std::to_string(status) + " is not in status.h");
+        else if (known && !AllowedStatus(row, status) && !(hostFailed && status == TWRTResizeFailed))
+            fault("status " + StatusName(status) + " is outside the row's set st=" + row.statusSet);
 
         bool stands = false;
         for (int32_t st : row.stand) stands = stands || (st != 0 && st == status);
