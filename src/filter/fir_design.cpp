@@ -159,6 +159,8 @@ Status NarrowbandDesign(double fs, double f1, double f2, double c, double ripple
         for (int32_t k = 2; k <= top; ++k) {
             const double x = c * k;
             const double whole = std::floor(x / fs);
+            // A centre a billion rates away has no stage that could hold it (nor an i32 region).
+            if (!(std::fabs(whole) < 1e9)) continue;
             double rk = x - whole * fs;
             int32_t reg = static_cast<int32_t>(2.0 * whole + 1.0);
             if (rk > half) {
