@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include "special/amos/amos.hpp"
+#include "special/amos/common.hpp"
 
 namespace tw::amos {
 
@@ -40,13 +41,13 @@ void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double*
     if (zi <= 0.0) znr = -znr;
     if (iform != 2) {
         init = 0;
-        zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi,
-              cwrkr, cwrki);
+        zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr,
+              &sumi, cwrkr, cwrki);
         czr = zeta2r - zeta1r;
         czi = zeta2i - zeta1i;
     } else {
-        zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
-              &bsumr, &bsumi);
+        zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr,
+              &asumi, &bsumr, &bsumi);
         czr = zeta2r - zeta1r;
         czi = zeta2i - zeta1i;
         aarg = zabs(argr, argi);
@@ -114,13 +115,13 @@ void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double*
         gnu = fnu + static_cast<double>(nn - 1);
         if (iform != 2) {
             init = 0;
-            zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr,
-                  &sumi, cwrkr, cwrki);
+            zunik(zrr, zri, gnu, ikflg, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i,
+                  &sumr, &sumi, cwrkr, cwrki);
             czr = zeta2r - zeta1r;
             czi = zeta2i - zeta1i;
         } else {
-            zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr,
-                  &asumi, &bsumr, &bsumi);
+            zunhj(znr, zni, gnu, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i,
+                  &asumr, &asumi, &bsumr, &bsumi);
             czr = zeta2r - zeta1r;
             czi = zeta2i - zeta1i;
             aarg = zabs(argr, argi);
@@ -166,7 +167,8 @@ void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double
            double fnul, double tol, double elim, double alim) {
     namespace d = data::zuni1;
     double bry[3], cwrkr[16], cwrki[16], cssr[3], csrr[3], cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
-    double phir = 0.0, phii = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0, zeta2i = 0.0, sumr = 0.0, sumi = 0.0;
+    double phir = 0.0, phii = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0, zeta2i = 0.0, sumr = 0.0,
+           sumi = 0.0;
     double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0, rast = 0.0;
     int iflag = 0, init = 0, nn = 0, nuf = 0, nw = 0;
     *nz = 0;
@@ -174,32 +176,15 @@ void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double
     *nlast = 0;
     // Computed values with exponents between alim and elim in magnitude are scaled to keep
     // intermediate arithmetic on scale, exp(alim) = exp(elim)*tol.
-    const double cscl = 1.0 / tol;
-    const double crsc = tol;
-    cssr[0] = cscl;
-    cssr[1] = d::CONER;
-    cssr[2] = crsc;
-    csrr[0] = crsc;
-    csrr[1] = d::CONER;
-    csrr[2] = cscl;
-    bry[0] = 1.0e+3 * kD1Mach1 / tol;
+    ScaleTriplets(tol, cssr, csrr, bry);
     // Check for underflow and overflow on the first member.
     double fn = std::fmax(fnu, 1.0);
     init = 0;
     zunik(zr, zi, fn, 1, 1, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi, cwrkr,
           cwrki);
-    if (kode != 1) {
-        str = zr + zeta2r;
-        sti = zi + zeta2i;
-        rast = fn / zabs(str, sti);
-        str = str * rast * rast;
-        sti = -sti * rast * rast;
-        s1r = str - zeta1r;
-        s1i = sti - zeta1i;
-    } else {
-        s1r = zeta2r - zeta1r;
-        s1i = zeta2i - zeta1i;
-    }
+    ExponentZeta2(kode, zr, zi, zeta2r, zeta2i, fn, &str, &sti);
+    s1r = str - zeta1r;
+    s1i = sti - zeta1i;
     rs1 = s1r;
     if (std::fabs(rs1) > elim) {
         if (rs1 > 0.0) {
@@ -218,43 +203,20 @@ L30:
     for (int i = 1; i <= nn; ++i) {
         fn = fnu + static_cast<double>(nd - i);
         init = 0;
-        zunik(zr, zi, fn, 1, 0, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi, cwrkr,
-              cwrki);
-        if (kode != 1) {
-            str = zr + zeta2r;
-            sti = zi + zeta2i;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = str - zeta1r;
-            s1i = sti - zeta1i + zi;
-        } else {
-            s1r = zeta2r - zeta1r;
-            s1i = zeta2i - zeta1i;
-        }
+        zunik(zr, zi, fn, 1, 0, tol, &init, &phir, &phii, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &sumr, &sumi,
+              cwrkr, cwrki);
+        ExponentZeta2(kode, zr, zi, zeta2r, zeta2i, fn, &str, &sti);
+        s1r = str - zeta1r;
+        s1i = sti - zeta1i;
+        if (kode != 1) s1i = s1i + zi;
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L110;
-        if (i == 1) iflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            const double aphi = zabs(phir, phii);
-            rs1 = rs1 + std::log(aphi);
-            if (std::fabs(rs1) > elim) goto L110;
-            if (i == 1) iflag = 1;
-            if (rs1 >= 0.0) {
-                if (i == 1) iflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, i == 1, &iflag, &rs1,
+                             [&](double r) { return r + std::log(zabs(phir, phii)); }))
+            goto L110;
         // Scale s1 if |s1| < ascle.
         s2r = phir * sumr - phii * sumi;
         s2i = phir * sumi + phii * sumr;
-        str = std::exp(s1r) * cssr[iflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s2r * s1i + s2i * s1r;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
         if (iflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) goto L110;
@@ -272,8 +234,6 @@ L30:
         sti = -zi * rast;
         const double rzr = (str + str) * rast;
         const double rzi = (sti + sti) * rast;
-        bry[1] = 1.0 / bry[0];
-        bry[2] = kD1Mach2;
         s1r = cyr[0];
         s1i = cyi[0];
         s2r = cyr[1];
@@ -344,7 +304,7 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
     double bry[3], cssr[3], csrr[3], cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
     double phir = 0.0, phii = 0.0, argr = 0.0, argi = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0,
            zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0;
-    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0, rast = 0.0;
+    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0;
     double air = 0.0, aii = 0.0, dair = 0.0, daii = 0.0;
     int iflag = 0, nn = 0, nuf = 0, nw = 0, nai = 0, ndai = 0, idum = 0;
     *nz = 0;
@@ -352,15 +312,7 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
     *nlast = 0;
     // Computed values with exponents between alim and elim in magnitude are scaled to keep
     // intermediate arithmetic on scale, exp(alim) = exp(elim)*tol.
-    const double cscl = 1.0 / tol;
-    const double crsc = tol;
-    cssr[0] = cscl;
-    cssr[1] = d::CONER;
-    cssr[2] = crsc;
-    csrr[0] = crsc;
-    csrr[1] = d::CONER;
-    csrr[2] = cscl;
-    bry[0] = 1.0e+3 * kD1Mach1 / tol;
+    ScaleTriplets(tol, cssr, csrr, bry);
     // zn is in the right half plane after rotation by ci or -ci.
     double znr = zi;
     double zni = -zr;
@@ -386,20 +338,11 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
     }
     // Check for underflow and overflow on the first member.
     double fn = std::fmax(fnu, 1.0);
-    zunhj(znr, zni, fn, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
-          &bsumr, &bsumi);
-    if (kode != 1) {
-        str = zbr + zeta2r;
-        sti = zbi + zeta2i;
-        rast = fn / zabs(str, sti);
-        str = str * rast * rast;
-        sti = -sti * rast * rast;
-        s1r = str - zeta1r;
-        s1i = sti - zeta1i;
-    } else {
-        s1r = zeta2r - zeta1r;
-        s1i = zeta2i - zeta1i;
-    }
+    zunhj(znr, zni, fn, 1, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr,
+          &asumi, &bsumr, &bsumi);
+    ExponentZeta2(kode, zbr, zbi, zeta2r, zeta2i, fn, &str, &sti);
+    s1r = str - zeta1r;
+    s1i = sti - zeta1i;
     rs1 = s1r;
     if (std::fabs(rs1) > elim) {
         if (rs1 > 0.0) {
@@ -417,35 +360,17 @@ L40:
     nn = std::min(2, nd);
     for (int i = 1; i <= nn; ++i) {
         fn = fnu + static_cast<double>(nd - i);
-        zunhj(znr, zni, fn, 0, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr, &asumi,
-              &bsumr, &bsumi);
-        if (kode != 1) {
-            str = zbr + zeta2r;
-            sti = zbi + zeta2i;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = str - zeta1r;
-            s1i = sti - zeta1i + std::fabs(zi);
-        } else {
-            s1r = zeta2r - zeta1r;
-            s1i = zeta2i - zeta1i;
-        }
+        zunhj(znr, zni, fn, 0, tol, &phir, &phii, &argr, &argi, &zeta1r, &zeta1i, &zeta2r, &zeta2i, &asumr,
+              &asumi, &bsumr, &bsumi);
+        ExponentZeta2(kode, zbr, zbi, zeta2r, zeta2i, fn, &str, &sti);
+        s1r = str - zeta1r;
+        s1i = sti - zeta1i;
+        if (kode != 1) s1i = s1i + std::fabs(zi);
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L120;
-        if (i == 1) iflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            const double aphi = zabs(phir, phii);
-            const double aarg = zabs(argr, argi);
-            rs1 = rs1 + std::log(aphi) - 0.25 * std::log(aarg) - d::AIC;
-            if (std::fabs(rs1) > elim) goto L120;
-            if (i == 1) iflag = 1;
-            if (rs1 >= 0.0) {
-                if (i == 1) iflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, i == 1, &iflag, &rs1, [&](double r) {
+                return r + std::log(zabs(phir, phii)) - 0.25 * std::log(zabs(argr, argi)) - d::AIC;
+            }))
+            goto L120;
         // Scale s1 to keep intermediate arithmetic on scale near exponent extremes.
         zairy(argr, argi, 0, 2, &air, &aii, &nai, &idum);
         zairy(argr, argi, 1, 2, &dair, &daii, &ndai, &idum);
@@ -455,12 +380,7 @@ L40:
         sti = sti + (air * asumi + aii * asumr);
         s2r = phir * str - phii * sti;
         s2i = phir * sti + phii * str;
-        str = std::exp(s1r) * cssr[iflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s2r * s1i + s2i * s1r;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
         if (iflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) goto L120;
@@ -485,8 +405,6 @@ L40:
         sti = -zi * raz;
         const double rzr = (str + str) * raz;
         const double rzi = (sti + sti) * raz;
-        bry[1] = 1.0 / bry[0];
-        bry[2] = kD1Mach2;
         s1r = cyr[0];
         s1i = cyi[0];
         s2r = cyr[1];

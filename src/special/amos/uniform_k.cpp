@@ -3,11 +3,12 @@
 // (the choice between them). With mr != 0 they also continue K to the left half plane, where
 // K(z e^{i pi mr}) = K(z) e^{-i pi mr fnu} - i pi mr I(z) gives the result for Re z < 0.
 #include "special/amos/amos.hpp"
+#include "special/amos/common.hpp"
 
 namespace tw::amos {
 
-void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz, double tol,
-           double elim, double alim) {
+void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz,
+           double tol, double elim, double alim) {
     namespace d = data::zunk1;
     double bry[3], sumr[2] = {0.0, 0.0}, sumi[2] = {0.0, 0.0}, zeta1r[2] = {0.0, 0.0}, zeta1i[2] = {0.0, 0.0},
                    zeta2r[2] = {0.0, 0.0}, zeta2i[2] = {0.0, 0.0}, cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0},
@@ -19,23 +20,13 @@ void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         nw = 0, initd = 0, ic = 0, ipard = 0, j = 0, m = 0;
     double ang = 0.0, aphi = 0.0, asc = 0.0, ascle = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, cspni = 0.0,
            cspnr = 0.0, csr = 0.0, c1i = 0.0, c1r = 0.0, c2i = 0.0, c2m = 0.0, c2r = 0.0, fmr = 0.0, fn = 0.0,
-           fnf = 0.0, phidi = 0.0, phidr = 0.0, rast = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sgn = 0.0,
+           fnf = 0.0, phidi = 0.0, phidr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sgn = 0.0,
            sti = 0.0, str = 0.0, sumdi = 0.0, sumdr = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0,
            zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zri = 0.0, zrr = 0.0;
     kdflg = 1;
     *nz = 0;
     // exp(-alim) = exp(-elim)/tol = approximately one digit of precision above the underflow limit.
-    const double cscl = 1.0 / tol;
-    const double crsc = tol;
-    cssr[0] = cscl;
-    cssr[1] = d::CONER;
-    cssr[2] = crsc;
-    csrr[0] = crsc;
-    csrr[1] = d::CONER;
-    csrr[2] = cscl;
-    bry[0] = 1.0e+3 * kD1Mach1 / tol;
-    bry[1] = 1.0 / bry[0];
-    bry[2] = kD1Mach2;
+    ScaleTriplets(tol, cssr, csrr, bry);
     zrr = zr;
     zri = zi;
     if (zr < 0.0) {
@@ -48,44 +39,20 @@ void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         j = 3 - j;
         fn = fnu + static_cast<double>(i - 1);
         init[j - 1] = 0;
-        zunik(zrr, zri, fn, 2, 0, tol, &init[j - 1], &phir[j - 1], &phii[j - 1], &zeta1r[j - 1], &zeta1i[j - 1],
-              &zeta2r[j - 1], &zeta2i[j - 1], &sumr[j - 1], &sumi[j - 1], &cwrkr[16 * (j - 1)],
-              &cwrki[16 * (j - 1)]);
-        if (kode != 1) {
-            str = zrr + zeta2r[j - 1];
-            sti = zri + zeta2i[j - 1];
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = zeta1r[j - 1] - str;
-            s1i = zeta1i[j - 1] - sti;
-        } else {
-            s1r = zeta1r[j - 1] - zeta2r[j - 1];
-            s1i = zeta1i[j - 1] - zeta2i[j - 1];
-        }
+        zunik(zrr, zri, fn, 2, 0, tol, &init[j - 1], &phir[j - 1], &phii[j - 1], &zeta1r[j - 1],
+              &zeta1i[j - 1], &zeta2r[j - 1], &zeta2i[j - 1], &sumr[j - 1], &sumi[j - 1],
+              &cwrkr[16 * (j - 1)], &cwrki[16 * (j - 1)]);
+        ExponentZeta2(kode, zrr, zri, zeta2r[j - 1], zeta2i[j - 1], fn, &str, &sti);
+        s1r = zeta1r[j - 1] - str;
+        s1i = zeta1i[j - 1] - sti;
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L60;
-        if (kdflg == 1) kflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            aphi = zabs(phir[j - 1], phii[j - 1]);
-            rs1 = rs1 + std::log(aphi);
-            if (std::fabs(rs1) > elim) goto L60;
-            if (kdflg == 1) kflag = 1;
-            if (rs1 >= 0.0) {
-                if (kdflg == 1) kflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, kdflg == 1, &kflag, &rs1,
+                             [&](double r) { return r + std::log(zabs(phir[j - 1], phii[j - 1])); }))
+            goto L60;
         // Scale s1 to keep intermediate arithmetic on scale near exponent extremes.
         s2r = phir[j - 1] * sumr[j - 1] - phii[j - 1] * sumi[j - 1];
         s2i = phir[j - 1] * sumi[j - 1] + phii[j - 1] * sumr[j - 1];
-        str = std::exp(s1r) * cssr[kflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s1r * s2i + s2r * s1i;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[kflag - 1], &s2r, &s2i);
         if (kflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) goto L60;
@@ -129,18 +96,9 @@ L75:
         initd = 0;
         zunik(zrr, zri, fn, 2, ipard, tol, &initd, &phidr, &phidi, &zet1dr, &zet1di, &zet2dr, &zet2di, &sumdr,
               &sumdi, &cwrkr[32], &cwrki[32]);
-        if (kode != 1) {
-            str = zrr + zet2dr;
-            sti = zri + zet2di;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = zet1dr - str;
-            s1i = zet1di - sti;
-        } else {
-            s1r = zet1dr - zet2dr;
-            s1i = zet1di - zet2di;
-        }
+        ExponentZeta2(kode, zrr, zri, zet2dr, zet2di, fn, &str, &sti);
+        s1r = zet1dr - str;
+        s1i = zet1di - sti;
         rs1 = s1r;
         bool out = std::fabs(rs1) > elim;
         if (!out && std::fabs(rs1) >= alim) {
@@ -244,44 +202,20 @@ L75:
         m = j;
         j = 3 - j;
     L180:
-        zunik(zrr, zri, fn, 1, 0, tol, &initd, &phidr, &phidi, &zet1dr, &zet1di, &zet2dr, &zet2di, &sumdr, &sumdi,
-              &cwrkr[16 * (m - 1)], &cwrki[16 * (m - 1)]);
-        if (kode != 1) {
-            str = zrr + zet2dr;
-            sti = zri + zet2di;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = str - zet1dr;
-            s1i = sti - zet1di;
-        } else {
-            s1r = zet2dr - zet1dr;
-            s1i = zet2di - zet1di;
-        }
+        zunik(zrr, zri, fn, 1, 0, tol, &initd, &phidr, &phidi, &zet1dr, &zet1di, &zet2dr, &zet2di, &sumdr,
+              &sumdi, &cwrkr[16 * (m - 1)], &cwrki[16 * (m - 1)]);
+        ExponentZeta2(kode, zrr, zri, zet2dr, zet2di, fn, &str, &sti);
+        s1r = str - zet1dr;
+        s1i = sti - zet1di;
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L260;
-        if (kdflg == 1) iflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            aphi = zabs(phidr, phidi);
-            rs1 = rs1 + std::log(aphi);
-            if (std::fabs(rs1) > elim) goto L260;
-            if (kdflg == 1) iflag = 1;
-            if (rs1 >= 0.0) {
-                if (kdflg == 1) iflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, kdflg == 1, &iflag, &rs1,
+                             [&](double r) { return r + std::log(zabs(phidr, phidi)); }))
+            goto L260;
         str = phidr * sumdr - phidi * sumdi;
         sti = phidr * sumdi + phidi * sumdr;
         s2r = -csgni * sti;
         s2i = csgni * str;
-        str = std::exp(s1r) * cssr[iflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s2r * s1i + s2i * s1r;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
         if (iflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) {
@@ -378,36 +312,27 @@ L300:
     *nz = -1;
 }
 
-void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz, double tol,
-           double elim, double alim) {
+void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz,
+           double tol, double elim, double alim) {
     namespace d = data::zunk2;
     double bry[3], asumr[2] = {0.0, 0.0}, asumi[2] = {0.0, 0.0}, bsumr[2] = {0.0, 0.0}, bsumi[2] = {0.0, 0.0},
                    phir[2] = {0.0, 0.0}, phii[2] = {0.0, 0.0}, argr[2] = {0.0, 0.0}, argi[2] = {0.0, 0.0},
-                   zeta1r[2] = {0.0, 0.0}, zeta1i[2] = {0.0, 0.0}, zeta2r[2] = {0.0, 0.0}, zeta2i[2] = {0.0, 0.0},
-                   cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0}, cssr[3], csrr[3];
-    int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, in = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0, kk = 0,
-        nai = 0, ndai = 0, nw = 0, idum = 0, j = 0, ipard = 0, ic = 0;
-    double aarg = 0.0, aii = 0.0, air = 0.0, ang = 0.0, aphi = 0.0, argdi = 0.0, argdr = 0.0, asc = 0.0,
-           ascle = 0.0, asumdi = 0.0, asumdr = 0.0, bsumdi = 0.0, bsumdr = 0.0, car = 0.0, cki = 0.0, ckr = 0.0,
-           csgni = 0.0, csi = 0.0, cspni = 0.0, cspnr = 0.0, csr = 0.0, c1i = 0.0, c1r = 0.0, c2i = 0.0, c2m = 0.0,
-           c2r = 0.0, daii = 0.0, dair = 0.0, fmr = 0.0, fn = 0.0, fnf = 0.0, phidi = 0.0, phidr = 0.0, pti = 0.0,
-           ptr = 0.0, rast = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sar = 0.0, sgn = 0.0, sti = 0.0,
-           str = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0, yy = 0.0, zbi = 0.0, zbr = 0.0, zet1di = 0.0,
-           zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zni = 0.0, znr = 0.0, zri = 0.0, zrr = 0.0;
+                   zeta1r[2] = {0.0, 0.0}, zeta1i[2] = {0.0, 0.0}, zeta2r[2] = {0.0, 0.0},
+                   zeta2i[2] = {0.0, 0.0}, cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0}, cssr[3], csrr[3];
+    int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, in = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0,
+        kk = 0, nai = 0, ndai = 0, nw = 0, idum = 0, j = 0, ipard = 0, ic = 0;
+    double aii = 0.0, air = 0.0, ang = 0.0, aphi = 0.0, argdi = 0.0, argdr = 0.0, asc = 0.0, ascle = 0.0,
+           asumdi = 0.0, asumdr = 0.0, bsumdi = 0.0, bsumdr = 0.0, car = 0.0, cki = 0.0, ckr = 0.0,
+           csgni = 0.0, csi = 0.0, cspni = 0.0, cspnr = 0.0, csr = 0.0, c1i = 0.0, c1r = 0.0, c2i = 0.0,
+           c2m = 0.0, c2r = 0.0, daii = 0.0, dair = 0.0, fmr = 0.0, fn = 0.0, fnf = 0.0, phidi = 0.0,
+           phidr = 0.0, pti = 0.0, ptr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sar = 0.0,
+           sgn = 0.0, sti = 0.0, str = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0, yy = 0.0, zbi = 0.0,
+           zbr = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zni = 0.0, znr = 0.0, zri = 0.0,
+           zrr = 0.0;
     kdflg = 1;
     *nz = 0;
     // exp(-alim) = exp(-elim)/tol = approximately one digit of precision above the underflow limit.
-    const double cscl = 1.0 / tol;
-    const double crsc = tol;
-    cssr[0] = cscl;
-    cssr[1] = d::CONER;
-    cssr[2] = crsc;
-    csrr[0] = crsc;
-    csrr[1] = d::CONER;
-    csrr[2] = cscl;
-    bry[0] = 1.0e+3 * kD1Mach1 / tol;
-    bry[1] = 1.0 / bry[0];
-    bry[2] = kD1Mach2;
+    ScaleTriplets(tol, cssr, csrr, bry);
     zrr = zr;
     zri = zi;
     if (zr < 0.0) {
@@ -444,33 +369,15 @@ void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         zunhj(znr, zni, fn, 0, tol, &phir[j - 1], &phii[j - 1], &argr[j - 1], &argi[j - 1], &zeta1r[j - 1],
               &zeta1i[j - 1], &zeta2r[j - 1], &zeta2i[j - 1], &asumr[j - 1], &asumi[j - 1], &bsumr[j - 1],
               &bsumi[j - 1]);
-        if (kode != 1) {
-            str = zbr + zeta2r[j - 1];
-            sti = zbi + zeta2i[j - 1];
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = zeta1r[j - 1] - str;
-            s1i = zeta1i[j - 1] - sti;
-        } else {
-            s1r = zeta1r[j - 1] - zeta2r[j - 1];
-            s1i = zeta1i[j - 1] - zeta2i[j - 1];
-        }
+        ExponentZeta2(kode, zbr, zbi, zeta2r[j - 1], zeta2i[j - 1], fn, &str, &sti);
+        s1r = zeta1r[j - 1] - str;
+        s1i = zeta1i[j - 1] - sti;
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L70;
-        if (kdflg == 1) kflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            aphi = zabs(phir[j - 1], phii[j - 1]);
-            aarg = zabs(argr[j - 1], argi[j - 1]);
-            rs1 = rs1 + std::log(aphi) - 0.25 * std::log(aarg) - d::AIC;
-            if (std::fabs(rs1) > elim) goto L70;
-            if (kdflg == 1) kflag = 1;
-            if (rs1 >= 0.0) {
-                if (kdflg == 1) kflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, kdflg == 1, &kflag, &rs1, [&](double r) {
+                return r + std::log(zabs(phir[j - 1], phii[j - 1])) -
+                       0.25 * std::log(zabs(argr[j - 1], argi[j - 1])) - d::AIC;
+            }))
+            goto L70;
         // Scale s1 to keep intermediate arithmetic on scale near exponent extremes.
         c2r = argr[j - 1] * d::CR2R - argi[j - 1] * d::CR2I;
         c2i = argr[j - 1] * d::CR2I + argi[j - 1] * d::CR2R;
@@ -486,12 +393,7 @@ void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         pti = str * phii[j - 1] + sti * phir[j - 1];
         s2r = ptr * csr - pti * csi;
         s2i = ptr * csi + pti * csr;
-        str = std::exp(s1r) * cssr[kflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s1r * s2i + s2r * s1i;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[kflag - 1], &s2r, &s2i);
         if (kflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) goto L70;
@@ -539,20 +441,11 @@ L85:
         fn = fnu + static_cast<double>(n - 1);
         ipard = 1;
         if (mr != 0) ipard = 0;
-        zunhj(znr, zni, fn, ipard, tol, &phidr, &phidi, &argdr, &argdi, &zet1dr, &zet1di, &zet2dr, &zet2di, &asumdr,
-              &asumdi, &bsumdr, &bsumdi);
-        if (kode != 1) {
-            str = zbr + zet2dr;
-            sti = zbi + zet2di;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = zet1dr - str;
-            s1i = zet1di - sti;
-        } else {
-            s1r = zet1dr - zet2dr;
-            s1i = zet1di - zet2di;
-        }
+        zunhj(znr, zni, fn, ipard, tol, &phidr, &phidi, &argdr, &argdi, &zet1dr, &zet1di, &zet2dr, &zet2di,
+              &asumdr, &asumdi, &bsumdr, &bsumdi);
+        ExponentZeta2(kode, zbr, zbi, zet2dr, zet2di, fn, &str, &sti);
+        s1r = zet1dr - str;
+        s1i = zet1di - sti;
         rs1 = s1r;
         bool out = std::fabs(rs1) > elim;
         if (!out && std::fabs(rs1) >= alim) {
@@ -647,8 +540,8 @@ L85:
         if (n > 2) {
             if (kk == n && ib < n) goto L210;
             if (kk == ib || kk == ic) goto L172;
-            zunhj(znr, zni, fn, 0, tol, &phidr, &phidi, &argdr, &argdi, &zet1dr, &zet1di, &zet2dr, &zet2di, &asumdr,
-                  &asumdi, &bsumdr, &bsumdi);
+            zunhj(znr, zni, fn, 0, tol, &phidr, &phidi, &argdr, &argdi, &zet1dr, &zet1di, &zet2dr, &zet2di,
+                  &asumdr, &asumdi, &bsumdr, &bsumdi);
             goto L210;
         }
     L172:
@@ -666,33 +559,14 @@ L85:
         bsumdi = bsumi[j - 1];
         j = 3 - j;
     L210:
-        if (kode != 1) {
-            str = zbr + zet2dr;
-            sti = zbi + zet2di;
-            rast = fn / zabs(str, sti);
-            str = str * rast * rast;
-            sti = -sti * rast * rast;
-            s1r = str - zet1dr;
-            s1i = sti - zet1di;
-        } else {
-            s1r = zet2dr - zet1dr;
-            s1i = zet2di - zet1di;
-        }
+        ExponentZeta2(kode, zbr, zbi, zet2dr, zet2di, fn, &str, &sti);
+        s1r = str - zet1dr;
+        s1i = sti - zet1di;
         // Test for underflow and overflow.
-        rs1 = s1r;
-        if (std::fabs(rs1) > elim) goto L280;
-        if (kdflg == 1) iflag = 2;
-        if (std::fabs(rs1) >= alim) {
-            // Refine the test and scale.
-            aphi = zabs(phidr, phidi);
-            aarg = zabs(argdr, argdi);
-            rs1 = rs1 + std::log(aphi) - 0.25 * std::log(aarg) - d::AIC;
-            if (std::fabs(rs1) > elim) goto L280;
-            if (kdflg == 1) iflag = 1;
-            if (rs1 >= 0.0) {
-                if (kdflg == 1) iflag = 3;
-            }
-        }
+        if (!ExponentInRange(s1r, elim, alim, kdflg == 1, &iflag, &rs1, [&](double r) {
+                return r + std::log(zabs(phidr, phidi)) - 0.25 * std::log(zabs(argdr, argdi)) - d::AIC;
+            }))
+            goto L280;
         zairy(argdr, argdi, 0, 2, &air, &aii, &nai, &idum);
         zairy(argdr, argdi, 1, 2, &dair, &daii, &ndai, &idum);
         str = dair * bsumdr - daii * bsumdi;
@@ -703,12 +577,7 @@ L85:
         pti = str * phidi + sti * phidr;
         s2r = ptr * csr - pti * csi;
         s2i = ptr * csi + pti * csr;
-        str = std::exp(s1r) * cssr[iflag - 1];
-        s1r = str * std::cos(s1i);
-        s1i = str * std::sin(s1i);
-        str = s2r * s1r - s2i * s1i;
-        s2i = s2r * s1i + s2i * s1r;
-        s2r = str;
+        TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
         if (iflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);
             if (nw != 0) {
@@ -809,8 +678,8 @@ L320:
     *nz = -1;
 }
 
-void zbunk(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz, double tol,
-           double elim, double alim) {
+void zbunk(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz,
+           double tol, double elim, double alim) {
     *nz = 0;
     const double ax = std::fabs(zr) * 1.7321;
     const double ay = std::fabs(zi);
