@@ -3,6 +3,7 @@
 // bits as when the block stood inline.
 #pragma once
 
+#include <algorithm>
 #include <cmath>
 
 #include "special/amos/amos.hpp"
@@ -81,6 +82,145 @@ inline void TimesScaledExp(double s1r, double s1i, double css, double* s2r, doub
     const double pr = *s2r * er - *s2i * ei;
     *s2i = *s2r * ei + *s2i * er;
     *s2r = pr;
+}
+
+// The larger of two magnitudes. The routines compare with either form, and the two differ when a
+// is a NaN (Larger keeps it, so the recurrence rescales; LargerNumber drops it): each keeps its own.
+inline double Larger(double a, double b) { return std::max(a, b); }
+inline double LargerNumber(double a, double b) { return std::fmax(a, b); }
+
+// One step of a recurrence kept on scale: once p2 (the newest member with the scale taken out by
+// csr) passes ascle, s1 and s2 move to the next scale (s2 restarting from p2).
+template <double (*Max)(double, double)>
+inline void Rescale(double p2r, double p2i, const double* bry, const double* cssr, const double* csrr,
+                    int* flag, double* ascle, double* csr, double* s1r, double* s1i, double* s2r,
+                    double* s2i) {
+    if (*flag >= 3) return;
+    const double p2m = Max(std::fabs(p2r), std::fabs(p2i));
+    if (p2m <= *ascle) return;
+    *flag = *flag + 1;
+    *ascle = bry[*flag - 1];
+    const double css = cssr[*flag - 1];
+    *s1r = *s1r * *csr * css;
+    *s1i = *s1i * *csr * css;
+    *s2r = p2r * css;
+    *s2i = p2i * css;
+    *csr = csrr[*flag - 1];
+}
+
+// K forward recurrence s2 = ck * s2 + s1, ck stepping by rz, for members first..n (1-based) from
+// the two below them (s1, s2 on scale flag); each is stored with the scale taken out.
+template <double (*Max)(double, double)>
+inline void RecurKForward(int first, int n, double s1r, double s1i, double s2r, double s2i, double ckr,
+                          double cki, double rzr, double rzi, int flag, const double* bry, const double* cssr,
+                          const double* csrr, double* yr, double* yi) {
+    double csr = csrr[flag - 1];
+    double ascle = bry[flag - 1];
+    for (int i = first; i <= n; ++i) {
+        const double c2r = s2r;
+        const double c2i = s2i;
+        s2r = ckr * c2r - cki * c2i + s1r;
+        s2i = ckr * c2i + cki * c2r + s1i;
+        s1r = c2r;
+        s1i = c2i;
+        ckr = ckr + rzr;
+        cki = cki + rzi;
+        const double p2r = s2r * csr;
+        const double p2i = s2i * csr;
+        yr[i - 1] = p2r;
+        yi[i - 1] = p2i;
+        Rescale<Max>(p2r, p2i, bry, cssr, csrr, &flag, &ascle, &csr, &s1r, &s1i, &s2r, &s2i);
+    }
+}
+
+// I backward recurrence s2 = s1 + (fnu + k) * rz * s2 from the two top members cy (cy[0] member
+// nd, cy[1] member nd - 1, on scale flag) down to member 1 of y.
+inline void RecurIBackward(double zr, double zi, double fnu, int nd, const double* cyr, const double* cyi,
+                           int flag, const double* bry, const double* cssr, const double* csrr, double* yr,
+                           double* yi) {
+    double rzr = 0.0, rzi = 0.0;
+    TwoOverZ(zr, zi, &rzr, &rzi);
+    double s1r = cyr[0], s1i = cyi[0], s2r = cyr[1], s2i = cyi[1];
+    double csr = csrr[flag - 1];
+    double ascle = bry[flag - 1];
+    int k = nd - 2;
+    double fn = static_cast<double>(k);
+    for (int i = 3; i <= nd; ++i) {
+        const double c2r = s2r;
+        const double c2i = s2i;
+        s2r = s1r + (fnu + fn) * (rzr * c2r - rzi * c2i);
+        s2i = s1i + (fnu + fn) * (rzr * c2i + rzi * c2r);
+        s1r = c2r;
+        s1i = c2i;
+        const double p2r = s2r * csr;
+        const double p2i = s2i * csr;
+        yr[k - 1] = p2r;
+        yi[k - 1] = p2i;
+        k = k - 1;
+        fn = fn - 1.0;
+        Rescale<LargerNumber>(p2r, p2i, bry, cssr, csrr, &flag, &ascle, &csr, &s1r, &s1i, &s2r, &s2i);
+    }
+}
+
+// cspn = exp(i fnf sgn), negated for odd ifn: the phase of K in the continuation K(z e^{i pi mr})
+// = K(z) e^{-i pi mr fnu} - i pi mr I(z), sgn = -pi sign(mr).
+inline void ContinuationPhase(double sgn, double fnf, int ifn, double* cspnr, double* cspni) {
+    const double ang = fnf * sgn;
+    *cspnr = std::cos(ang);
+    *cspni = std::sin(ang);
+    if (ifn % 2 != 0) {
+        *cspnr = -*cspnr;
+        *cspni = -*cspni;
+    }
+}
+
+// Adds the continuation's I terms to the K terms already in y, from the top member down:
+// y = y * cspn + s, cspn changing sign from member to member; with kode 2 the pair first goes
+// through the underflow check of zs1s2.
+struct KPlusI {
+    double zrr, zri;
+    int kode;
+    double asc, alim;
+    double cspnr, cspni;
+    int* iuf;
+    int* nz;
+
+    void Add(double sr, double si, double* yr, double* yi) {
+        double kr = *yr, ki = *yi;
+        if (kode != 1) {
+            int nw = 0;
+            zs1s2(zrr, zri, &kr, &ki, &sr, &si, &nw, asc, alim, iuf);
+            *nz = *nz + nw;
+        }
+        *yr = kr * cspnr - ki * cspni + sr;
+        *yi = kr * cspni + ki * cspnr + si;
+        cspnr = -cspnr;
+        cspni = -cspni;
+    }
+};
+
+// The I terms below the ones the expansions gave (il of them), by backward recurrence from the
+// two in cy on scale flag, added to the K terms of members kk, kk - 1, ...; fn = inu + il.
+inline void RecurIBackwardAddToK(int il, const double* cyr, const double* cyi, int flag, double fn,
+                                 double fnf, double rzr, double rzi, const double* bry, const double* cssr,
+                                 const double* csrr, KPlusI* add, int kk, double* yr, double* yi) {
+    double s1r = cyr[0], s1i = cyi[0], s2r = cyr[1], s2i = cyi[1];
+    double csr = csrr[flag - 1];
+    double ascle = bry[flag - 1];
+    for (int i = 1; i <= il; ++i) {
+        const double c2r = s2r;
+        const double c2i = s2i;
+        s2r = s1r + (fn + fnf) * (rzr * c2r - rzi * c2i);
+        s2i = s1i + (fn + fnf) * (rzr * c2i + rzi * c2r);
+        s1r = c2r;
+        s1i = c2i;
+        fn = fn - 1.0;
+        const double p2r = s2r * csr;
+        const double p2i = s2i * csr;
+        add->Add(p2r, p2i, &yr[kk - 1], &yi[kk - 1]);
+        kk = kk - 1;
+        Rescale<LargerNumber>(p2r, p2i, bry, cssr, csrr, &flag, &ascle, &csr, &s1r, &s1i, &s2r, &s2i);
+    }
 }
 
 }  // namespace tw::amos

@@ -169,7 +169,7 @@ void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double
     double bry[3], cwrkr[16], cwrki[16], cssr[3], csrr[3], cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
     double phir = 0.0, phii = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0, zeta2i = 0.0, sumr = 0.0,
            sumi = 0.0;
-    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0, rast = 0.0;
+    double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0;
     int iflag = 0, init = 0, nn = 0, nuf = 0, nw = 0;
     *nz = 0;
     int nd = n;
@@ -227,52 +227,8 @@ L30:
         yr[m - 1] = s2r * csrr[iflag - 1];
         yi[m - 1] = s2i * csrr[iflag - 1];
     }
-    if (nd > 2) {
-        // Recur backward for the rest.
-        rast = 1.0 / zabs(zr, zi);
-        str = zr * rast;
-        sti = -zi * rast;
-        const double rzr = (str + str) * rast;
-        const double rzi = (sti + sti) * rast;
-        s1r = cyr[0];
-        s1i = cyi[0];
-        s2r = cyr[1];
-        s2i = cyi[1];
-        double c1r = csrr[iflag - 1];
-        double ascle = bry[iflag - 1];
-        int k = nd - 2;
-        fn = static_cast<double>(k);
-        for (int i = 3; i <= nd; ++i) {
-            double c2r = s2r;
-            double c2i = s2i;
-            s2r = s1r + (fnu + fn) * (rzr * c2r - rzi * c2i);
-            s2i = s1i + (fnu + fn) * (rzr * c2i + rzi * c2r);
-            s1r = c2r;
-            s1i = c2i;
-            c2r = s2r * c1r;
-            c2i = s2i * c1r;
-            yr[k - 1] = c2r;
-            yi[k - 1] = c2i;
-            k = k - 1;
-            fn = fn - 1.0;
-            if (iflag >= 3) continue;
-            str = std::fabs(c2r);
-            sti = std::fabs(c2i);
-            const double c2m = std::fmax(str, sti);
-            if (c2m <= ascle) continue;
-            iflag = iflag + 1;
-            ascle = bry[iflag - 1];
-            s1r = s1r * c1r;
-            s1i = s1i * c1r;
-            s2r = c2r;
-            s2i = c2i;
-            s1r = s1r * cssr[iflag - 1];
-            s1i = s1i * cssr[iflag - 1];
-            s2r = s2r * cssr[iflag - 1];
-            s2i = s2i * cssr[iflag - 1];
-            c1r = csrr[iflag - 1];
-        }
-    }
+    // Recur backward for the rest.
+    if (nd > 2) RecurIBackward(zr, zi, fnu, nd, cyr, cyi, iflag, bry, cssr, csrr, yr, yi);
     return;
 L110:
     // Set underflow and update parameters.
@@ -398,52 +354,8 @@ L40:
         c2i = c2r * cidi;
         c2r = str;
     }
-    if (nd > 2) {
-        // Recur backward for the rest.
-        const double raz = 1.0 / zabs(zr, zi);
-        str = zr * raz;
-        sti = -zi * raz;
-        const double rzr = (str + str) * raz;
-        const double rzi = (sti + sti) * raz;
-        s1r = cyr[0];
-        s1i = cyi[0];
-        s2r = cyr[1];
-        s2i = cyi[1];
-        double c1r = csrr[iflag - 1];
-        double ascle = bry[iflag - 1];
-        int k = nd - 2;
-        fn = static_cast<double>(k);
-        for (int i = 3; i <= nd; ++i) {
-            c2r = s2r;
-            c2i = s2i;
-            s2r = s1r + (fnu + fn) * (rzr * c2r - rzi * c2i);
-            s2i = s1i + (fnu + fn) * (rzr * c2i + rzi * c2r);
-            s1r = c2r;
-            s1i = c2i;
-            c2r = s2r * c1r;
-            c2i = s2i * c1r;
-            yr[k - 1] = c2r;
-            yi[k - 1] = c2i;
-            k = k - 1;
-            fn = fn - 1.0;
-            if (iflag >= 3) continue;
-            str = std::fabs(c2r);
-            sti = std::fabs(c2i);
-            const double c2m = std::fmax(str, sti);
-            if (c2m <= ascle) continue;
-            iflag = iflag + 1;
-            ascle = bry[iflag - 1];
-            s1r = s1r * c1r;
-            s1i = s1i * c1r;
-            s2r = c2r;
-            s2i = c2i;
-            s1r = s1r * cssr[iflag - 1];
-            s1i = s1i * cssr[iflag - 1];
-            s2r = s2r * cssr[iflag - 1];
-            s2i = s2i * cssr[iflag - 1];
-            c1r = csrr[iflag - 1];
-        }
-    }
+    // Recur backward for the rest.
+    if (nd > 2) RecurIBackward(zr, zi, fnu, nd, cyr, cyi, iflag, bry, cssr, csrr, yr, yi);
     return;
 L120:
     if (rs1 > 0.0) {

@@ -10,6 +10,7 @@ namespace tw::amos {
 void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz,
            double tol, double elim, double alim) {
     namespace d = data::zunk1;
+    KPlusI add{};
     double bry[3], sumr[2] = {0.0, 0.0}, sumi[2] = {0.0, 0.0}, zeta1r[2] = {0.0, 0.0}, zeta1i[2] = {0.0, 0.0},
                    zeta2r[2] = {0.0, 0.0}, zeta2i[2] = {0.0, 0.0}, cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0},
                    phir[2] = {0.0, 0.0}, phii[2] = {0.0, 0.0}, cssr[3], csrr[3];
@@ -18,11 +19,10 @@ void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     int init[2] = {0, 0};
     int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0, kk = 0,
         nw = 0, initd = 0, ic = 0, ipard = 0, j = 0, m = 0;
-    double ang = 0.0, aphi = 0.0, asc = 0.0, ascle = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, cspni = 0.0,
-           cspnr = 0.0, csr = 0.0, c1i = 0.0, c1r = 0.0, c2i = 0.0, c2m = 0.0, c2r = 0.0, fmr = 0.0, fn = 0.0,
-           fnf = 0.0, phidi = 0.0, phidr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sgn = 0.0,
-           sti = 0.0, str = 0.0, sumdi = 0.0, sumdr = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0,
-           zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zri = 0.0, zrr = 0.0;
+    double aphi = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, cspni = 0.0, cspnr = 0.0, c2i = 0.0, c2r = 0.0,
+           fmr = 0.0, fn = 0.0, fnf = 0.0, phidi = 0.0, phidr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0,
+           rzr = 0.0, sgn = 0.0, sti = 0.0, str = 0.0, sumdi = 0.0, sumdr = 0.0, s1i = 0.0, s1r = 0.0,
+           s2i = 0.0, s2r = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zri = 0.0, zrr = 0.0;
     kdflg = 1;
     *nz = 0;
     // exp(-alim) = exp(-elim)/tol = approximately one digit of precision above the underflow limit.
@@ -119,42 +119,8 @@ L75:
             return;
         }
         // Forward recurrence for the remaining members.
-        s1r = cyr[0];
-        s1i = cyi[0];
-        s2r = cyr[1];
-        s2i = cyi[1];
-        c1r = csrr[kflag - 1];
-        ascle = bry[kflag - 1];
-        for (i = ib; i <= n; ++i) {
-            c2r = s2r;
-            c2i = s2i;
-            s2r = ckr * c2r - cki * c2i + s1r;
-            s2i = ckr * c2i + cki * c2r + s1i;
-            s1r = c2r;
-            s1i = c2i;
-            ckr = ckr + rzr;
-            cki = cki + rzi;
-            c2r = s2r * c1r;
-            c2i = s2i * c1r;
-            yr[i - 1] = c2r;
-            yi[i - 1] = c2i;
-            if (kflag >= 3) continue;
-            str = std::fabs(c2r);
-            sti = std::fabs(c2i);
-            c2m = std::fmax(str, sti);
-            if (c2m <= ascle) continue;
-            kflag = kflag + 1;
-            ascle = bry[kflag - 1];
-            s1r = s1r * c1r;
-            s1i = s1i * c1r;
-            s2r = c2r;
-            s2i = c2i;
-            s1r = s1r * cssr[kflag - 1];
-            s1i = s1i * cssr[kflag - 1];
-            s2r = s2r * cssr[kflag - 1];
-            s2i = s2i * cssr[kflag - 1];
-            c1r = csrr[kflag - 1];
-        }
+        RecurKForward<LargerNumber>(ib, n, cyr[0], cyi[0], cyr[1], cyi[1], ckr, cki, rzr, rzi, kflag, bry,
+                                    cssr, csrr, yr, yi);
     }
     if (mr == 0) return;
     // Analytic continuation for Re z < 0.
@@ -166,15 +132,8 @@ L75:
     inu = static_cast<int>(fnu);
     fnf = fnu - static_cast<double>(inu);
     ifn = inu + n - 1;
-    ang = fnf * sgn;
-    cspnr = std::cos(ang);
-    cspni = std::sin(ang);
-    if (ifn % 2 != 0) {
-        cspnr = -cspnr;
-        cspni = -cspni;
-    }
-    asc = bry[0];
-    iuf = 0;
+    ContinuationPhase(sgn, fnf, ifn, &cspnr, &cspni);
+    add = KPlusI{zrr, zri, kode, bry[0], alim, cspnr, cspni, &iuf, nz};
     kk = n;
     kdflg = 1;
     ib = ib - 1;
@@ -228,20 +187,9 @@ L75:
         cyi[kdflg - 1] = s2i;
         c2r = s2r;
         c2i = s2i;
-        s2r = s2r * csrr[iflag - 1];
-        s2i = s2i * csrr[iflag - 1];
         // Add I and K functions, K sequence in y(i), i = 1, n.
-        s1r = yr[kk - 1];
-        s1i = yi[kk - 1];
-        if (kode != 1) {
-            zs1s2(zrr, zri, &s1r, &s1i, &s2r, &s2i, &nw, asc, alim, &iuf);
-            *nz = *nz + nw;
-        }
-        yr[kk - 1] = s1r * cspnr - s1i * cspni + s2r;
-        yi[kk - 1] = cspnr * s1i + cspni * s1r + s2i;
+        add.Add(s2r * csrr[iflag - 1], s2i * csrr[iflag - 1], &yr[kk - 1], &yi[kk - 1]);
         kk = kk - 1;
-        cspnr = -cspnr;
-        cspni = -cspni;
         if (c2r != 0.0 || c2i != 0.0) {
             if (kdflg == 2) goto L275;
             kdflg = 2;
@@ -260,53 +208,8 @@ L275:
     il = n - k;
     if (il == 0) return;
     // Recur backward for the remaining I terms and add them to the K terms.
-    s1r = cyr[0];
-    s1i = cyi[0];
-    s2r = cyr[1];
-    s2i = cyi[1];
-    csr = csrr[iflag - 1];
-    ascle = bry[iflag - 1];
-    fn = static_cast<double>(inu + il);
-    for (i = 1; i <= il; ++i) {
-        c2r = s2r;
-        c2i = s2i;
-        s2r = s1r + (fn + fnf) * (rzr * c2r - rzi * c2i);
-        s2i = s1i + (fn + fnf) * (rzr * c2i + rzi * c2r);
-        s1r = c2r;
-        s1i = c2i;
-        fn = fn - 1.0;
-        c2r = s2r * csr;
-        c2i = s2i * csr;
-        ckr = c2r;
-        cki = c2i;
-        c1r = yr[kk - 1];
-        c1i = yi[kk - 1];
-        if (kode != 1) {
-            zs1s2(zrr, zri, &c1r, &c1i, &c2r, &c2i, &nw, asc, alim, &iuf);
-            *nz = *nz + nw;
-        }
-        yr[kk - 1] = c1r * cspnr - c1i * cspni + c2r;
-        yi[kk - 1] = c1r * cspni + c1i * cspnr + c2i;
-        kk = kk - 1;
-        cspnr = -cspnr;
-        cspni = -cspni;
-        if (iflag >= 3) continue;
-        c2r = std::fabs(ckr);
-        c2i = std::fabs(cki);
-        c2m = std::fmax(c2r, c2i);
-        if (c2m <= ascle) continue;
-        iflag = iflag + 1;
-        ascle = bry[iflag - 1];
-        s1r = s1r * csr;
-        s1i = s1i * csr;
-        s2r = ckr;
-        s2i = cki;
-        s1r = s1r * cssr[iflag - 1];
-        s1i = s1i * cssr[iflag - 1];
-        s2r = s2r * cssr[iflag - 1];
-        s2i = s2i * cssr[iflag - 1];
-        csr = csrr[iflag - 1];
-    }
+    RecurIBackwardAddToK(il, cyr, cyi, iflag, static_cast<double>(inu + il), fnf, rzr, rzi, bry, cssr, csrr,
+                         &add, kk, yr, yi);
     return;
 L300:
     *nz = -1;
@@ -315,20 +218,20 @@ L300:
 void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr, double* yi, int* nz,
            double tol, double elim, double alim) {
     namespace d = data::zunk2;
+    KPlusI add{};
     double bry[3], asumr[2] = {0.0, 0.0}, asumi[2] = {0.0, 0.0}, bsumr[2] = {0.0, 0.0}, bsumi[2] = {0.0, 0.0},
                    phir[2] = {0.0, 0.0}, phii[2] = {0.0, 0.0}, argr[2] = {0.0, 0.0}, argi[2] = {0.0, 0.0},
                    zeta1r[2] = {0.0, 0.0}, zeta1i[2] = {0.0, 0.0}, zeta2r[2] = {0.0, 0.0},
                    zeta2i[2] = {0.0, 0.0}, cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0}, cssr[3], csrr[3];
     int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, in = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0,
         kk = 0, nai = 0, ndai = 0, nw = 0, idum = 0, j = 0, ipard = 0, ic = 0;
-    double aii = 0.0, air = 0.0, ang = 0.0, aphi = 0.0, argdi = 0.0, argdr = 0.0, asc = 0.0, ascle = 0.0,
-           asumdi = 0.0, asumdr = 0.0, bsumdi = 0.0, bsumdr = 0.0, car = 0.0, cki = 0.0, ckr = 0.0,
-           csgni = 0.0, csi = 0.0, cspni = 0.0, cspnr = 0.0, csr = 0.0, c1i = 0.0, c1r = 0.0, c2i = 0.0,
-           c2m = 0.0, c2r = 0.0, daii = 0.0, dair = 0.0, fmr = 0.0, fn = 0.0, fnf = 0.0, phidi = 0.0,
-           phidr = 0.0, pti = 0.0, ptr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0, sar = 0.0,
-           sgn = 0.0, sti = 0.0, str = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0, yy = 0.0, zbi = 0.0,
-           zbr = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zni = 0.0, znr = 0.0, zri = 0.0,
-           zrr = 0.0;
+    double aii = 0.0, air = 0.0, ang = 0.0, aphi = 0.0, argdi = 0.0, argdr = 0.0, asumdi = 0.0, asumdr = 0.0,
+           bsumdi = 0.0, bsumdr = 0.0, car = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, csi = 0.0, cspni = 0.0,
+           cspnr = 0.0, csr = 0.0, c2i = 0.0, c2r = 0.0, daii = 0.0, dair = 0.0, fmr = 0.0, fn = 0.0,
+           fnf = 0.0, phidi = 0.0, phidr = 0.0, pti = 0.0, ptr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0,
+           rzr = 0.0, sar = 0.0, sgn = 0.0, sti = 0.0, str = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0, s2r = 0.0,
+           yy = 0.0, zbi = 0.0, zbr = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zni = 0.0,
+           znr = 0.0, zri = 0.0, zrr = 0.0;
     kdflg = 1;
     *nz = 0;
     // exp(-alim) = exp(-elim)/tol = approximately one digit of precision above the underflow limit.
@@ -466,42 +369,8 @@ L85:
             return;
         }
         // Forward recurrence for the remaining members.
-        s1r = cyr[0];
-        s1i = cyi[0];
-        s2r = cyr[1];
-        s2i = cyi[1];
-        c1r = csrr[kflag - 1];
-        ascle = bry[kflag - 1];
-        for (i = ib; i <= n; ++i) {
-            c2r = s2r;
-            c2i = s2i;
-            s2r = ckr * c2r - cki * c2i + s1r;
-            s2i = ckr * c2i + cki * c2r + s1i;
-            s1r = c2r;
-            s1i = c2i;
-            ckr = ckr + rzr;
-            cki = cki + rzi;
-            c2r = s2r * c1r;
-            c2i = s2i * c1r;
-            yr[i - 1] = c2r;
-            yi[i - 1] = c2i;
-            if (kflag >= 3) continue;
-            str = std::fabs(c2r);
-            sti = std::fabs(c2i);
-            c2m = std::fmax(str, sti);
-            if (c2m <= ascle) continue;
-            kflag = kflag + 1;
-            ascle = bry[kflag - 1];
-            s1r = s1r * c1r;
-            s1i = s1i * c1r;
-            s2r = c2r;
-            s2i = c2i;
-            s1r = s1r * cssr[kflag - 1];
-            s1i = s1i * cssr[kflag - 1];
-            s2r = s2r * cssr[kflag - 1];
-            s2i = s2i * cssr[kflag - 1];
-            c1r = csrr[kflag - 1];
-        }
+        RecurKForward<LargerNumber>(ib, n, cyr[0], cyi[0], cyr[1], cyi[1], ckr, cki, rzr, rzi, kflag, bry,
+                                    cssr, csrr, yr, yi);
     }
     if (mr == 0) return;
     // Analytic continuation for Re z < 0.
@@ -512,13 +381,7 @@ L85:
     csgni = sgn;
     if (yy <= 0.0) csgni = -csgni;
     ifn = inu + n - 1;
-    ang = fnf * sgn;
-    cspnr = std::cos(ang);
-    cspni = std::sin(ang);
-    if (ifn % 2 != 0) {
-        cspnr = -cspnr;
-        cspni = -cspni;
-    }
+    ContinuationPhase(sgn, fnf, ifn, &cspnr, &cspni);
     // cs = coefficient of the Airy-type form of I, rotated through the powers of i.
     csr = sar * csgni;
     csi = car * csgni;
@@ -528,8 +391,7 @@ L85:
     str = csr * c2r + csi * c2i;
     csi = -csr * c2i + csi * c2r;
     csr = str;
-    asc = bry[0];
-    iuf = 0;
+    add = KPlusI{zrr, zri, kode, bry[0], alim, cspnr, cspni, &iuf, nz};
     kk = n;
     kdflg = 1;
     ib = ib - 1;
@@ -591,20 +453,9 @@ L85:
         cyi[kdflg - 1] = s2i;
         c2r = s2r;
         c2i = s2i;
-        s2r = s2r * csrr[iflag - 1];
-        s2i = s2i * csrr[iflag - 1];
         // Add I and K functions, K sequence in y(i), i = 1, n.
-        s1r = yr[kk - 1];
-        s1i = yi[kk - 1];
-        if (kode != 1) {
-            zs1s2(zrr, zri, &s1r, &s1i, &s2r, &s2i, &nw, asc, alim, &iuf);
-            *nz = *nz + nw;
-        }
-        yr[kk - 1] = s1r * cspnr - s1i * cspni + s2r;
-        yi[kk - 1] = s1r * cspni + s1i * cspnr + s2i;
+        add.Add(s2r * csrr[iflag - 1], s2i * csrr[iflag - 1], &yr[kk - 1], &yi[kk - 1]);
         kk = kk - 1;
-        cspnr = -cspnr;
-        cspni = -cspni;
         str = csi;
         csi = -csr;
         csr = str;
@@ -626,53 +477,8 @@ L295:
     il = n - k;
     if (il == 0) return;
     // Recur backward for the remaining I terms and add them to the K terms.
-    s1r = cyr[0];
-    s1i = cyi[0];
-    s2r = cyr[1];
-    s2i = cyi[1];
-    csr = csrr[iflag - 1];
-    ascle = bry[iflag - 1];
-    fn = static_cast<double>(inu + il);
-    for (i = 1; i <= il; ++i) {
-        c2r = s2r;
-        c2i = s2i;
-        s2r = s1r + (fn + fnf) * (rzr * c2r - rzi * c2i);
-        s2i = s1i + (fn + fnf) * (rzr * c2i + rzi * c2r);
-        s1r = c2r;
-        s1i = c2i;
-        fn = fn - 1.0;
-        c2r = s2r * csr;
-        c2i = s2i * csr;
-        ckr = c2r;
-        cki = c2i;
-        c1r = yr[kk - 1];
-        c1i = yi[kk - 1];
-        if (kode != 1) {
-            zs1s2(zrr, zri, &c1r, &c1i, &c2r, &c2i, &nw, asc, alim, &iuf);
-            *nz = *nz + nw;
-        }
-        yr[kk - 1] = c1r * cspnr - c1i * cspni + c2r;
-        yi[kk - 1] = c1r * cspni + c1i * cspnr + c2i;
-        kk = kk - 1;
-        cspnr = -cspnr;
-        cspni = -cspni;
-        if (iflag >= 3) continue;
-        c2r = std::fabs(ckr);
-        c2i = std::fabs(cki);
-        c2m = std::fmax(c2r, c2i);
-        if (c2m <= ascle) continue;
-        iflag = iflag + 1;
-        ascle = bry[iflag - 1];
-        s1r = s1r * csr;
-        s1i = s1i * csr;
-        s2r = ckr;
-        s2i = cki;
-        s1r = s1r * cssr[iflag - 1];
-        s1i = s1i * cssr[iflag - 1];
-        s2r = s2r * cssr[iflag - 1];
-        s2i = s2i * cssr[iflag - 1];
-        csr = csrr[iflag - 1];
-    }
+    RecurIBackwardAddToK(il, cyr, cyi, iflag, static_cast<double>(inu + il), fnf, rzr, rzi, bry, cssr, csrr,
+                         &add, kk, yr, yi);
     return;
 L320:
     *nz = -1;
