@@ -39,34 +39,176 @@ Limits MachineLimits() {
     return m;
 }
 
+// ierr = 1 for arguments out of their sets; bad is the caller's own test (z = 0, the kind).
+bool Refused(bool bad, double fnu, int kode, int n, int* nz, int* ierr) {
+    *ierr = 0;
+    *nz = 0;
+    if (bad) *ierr = 1;
+    if (fnu < 0.0) *ierr = 1;
+    if (kode < 1 || kode > 2) *ierr = 1;
+    if (n < 1) *ierr = 1;
+    return *ierr != 0;
+}
+
+// The largest |z| and order the drivers accept: half the precision's reciprocal, or half the
+// largest integer.
+double ArgumentLimit(double tol) { return std::min(0.5 / tol, static_cast<double>(kI1Mach9) * 0.5); }
+
+// false when |z| or the order passes the limit; ierr = 3 past its square root (half the digits
+// are lost there).
+bool InRange(double az, double fn, double tol, int* ierr) {
+    double aa = ArgumentLimit(tol);
+    if (az > aa) return false;
+    if (fn > aa) return false;
+    aa = std::sqrt(aa);
+    if (az > aa) *ierr = 3;
+    if (fn > aa) *ierr = 3;
+    return true;
+}
+
+// p = y * c. A y near underflow is first brought up by 1/tol and the product taken down again, so
+// its digits are not lost to denormals on the way.
+void TimesGuarded(double yr, double yi, double cr, double ci, double ascle, double tol, double* pr, double* pi) {
+    const double rtol = 1.0 / tol;
+    double aa = yr, bb = yi, atol = 1.0;
+    if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
+        aa = aa * rtol;
+        bb = bb * rtol;
+        atol = tol;
+    }
+    *pr = (aa * cr - bb * ci) * atol;
+    *pi = (aa * ci + bb * cr) * atol;
+}
+
+// How K or H gets the last member of the sequence: zero (underflow) at a tiny |z| or when it would
+// overflow at a small one, the uniform expansions past fnul, zuoik's pre-test for orders above 2,
+// or directly.
+enum class Route { kOverflow, kUniform, kPreTest, kDirect };
+
+Route LastMemberRoute(double az, double fnu, double fn, double fnul, double tol, double elim) {
+    const double ufl = kD1Mach1 * 1.0e+3;
+    if (az < ufl) return Route::kOverflow;
+    if (fnu > fnul) return Route::kUniform;
+    if (fn <= 1.0) return Route::kDirect;
+    if (fn > 2.0) return Route::kPreTest;
+    if (az > tol) return Route::kDirect;
+    const double arg = 0.5 * az;
+    const double aln = -fn * std::log(arg);
+    if (aln > elim) return Route::kOverflow;
+    return Route::kDirect;
+}
+
+// zeta = (2/3) z^(3/2) of the Airy functions, with csq = z^(1/2).
+void AiryZeta(double zr, double zi, double tth, double* csqr, double* csqi, double* ztar, double* ztai) {
+    zsqrt(zr, zi, csqr, csqi);
+    *ztar = tth * (zr * *csqr - zi * *csqi);
+    *ztai = tth * (zr * *csqi + zi * *csqr);
+}
+
+// The Airy power series for |z| <= 1: s1 and s2 sum the terms in z^3 of the two solutions (id = 0)
+// or of their derivatives (id = 1, fid = 1), both starting from 1; they stay 1 when |z|^3 < tol.
+void AiryPowerSeries(double zr, double zi, double az, double fid, double tol, double* s1r, double* s1i, double* s2r,
+                     double* s2i) {
+    *s1r = 1.0;
+    *s1i = 0.0;
+    *s2r = 1.0;
+    *s2i = 0.0;
+    const double aa = az * az;
+    if (aa < tol / az) return;
+    double trm1r = 1.0, trm1i = 0.0, trm2r = 1.0, trm2i = 0.0, atrm = 1.0;
+    double str = zr * zr - zi * zi;
+    double sti = zr * zi + zi * zr;
+    const double z3r = str * zr - sti * zi;
+    const double z3i = str * zi + sti * zr;
+    const double az3 = az * aa;
+    double ak = 2.0 + fid;
+    double bk = 3.0 - fid - fid;
+    const double ck = 4.0 - fid;
+    const double dk = 3.0 + fid + fid;
+    double d1 = ak * dk;
+    double d2 = bk * ck;
+    double ad = std::min(d1, d2);
+    ak = 24.0 + 9.0 * fid;
+    bk = 30.0 - 9.0 * fid;
+    for (int k = 1; k <= 25; ++k) {
+        str = (trm1r * z3r - trm1i * z3i) / d1;
+        trm1i = (trm1r * z3i + trm1i * z3r) / d1;
+        trm1r = str;
+        *s1r = *s1r + trm1r;
+        *s1i = *s1i + trm1i;
+        str = (trm2r * z3r - trm2i * z3i) / d2;
+        trm2i = (trm2r * z3i + trm2i * z3r) / d2;
+        trm2r = str;
+        *s2r = *s2r + trm2r;
+        *s2i = *s2i + trm2i;
+        atrm = atrm * az3 / ad;
+        d1 = d1 + ak;
+        d2 = d2 + bk;
+        ad = std::min(d1, d2);
+        if (atrm < tol * ad) break;
+        ak = ak + 18.0;
+        bk = bk + 18.0;
+    }
+}
+
+// Ai scaled by exp(zeta) (kode 2).
+void TimesExpZeta(double zr, double zi, double tth, double* air, double* aii) {
+    double str = 0.0, sti = 0.0, ztar = 0.0, ztai = 0.0;
+    AiryZeta(zr, zi, tth, &str, &sti, &ztar, &ztai);
+    zexp(ztar, ztai, &str, &sti);
+    const double ptr = *air * str - *aii * sti;
+    *aii = *air * sti + *aii * str;
+    *air = ptr;
+}
+
+// Bi scaled by exp(-|Re zeta|) (kode 2).
+void TimesExpMinusAbsReZeta(double zr, double zi, double tth, double* bir, double* bii) {
+    double str = 0.0, sti = 0.0, ztar = 0.0, ztai = 0.0;
+    AiryZeta(zr, zi, tth, &str, &sti, &ztar, &ztai);
+    const double eaa = std::exp(-std::fabs(ztar));
+    *bir = *bir * eaa;
+    *bii = *bii * eaa;
+}
+
+// |z| past this is refused (ierr 4) by the Airy drivers, past its square root flagged (ierr 3).
+bool AiryInRange(double az, double tol, double tth, int* ierr) {
+    double aa = std::pow(ArgumentLimit(tol), tth);
+    if (az > aa) return false;
+    aa = std::sqrt(aa);
+    if (az > aa) *ierr = 3;
+    return true;
+}
+
+// Re zeta <= 0 when Re z < 0, most of all when Im z is small, where the square root's rounding
+// could leave it positive. (z is finite here: a NaN never reaches |z| > 1.)
+void AiryZetaLeft(double zr, double zi, double* ztar, double* ztai) {
+    const double ak = *ztai;
+    if (zr < 0.0) {
+        *ztar = -std::fabs(*ztar);
+        *ztai = ak;
+    }
+    if (zi == 0.0 && zr <= 0.0) {
+        *ztar = 0.0;
+        *ztai = ak;
+    }
+}
+
 }  // namespace
 
 // J(fnu, z) = exp(fnu*pi*i/2) * I(fnu, -i*z) for Im z >= 0 and its mirror for Im z < 0.
 void zbesj(double zr, double zi, double fnu, int kode, int n, double* cyr, double* cyi, int* nz, int* ierr) {
     using namespace data::zbesj;
     int i = 0, inu = 0, inuh = 0, ir = 0, nl = 0;
-    double aa = 0, arg = 0, cii = 0, csgni = 0, csgnr = 0, str = 0, zni = 0, znr = 0, bb = 0, fn = 0, az = 0;
-    double ascle = 0, rtol = 0, atol = 0, sti = 0;
+    double arg = 0, cii = 0, csgni = 0, csgnr = 0, str = 0, zni = 0, znr = 0, fn = 0, az = 0;
+    double ascle = 0, rtol = 0;
 
-    *ierr = 0;
-    *nz = 0;
-    if (fnu < 0.0) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (n < 1) *ierr = 1;
-    if (*ierr != 0) return;
+    if (Refused(false, fnu, kode, n, nz, ierr)) return;
     const Limits lim = MachineLimits();
     const double tol = lim.tol, elim = lim.elim, alim = lim.alim, rl = lim.rl, fnul = lim.fnul;
     // Test for proper range.
     az = zabs(zr, zi);
     fn = fnu + static_cast<double>(n - 1);
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    if (az > aa) goto L260;
-    if (fn > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    if (fn > aa) *ierr = 3;
+    if (!InRange(az, fn, tol, ierr)) goto L260;
     // Calculate csgn = exp(fnu*hpi*i) to minimise losses of significance when fnu is large.
     cii = 1.0;
     inu = static_cast<int>(fnu);
@@ -95,18 +237,7 @@ void zbesj(double zr, double zi, double fnu, int kode, int n, double* cyr, doubl
     rtol = 1.0 / tol;
     ascle = kD1Mach1 * rtol * 1.0e+3;
     for (i = 1; i <= nl; ++i) {
-        aa = cyr[i - 1];
-        bb = cyi[i - 1];
-        atol = 1.0;
-        if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
-            aa = aa * rtol;
-            bb = bb * rtol;
-            atol = tol;
-        }
-        str = aa * csgnr - bb * csgni;
-        sti = aa * csgni + bb * csgnr;
-        cyr[i - 1] = str * atol;
-        cyi[i - 1] = sti * atol;
+        TimesGuarded(cyr[i - 1], cyi[i - 1], csgnr, csgni, ascle, tol, &cyr[i - 1], &cyi[i - 1]);
         str = -csgni * cii;
         csgni = csgnr * cii;
         csgnr = str;
@@ -131,15 +262,9 @@ void zbesy(double zr, double zi, double fnu, int kode, int n, double* cyr, doubl
            double* cwrki, int* ierr) {
     int i = 0, nz1 = 0, nz2 = 0;
     double c1i = 0, c1r = 0, c2i = 0, c2r = 0, exi = 0, exr = 0, ey = 0, hcii = 0, sti = 0, str = 0, tay = 0;
-    double ascle = 0, rtol = 0, atol = 0, aa = 0, bb = 0, tol = 0, elim = 0;
+    double ascle = 0, rtol = 0, ptr = 0, pti = 0, tol = 0, elim = 0;
 
-    *ierr = 0;
-    *nz = 0;
-    if (zr == 0.0 && zi == 0.0) *ierr = 1;
-    if (fnu < 0.0) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (n < 1) *ierr = 1;
-    if (*ierr != 0) return;
+    if (Refused((zr == 0.0 && zi == 0.0), fnu, kode, n, nz, ierr)) return;
     hcii = 0.5;
     zbesh(zr, zi, fnu, kode, 1, n, cyr, cyi, &nz1, ierr);
     if (*ierr != 0 && *ierr != 3) goto L170;
@@ -180,26 +305,10 @@ L60:
     rtol = 1.0 / tol;
     ascle = kD1Mach1 * rtol * 1.0e+3;
     for (i = 1; i <= n; ++i) {
-        aa = cwrkr[i - 1];
-        bb = cwrki[i - 1];
-        atol = 1.0;
-        if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
-            aa = aa * rtol;
-            bb = bb * rtol;
-            atol = tol;
-        }
-        str = (aa * c2r - bb * c2i) * atol;
-        sti = (aa * c2i + bb * c2r) * atol;
-        aa = cyr[i - 1];
-        bb = cyi[i - 1];
-        atol = 1.0;
-        if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
-            aa = aa * rtol;
-            bb = bb * rtol;
-            atol = tol;
-        }
-        str = str - (aa * c1r - bb * c1i) * atol;
-        sti = sti - (aa * c1i + bb * c1r) * atol;
+        TimesGuarded(cwrkr[i - 1], cwrki[i - 1], c2r, c2i, ascle, tol, &str, &sti);
+        TimesGuarded(cyr[i - 1], cyi[i - 1], c1r, c1i, ascle, tol, &ptr, &pti);
+        str = str - ptr;
+        sti = sti - pti;
         cyr[i - 1] = -sti * hcii;
         cyi[i - 1] = str * hcii;
         if (str == 0.0 && sti == 0.0 && ey == 0.0) *nz = *nz + 1;
@@ -213,27 +322,15 @@ L170:
 void zbesi(double zr, double zi, double fnu, int kode, int n, double* cyr, double* cyi, int* nz, int* ierr) {
     using namespace data::zbesi;
     int i = 0, inu = 0, nn = 0;
-    double aa = 0, arg = 0, csgni = 0, csgnr = 0, str = 0, zni = 0, znr = 0, az = 0, bb = 0, fn = 0, ascle = 0;
-    double rtol = 0, atol = 0, sti = 0;
+    double arg = 0, csgni = 0, csgnr = 0, zni = 0, znr = 0, az = 0, fn = 0, ascle = 0;
+    double rtol = 0;
 
-    *ierr = 0;
-    *nz = 0;
-    if (fnu < 0.0) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (n < 1) *ierr = 1;
-    if (*ierr != 0) return;
+    if (Refused(false, fnu, kode, n, nz, ierr)) return;
     const Limits lim = MachineLimits();
     const double tol = lim.tol, elim = lim.elim, alim = lim.alim, rl = lim.rl, fnul = lim.fnul;
     az = zabs(zr, zi);
     fn = fnu + static_cast<double>(n - 1);
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    if (az > aa) goto L260;
-    if (fn > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    if (fn > aa) *ierr = 3;
+    if (!InRange(az, fn, tol, ierr)) goto L260;
     znr = zr;
     zni = zi;
     csgnr = CONER;
@@ -261,18 +358,7 @@ void zbesi(double zr, double zi, double fnu, int kode, int n, double* cyr, doubl
     rtol = 1.0 / tol;
     ascle = kD1Mach1 * rtol * 1.0e+3;
     for (i = 1; i <= nn; ++i) {
-        aa = cyr[i - 1];
-        bb = cyi[i - 1];
-        atol = 1.0;
-        if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
-            aa = aa * rtol;
-            bb = bb * rtol;
-            atol = tol;
-        }
-        str = aa * csgnr - bb * csgni;
-        sti = aa * csgni + bb * csgnr;
-        cyr[i - 1] = str * atol;
-        cyi[i - 1] = sti * atol;
+        TimesGuarded(cyr[i - 1], cyi[i - 1], csgnr, csgni, ascle, tol, &cyr[i - 1], &cyi[i - 1]);
         csgnr = -csgnr;
         csgni = -csgni;
     }
@@ -294,40 +380,22 @@ L260:
 // K(fnu, z): zbknu in the right half plane, zacon to the left, zbunk for large order.
 void zbesk(double zr, double zi, double fnu, int kode, int n, double* cyr, double* cyi, int* nz, int* ierr) {
     int mr = 0, nn = 0, nuf = 0, nw = 0;
-    double aa = 0, aln = 0, arg = 0, az = 0, fn = 0, ufl = 0, bb = 0;
+    double az = 0, fn = 0;
 
-    *ierr = 0;
-    *nz = 0;
-    if (zi == 0.0 && zr == 0.0) *ierr = 1;
-    if (fnu < 0.0) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (n < 1) *ierr = 1;
-    if (*ierr != 0) return;
+    if (Refused((zi == 0.0 && zr == 0.0), fnu, kode, n, nz, ierr)) return;
     nn = n;
     const Limits lim = MachineLimits();
     const double tol = lim.tol, elim = lim.elim, alim = lim.alim, rl = lim.rl, fnul = lim.fnul;
     az = zabs(zr, zi);
     fn = fnu + static_cast<double>(nn - 1);
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    if (az > aa) goto L260;
-    if (fn > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    if (fn > aa) *ierr = 3;
+    if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
-    ufl = kD1Mach1 * 1.0e+3;
-    if (az < ufl) goto L180;
-    if (fnu > fnul) goto L80;
-    if (fn <= 1.0) goto L60;
-    if (fn > 2.0) goto L50;
-    if (az > tol) goto L60;
-    arg = 0.5 * az;
-    aln = -fn * std::log(arg);
-    if (aln > elim) goto L180;
-    goto L60;
-L50:
+    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
+        case Route::kOverflow: goto L180;
+        case Route::kUniform: goto L80;
+        case Route::kDirect: goto L60;
+        case Route::kPreTest: break;
+    }
     zuoik(zr, zi, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
     if (nuf < 0) goto L180;
     *nz = *nz + nuf;
@@ -383,17 +451,10 @@ L260:
 void zbesh(double zr, double zi, double fnu, int kode, int m, int n, double* cyr, double* cyi, int* nz, int* ierr) {
     using namespace data::zbesh;
     int i = 0, inu = 0, inuh = 0, ir = 0, mm = 0, mr = 0, nn = 0, nuf = 0, nw = 0;
-    double aa = 0, aln = 0, arg = 0, az = 0, fmm = 0, fn = 0, rhpi = 0, sgn = 0, str = 0, ufl = 0, zni = 0;
-    double znr = 0, zti = 0, bb = 0, ascle = 0, rtol = 0, atol = 0, sti = 0, csgnr = 0, csgni = 0;
+    double arg = 0, az = 0, fmm = 0, fn = 0, rhpi = 0, sgn = 0, str = 0, zni = 0;
+    double znr = 0, zti = 0, ascle = 0, rtol = 0, csgnr = 0, csgni = 0;
 
-    *ierr = 0;
-    *nz = 0;
-    if (zr == 0.0 && zi == 0.0) *ierr = 1;
-    if (fnu < 0.0) *ierr = 1;
-    if (m < 1 || m > 2) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (n < 1) *ierr = 1;
-    if (*ierr != 0) return;
+    if (Refused((zr == 0.0 && zi == 0.0) || (m < 1 || m > 2), fnu, kode, n, nz, ierr)) return;
     nn = n;
     const Limits lim = MachineLimits();
     const double tol = lim.tol, elim = lim.elim, alim = lim.alim, rl = lim.rl, fnul = lim.fnul;
@@ -404,26 +465,14 @@ void zbesh(double zr, double zi, double fnu, int kode, int m, int n, double* cyr
     zni = -fmm * zr;
     // Test for proper range.
     az = zabs(zr, zi);
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    if (az > aa) goto L260;
-    if (fn > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    if (fn > aa) *ierr = 3;
+    if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
-    ufl = kD1Mach1 * 1.0e+3;
-    if (az < ufl) goto L230;
-    if (fnu > fnul) goto L90;
-    if (fn <= 1.0) goto L70;
-    if (fn > 2.0) goto L60;
-    if (az > tol) goto L70;
-    arg = 0.5 * az;
-    aln = -fn * std::log(arg);
-    if (aln > elim) goto L230;
-    goto L70;
-L60:
+    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
+        case Route::kOverflow: goto L230;
+        case Route::kUniform: goto L90;
+        case Route::kDirect: goto L70;
+        case Route::kPreTest: break;
+    }
     zuoik(znr, zni, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
     if (nuf < 0) goto L230;
     *nz = *nz + nuf;
@@ -473,20 +522,9 @@ L110:
     }
     zti = -fmm;
     rtol = 1.0 / tol;
-    ascle = ufl * rtol;
+    ascle = kD1Mach1 * 1.0e+3 * rtol;
     for (i = 1; i <= nn; ++i) {
-        aa = cyr[i - 1];
-        bb = cyi[i - 1];
-        atol = 1.0;
-        if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
-            aa = aa * rtol;
-            bb = bb * rtol;
-            atol = tol;
-        }
-        str = aa * csgnr - bb * csgni;
-        sti = aa * csgni + bb * csgnr;
-        cyr[i - 1] = str * atol;
-        cyi[i - 1] = sti * atol;
+        TimesGuarded(cyr[i - 1], cyi[i - 1], csgnr, csgni, ascle, tol, &cyr[i - 1], &cyi[i - 1]);
         str = -csgni * zti;
         csgni = csgnr * zti;
         csgnr = str;
@@ -514,11 +552,11 @@ L260:
 void zairy(double zr, double zi, int id, int kode, double* air, double* aii, int* nz, int* ierr) {
     using namespace data::zairy;
     double cyr[1] = {0.0}, cyi[1] = {0.0};
-    int iflag = 0, k = 0, k1 = 0, k2 = 0, mr = 0, nn = 0;
-    double aa = 0, ad = 0, ak = 0, alim = 0, atrm = 0, az = 0, az3 = 0, bk = 0, cc = 0, ck = 0, csqi = 0;
-    double csqr = 0, dig = 0, dk = 0, d1 = 0, d2 = 0, elim = 0, fid = 0, fnu = 0, ptr = 0, rl = 0, r1m5 = 0;
-    double sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0, trm1i = 0, trm1r = 0;
-    double trm2i = 0, trm2r = 0, ztai = 0, ztar = 0, z3i = 0, z3r = 0, alaz = 0, bb = 0;
+    int iflag = 0, mr = 0, nn = 0;
+    double aa = 0, alim = 0, az = 0, cc = 0, csqi = 0;
+    double csqr = 0, elim = 0, fid = 0, fnu = 0, rl = 0;
+    double sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0;
+    double ztai = 0, ztar = 0, alaz = 0;
 
     *ierr = 0;
     *nz = 0;
@@ -530,63 +568,12 @@ void zairy(double zr, double zi, int id, int kode, double* air, double* aii, int
     fid = static_cast<double>(id);
     if (az > 1.0) goto L70;
     // Power series for |z| <= 1.
-    s1r = CONER;
-    s1i = CONEI;
-    s2r = CONER;
-    s2i = CONEI;
     if (az < tol) goto L170;
-    aa = az * az;
-    if (aa < tol / az) goto L40;
-    trm1r = CONER;
-    trm1i = CONEI;
-    trm2r = CONER;
-    trm2i = CONEI;
-    atrm = 1.0;
-    str = zr * zr - zi * zi;
-    sti = zr * zi + zi * zr;
-    z3r = str * zr - sti * zi;
-    z3i = str * zi + sti * zr;
-    az3 = az * aa;
-    ak = 2.0 + fid;
-    bk = 3.0 - fid - fid;
-    ck = 4.0 - fid;
-    dk = 3.0 + fid + fid;
-    d1 = ak * dk;
-    d2 = bk * ck;
-    ad = std::min(d1, d2);
-    ak = 24.0 + 9.0 * fid;
-    bk = 30.0 - 9.0 * fid;
-    for (k = 1; k <= 25; ++k) {
-        str = (trm1r * z3r - trm1i * z3i) / d1;
-        trm1i = (trm1r * z3i + trm1i * z3r) / d1;
-        trm1r = str;
-        s1r = s1r + trm1r;
-        s1i = s1i + trm1i;
-        str = (trm2r * z3r - trm2i * z3i) / d2;
-        trm2i = (trm2r * z3i + trm2i * z3r) / d2;
-        trm2r = str;
-        s2r = s2r + trm2r;
-        s2i = s2i + trm2i;
-        atrm = atrm * az3 / ad;
-        d1 = d1 + ak;
-        d2 = d2 + bk;
-        ad = std::min(d1, d2);
-        if (atrm < tol * ad) break;
-        ak = ak + 18.0;
-        bk = bk + 18.0;
-    }
-L40:
+    AiryPowerSeries(zr, zi, az, fid, tol, &s1r, &s1i, &s2r, &s2i);
     if (id == 1) goto L50;
     *air = s1r * C1 - C2 * (zr * s2r - zi * s2i);
     *aii = s1i * C1 - C2 * (zr * s2i + zi * s2r);
-    if (kode == 1) return;
-    zsqrt(zr, zi, &str, &sti);
-    ztar = TTH * (zr * str - zi * sti);
-    ztai = TTH * (zr * sti + zi * str);
-    zexp(ztar, ztai, &str, &sti);
-    ptr = *air * str - *aii * sti;
-    *aii = *air * sti + *aii * str;
-    *air = ptr;
+    if (kode != 1) TimesExpZeta(zr, zi, TTH, air, aii);
     return;
 L50:
     *air = -s2r * C2;
@@ -598,56 +585,23 @@ L50:
         *air = *air + cc * (str * zr - sti * zi);
         *aii = *aii + cc * (str * zi + sti * zr);
     }
-    if (kode == 1) return;
-    zsqrt(zr, zi, &str, &sti);
-    ztar = TTH * (zr * str - zi * sti);
-    ztai = TTH * (zr * sti + zi * str);
-    zexp(ztar, ztai, &str, &sti);
-    ptr = str * *air - sti * *aii;
-    *aii = str * *aii + sti * *air;
-    *air = ptr;
+    if (kode != 1) TimesExpZeta(zr, zi, TTH, air, aii);
     return;
     // Case for |z| > 1.
 L70:
     fnu = (1.0 + fid) / 3.0;
-    // Set parameters related to machine constants.
-    k1 = kI1Mach15;
-    k2 = kI1Mach16;
-    r1m5 = kD1Mach5;
-    k = std::min(std::abs(k1), std::abs(k2));
-    elim = 2.303 * (static_cast<double>(k) * r1m5 - 3.0);
-    k1 = kI1Mach14 - 1;
-    aa = r1m5 * static_cast<double>(k1);
-    dig = std::min(aa, 18.0);
-    aa = aa * 2.303;
-    alim = elim + std::max(-aa, -41.45);
-    rl = 1.2 * dig + 3.0;
+    {
+        const Limits lim = MachineLimits();
+        elim = lim.elim;
+        alim = lim.alim;
+        rl = lim.rl;
+    }
     alaz = std::log(az);
-    // Test for proper range.
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    aa = std::pow(aa, TTH);
-    if (az > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    zsqrt(zr, zi, &csqr, &csqi);
-    ztar = TTH * (zr * csqr - zi * csqi);
-    ztai = TTH * (zr * csqi + zi * csqr);
-    // Re zta <= 0 when Re z < 0, especially when Im z is small.
+    if (!AiryInRange(az, tol, TTH, ierr)) goto L260;
+    AiryZeta(zr, zi, TTH, &csqr, &csqi, &ztar, &ztai);
     iflag = 0;
     sfac = 1.0;
-    ak = ztai;
-    if (zr < 0.0) {
-        bk = ztar;
-        ck = -std::fabs(bk);
-        ztar = ck;
-        ztai = ak;
-    }
-    if (zi == 0.0 && zr <= 0.0) {
-        ztar = 0.0;
-        ztai = ak;
-    }
+    AiryZetaLeft(zr, zi, &ztar, &ztai);
     aa = ztar;
     if (aa >= 0.0 && zr > 0.0) goto L110;
     if (kode == 2) goto L100;
@@ -751,11 +705,11 @@ L260:
 void zbiry(double zr, double zi, int id, int kode, double* bir, double* bii, int* ierr) {
     using namespace data::zbiry;
     double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
-    int k = 0, k1 = 0, k2 = 0, nz = 0;
-    double aa = 0, ad = 0, ak = 0, alim = 0, atrm = 0, az = 0, az3 = 0, bb = 0, bk = 0, cc = 0, ck = 0;
-    double csqi = 0, csqr = 0, dig = 0, dk = 0, d1 = 0, d2 = 0, eaa = 0, elim = 0, fid = 0, fmr = 0, fnu = 0;
-    double fnul = 0, rl = 0, r1m5 = 0, sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0;
-    double trm1i = 0, trm1r = 0, trm2i = 0, trm2r = 0, ztai = 0, ztar = 0, z3i = 0, z3r = 0;
+    int nz = 0;
+    double aa = 0, alim = 0, az = 0, bb = 0, cc = 0;
+    double csqi = 0, csqr = 0, elim = 0, fid = 0, fmr = 0, fnu = 0;
+    double fnul = 0, rl = 0, sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0;
+    double ztai = 0, ztar = 0, z3r = 0;
 
     *ierr = 0;
     nz = 0;
@@ -767,64 +721,12 @@ void zbiry(double zr, double zi, int id, int kode, double* bir, double* bii, int
     fid = static_cast<double>(id);
     if (az > 1.0) goto L70;
     // Power series for |z| <= 1.
-    s1r = CONER;
-    s1i = CONEI;
-    s2r = CONER;
-    s2i = CONEI;
     if (az < tol) goto L130;
-    aa = az * az;
-    if (aa < tol / az) goto L40;
-    trm1r = CONER;
-    trm1i = CONEI;
-    trm2r = CONER;
-    trm2i = CONEI;
-    atrm = 1.0;
-    str = zr * zr - zi * zi;
-    sti = zr * zi + zi * zr;
-    z3r = str * zr - sti * zi;
-    z3i = str * zi + sti * zr;
-    az3 = az * aa;
-    ak = 2.0 + fid;
-    bk = 3.0 - fid - fid;
-    ck = 4.0 - fid;
-    dk = 3.0 + fid + fid;
-    d1 = ak * dk;
-    d2 = bk * ck;
-    ad = std::min(d1, d2);
-    ak = 24.0 + 9.0 * fid;
-    bk = 30.0 - 9.0 * fid;
-    for (k = 1; k <= 25; ++k) {
-        str = (trm1r * z3r - trm1i * z3i) / d1;
-        trm1i = (trm1r * z3i + trm1i * z3r) / d1;
-        trm1r = str;
-        s1r = s1r + trm1r;
-        s1i = s1i + trm1i;
-        str = (trm2r * z3r - trm2i * z3i) / d2;
-        trm2i = (trm2r * z3i + trm2i * z3r) / d2;
-        trm2r = str;
-        s2r = s2r + trm2r;
-        s2i = s2i + trm2i;
-        atrm = atrm * az3 / ad;
-        d1 = d1 + ak;
-        d2 = d2 + bk;
-        ad = std::min(d1, d2);
-        if (atrm < tol * ad) break;
-        ak = ak + 18.0;
-        bk = bk + 18.0;
-    }
-L40:
+    AiryPowerSeries(zr, zi, az, fid, tol, &s1r, &s1i, &s2r, &s2i);
     if (id == 1) goto L50;
     *bir = C1 * s1r + C2 * (zr * s2r - zi * s2i);
     *bii = C1 * s1i + C2 * (zr * s2i + zi * s2r);
-    if (kode == 1) return;
-    zsqrt(zr, zi, &str, &sti);
-    ztar = TTH * (zr * str - zi * sti);
-    ztai = TTH * (zr * sti + zi * str);
-    aa = ztar;
-    aa = -std::fabs(aa);
-    eaa = std::exp(aa);
-    *bir = *bir * eaa;
-    *bii = *bii * eaa;
+    if (kode != 1) TimesExpMinusAbsReZeta(zr, zi, TTH, bir, bii);
     return;
 L50:
     *bir = s2r * C2;
@@ -836,56 +738,22 @@ L50:
         *bir = *bir + cc * (str * zr - sti * zi);
         *bii = *bii + cc * (str * zi + sti * zr);
     }
-    if (kode == 1) return;
-    zsqrt(zr, zi, &str, &sti);
-    ztar = TTH * (zr * str - zi * sti);
-    ztai = TTH * (zr * sti + zi * str);
-    aa = ztar;
-    aa = -std::fabs(aa);
-    eaa = std::exp(aa);
-    *bir = *bir * eaa;
-    *bii = *bii * eaa;
+    if (kode != 1) TimesExpMinusAbsReZeta(zr, zi, TTH, bir, bii);
     return;
     // Case for |z| > 1.
 L70:
     fnu = (1.0 + fid) / 3.0;
-    // Set parameters related to machine constants.
-    k1 = kI1Mach15;
-    k2 = kI1Mach16;
-    r1m5 = kD1Mach5;
-    k = std::min(std::abs(k1), std::abs(k2));
-    elim = 2.303 * (static_cast<double>(k) * r1m5 - 3.0);
-    k1 = kI1Mach14 - 1;
-    aa = r1m5 * static_cast<double>(k1);
-    dig = std::min(aa, 18.0);
-    aa = aa * 2.303;
-    alim = elim + std::max(-aa, -41.45);
-    rl = 1.2 * dig + 3.0;
-    fnul = 10.0 + 6.0 * (dig - 3.0);
-    // Test for range.
-    aa = 0.5 / tol;
-    bb = static_cast<double>(kI1Mach9) * 0.5;
-    aa = std::min(aa, bb);
-    aa = std::pow(aa, TTH);
-    if (az > aa) goto L260;
-    aa = std::sqrt(aa);
-    if (az > aa) *ierr = 3;
-    zsqrt(zr, zi, &csqr, &csqi);
-    ztar = TTH * (zr * csqr - zi * csqi);
-    ztai = TTH * (zr * csqi + zi * csqr);
-    // Re zta <= 0 when Re z < 0, especially when Im z is small.
+    {
+        const Limits lim = MachineLimits();
+        elim = lim.elim;
+        alim = lim.alim;
+        rl = lim.rl;
+        fnul = lim.fnul;
+    }
+    if (!AiryInRange(az, tol, TTH, ierr)) goto L260;
+    AiryZeta(zr, zi, TTH, &csqr, &csqi, &ztar, &ztai);
     sfac = 1.0;
-    ak = ztai;
-    if (zr < 0.0) {
-        bk = ztar;
-        ck = -std::fabs(bk);
-        ztar = ck;
-        ztai = ak;
-    }
-    if (!(zi != 0.0 || zr > 0.0)) {
-        ztar = 0.0;
-        ztai = ak;
-    }
+    AiryZetaLeft(zr, zi, &ztar, &ztai);
     aa = ztar;
     if (kode != 2) {
         // Overflow test.
