@@ -223,4 +223,21 @@ inline void RecurIBackwardAddToK(int il, const double* cyr, const double* cyi, i
     }
 }
 
+// c = s exp(-zd) / tol, taken through the logarithm so that neither factor over- or underflows on
+// its own; false when c is still below ascle (zuchk).
+inline bool ThroughLogOnScale(double sr, double si, double zdr, double zdi, double ascle, double tol, double* cr,
+                              double* ci) {
+    double lr = 0.0, li = 0.0;
+    int idum = 0;
+    zlog(sr, si, &lr, &li, &idum);
+    lr = lr - zdr;
+    li = li - zdi;
+    const double str = std::exp(lr) / tol;
+    *cr = str * std::cos(li);
+    *ci = str * std::sin(li);
+    int nw = 0;
+    zuchk(*cr, *ci, &nw, ascle, tol);
+    return nw == 0;
+}
+
 }  // namespace tw::amos

@@ -5,6 +5,7 @@
 #include <cmath>
 
 #include "special/amos/amos.hpp"
+#include "special/amos/common.hpp"
 
 namespace tw::amos {
 
@@ -285,6 +286,28 @@ void zrati(double zr, double zi, double fnu, int n, double* cyr, double* cyi, do
     }
 }
 
+namespace {
+
+// One step of zmlri's backward recurrence p2 = p1 + (fkk + fnf) rz p2 at k = fkk, the normalising
+// sum gathering the new p1 with the weights bk, which step down with k.
+void MillerStep(double rzr, double rzi, double fnf, double tfnf, double* p1r, double* p1i, double* p2r,
+                double* p2i, double* sumr, double* sumi, double* bk, double* fkk) {
+    const double ptr = *p2r;
+    const double pti = *p2i;
+    *p2r = *p1r + (*fkk + fnf) * (rzr * ptr - rzi * pti);
+    *p2i = *p1i + (*fkk + fnf) * (rzi * ptr + rzr * pti);
+    *p1r = ptr;
+    *p1i = pti;
+    const double ak = 1.0 - tfnf / (*fkk + tfnf);
+    const double ack = *bk * ak;
+    *sumr = *sumr + (ack + *bk) * *p1r;
+    *sumi = *sumi + (ack + *bk) * *p1i;
+    *bk = ack;
+    *fkk = *fkk - 1.0;
+}
+
+}  // namespace
+
 // I(fnu, z) for Re z >= 0 by Miller's backward recurrence, normalised by the Neumann series.
 void zmlri(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, double tol) {
     using namespace data::zmlri;
@@ -387,51 +410,18 @@ L40:
     sumi = ZEROI;
     km = kk - inu;
     for (i = 1; i <= km; ++i) {
-        ptr = p2r;
-        pti = p2i;
-        p2r = p1r + (fkk + fnf) * (rzr * ptr - rzi * pti);
-        p2i = p1i + (fkk + fnf) * (rzi * ptr + rzr * pti);
-        p1r = ptr;
-        p1i = pti;
-        ak = 1.0 - tfnf / (fkk + tfnf);
-        ack = bk * ak;
-        sumr = sumr + (ack + bk) * p1r;
-        sumi = sumi + (ack + bk) * p1i;
-        bk = ack;
-        fkk = fkk - 1.0;
+        MillerStep(rzr, rzi, fnf, tfnf, &p1r, &p1i, &p2r, &p2i, &sumr, &sumi, &bk, &fkk);
     }
     yr[n - 1] = p2r;
     yi[n - 1] = p2i;
     for (i = 2; i <= n; ++i) {
-        ptr = p2r;
-        pti = p2i;
-        p2r = p1r + (fkk + fnf) * (rzr * ptr - rzi * pti);
-        p2i = p1i + (fkk + fnf) * (rzi * ptr + rzr * pti);
-        p1r = ptr;
-        p1i = pti;
-        ak = 1.0 - tfnf / (fkk + tfnf);
-        ack = bk * ak;
-        sumr = sumr + (ack + bk) * p1r;
-        sumi = sumi + (ack + bk) * p1i;
-        bk = ack;
-        fkk = fkk - 1.0;
+        MillerStep(rzr, rzi, fnf, tfnf, &p1r, &p1i, &p2r, &p2i, &sumr, &sumi, &bk, &fkk);
         m = n - i + 1;
         yr[m - 1] = p2r;
         yi[m - 1] = p2i;
     }
     for (i = 1; i <= ifnu; ++i) {
-        ptr = p2r;
-        pti = p2i;
-        p2r = p1r + (fkk + fnf) * (rzr * ptr - rzi * pti);
-        p2i = p1i + (fkk + fnf) * (rzr * pti + rzi * ptr);
-        p1r = ptr;
-        p1i = pti;
-        ak = 1.0 - tfnf / (fkk + tfnf);
-        ack = bk * ak;
-        sumr = sumr + (ack + bk) * p1r;
-        sumi = sumi + (ack + bk) * p1i;
-        bk = ack;
-        fkk = fkk - 1.0;
+        MillerStep(rzr, rzi, fnf, tfnf, &p1r, &p1i, &p2r, &p2i, &sumr, &sumi, &bk, &fkk);
     }
     ptr = zr;
     pti = zi;
@@ -679,8 +669,8 @@ void zkscl(double zrr, double zri, double fnu, int n, double* yr, double* yi, in
            double ascle, double tol, double elim) {
     using namespace data::zkscl;
     double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
-    int i = 0, ic = 0, idum = 0, kk = 0, nn = 0, nw = 0;
-    double acs = 0, as = 0, cki = 0, ckr = 0, csi = 0, csr = 0, fn = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0;
+    int i = 0, ic = 0, kk = 0, nn = 0;
+    double acs = 0, as = 0, cki = 0, ckr = 0, csi = 0, csr = 0, fn = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0;
     double zdr = 0, zdi = 0, celmr = 0, elm = 0, helim = 0, alas = 0;
 
     *nz = 0;
@@ -697,14 +687,7 @@ void zkscl(double zrr, double zri, double fnu, int n, double* yr, double* yi, in
         yr[i - 1] = ZEROR;
         yi[i - 1] = ZEROI;
         if (acs < (-elim)) continue;
-        zlog(s1r, s1i, &csr, &csi, &idum);
-        csr = csr - zrr;
-        csi = csi - zri;
-        str = std::exp(csr) / tol;
-        csr = str * std::cos(csi);
-        csi = str * std::sin(csi);
-        zuchk(csr, csi, &nw, ascle, tol);
-        if (nw != 0) continue;
+        if (!ThroughLogOnScale(s1r, s1i, zrr, zri, ascle, tol, &csr, &csi)) continue;
         yr[i - 1] = csr;
         yi[i - 1] = csi;
         ic = i;
@@ -748,14 +731,7 @@ void zkscl(double zrr, double zri, double fnu, int n, double* yr, double* yi, in
         yr[i - 1] = ZEROR;
         yi[i - 1] = ZEROI;
         if (acs < (-elim)) goto L25;
-        zlog(s2r, s2i, &csr, &csi, &idum);
-        csr = csr - zdr;
-        csi = csi - zdi;
-        str = std::exp(csr) / tol;
-        csr = str * std::cos(csi);
-        csi = str * std::sin(csi);
-        zuchk(csr, csi, &nw, ascle, tol);
-        if (nw != 0) goto L25;
+        if (!ThroughLogOnScale(s2r, s2i, zdr, zdi, ascle, tol, &csr, &csi)) goto L25;
         yr[i - 1] = csr;
         yi[i - 1] = csi;
         *nz = *nz - 1;

@@ -5,8 +5,52 @@
 #include <cmath>
 
 #include "special/amos/amos.hpp"
+#include "special/amos/common.hpp"
 
 namespace tw::amos {
+
+namespace {
+
+// Temme's series for |z| <= r1 from the coefficients' starting values f, p, q: s1 += ck f until the
+// terms fall below tol (K(dnu, z)) and, with both, s2 += ck (p - k f) (K(dnu + 1, z)), where
+// ck = (z^2/4)^k / k!.
+void TemmeSums(double zr, double zi, double caz, double dnu, double dnu2, double tol, bool both, double fr,
+               double fi, double pr, double pi_, double qr, double qi, double* s1r, double* s1i, double* s2r,
+               double* s2i) {
+    if (!(caz >= tol)) return;
+    double ak = 1.0, a1 = 1.0, ckr = 1.0, cki = 0.0, bk = 1.0 - dnu2, czr = 0.0, czi = 0.0;
+    zmlt(zr, zi, zr, zi, &czr, &czi);
+    czr = 0.25 * czr;
+    czi = 0.25 * czi;
+    const double t1 = 0.25 * caz * caz;
+    do {
+        fr = (fr * ak + pr + qr) / bk;
+        fi = (fi * ak + pi_ + qi) / bk;
+        double str = 1.0 / (ak - dnu);
+        pr = pr * str;
+        pi_ = pi_ * str;
+        str = 1.0 / (ak + dnu);
+        qr = qr * str;
+        qi = qi * str;
+        str = ckr * czr - cki * czi;
+        const double rak = 1.0 / ak;
+        cki = (ckr * czi + cki * czr) * rak;
+        ckr = str * rak;
+        *s1r = ckr * fr - cki * fi + *s1r;
+        *s1i = ckr * fi + cki * fr + *s1i;
+        if (both) {
+            str = pr - fr * ak;
+            const double sti = pi_ - fi * ak;
+            *s2r = ckr * str - cki * sti + *s2r;
+            *s2i = ckr * sti + cki * str + *s2i;
+        }
+        a1 = a1 * t1 * rak;
+        bk = bk + ak + ak + 1.0;
+        ak = ak + 1.0;
+    } while (a1 > tol);
+}
+
+}  // namespace
 
 void zbknu(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, double tol,
            double elim, double alim) {
@@ -14,35 +58,21 @@ void zbknu(double zr, double zi, double fnu, int kode, int n, double* yr, double
     constexpr int kmax = static_cast<int>(KMAX);
     double cssr[3], csrr[3], bry[3];
     double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
-    int i = 0, iflag = 0, inu = 0, k = 0, kflag = 0, kk = 0, koded = 0, idum = 0, j = 0, ic = 0, inub = 0, nw = 0;
-    double aa = 0, ak = 0, ascle = 0, a1 = 0, a2 = 0, bb = 0, bk = 0, caz = 0, cbi = 0, cbr = 0, cchi = 0;
-    double cchr = 0, cki = 0, ckr = 0, coefi = 0, coefr = 0, crscr = 0, csclr = 0, cshi = 0, cshr = 0, csi = 0;
-    double csr = 0, czi = 0, czr = 0, dnu = 0, dnu2 = 0, etest = 0, fc = 0, fhs = 0, fi = 0, fk = 0, fks = 0;
+    int i = 0, iflag = 0, inu = 0, k = 0, kflag = 0, kk = 0, koded = 0, idum = 0, j = 0, ic = 0, inub = 0;
+    double aa = 0, ak = 0, ascle = 0, a1 = 0, a2 = 0, bb = 0, caz = 0, cbi = 0, cbr = 0, cchi = 0;
+    double cchr = 0, cki = 0, ckr = 0, coefi = 0, coefr = 0, cshi = 0, cshr = 0, csi = 0;
+    double csr = 0, dnu = 0, dnu2 = 0, etest = 0, fc = 0, fhs = 0, fi = 0, fk = 0, fks = 0;
     double fmui = 0, fmur = 0, fr = 0, g1 = 0, g2 = 0, pi_ = 0, pr = 0, pti = 0, ptr = 0, p1i = 0, p1r = 0;
-    double p2i = 0, p2m = 0, p2r = 0, qi = 0, qr = 0, rak = 0, rcaz = 0, rzi = 0, rzr = 0, s = 0, smui = 0;
+    double p2i = 0, p2r = 0, qi = 0, qr = 0, rak = 0, rzi = 0, rzr = 0, s = 0, smui = 0;
     double smur = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tm = 0, t1 = 0, t2 = 0, elm = 0;
     double celmr = 0, zdr = 0, zdi = 0, as = 0, alas = 0, helim = 0;
 
     caz = zabs(zr, zi);
-    csclr = 1.0 / tol;
-    crscr = tol;
-    cssr[0] = csclr;
-    cssr[1] = 1.0;
-    cssr[2] = crscr;
-    csrr[0] = crscr;
-    csrr[1] = 1.0;
-    csrr[2] = csclr;
-    bry[0] = 1.0e+3 * kD1Mach1 / tol;
-    bry[1] = 1.0 / bry[0];
-    bry[2] = kD1Mach2;
+    ScaleTriplets(tol, cssr, csrr, bry);
     *nz = 0;
     iflag = 0;
     koded = kode;
-    rcaz = 1.0 / caz;
-    str = zr * rcaz;
-    sti = -zi * rcaz;
-    rzr = (str + str) * rcaz;
-    rzi = (sti + sti) * rcaz;
+    TwoOverZ(zr, zi, &rzr, &rzi);
     inu = static_cast<int>(fnu + 0.5);
     dnu = fnu - static_cast<double>(inu);
     if (std::fabs(dnu) == 0.5) goto L110;
@@ -92,38 +122,9 @@ void zbknu(double zr, double zi, double fnu, int kode, int n, double* yr, double
     s1i = fi;
     s2r = pr;
     s2i = pi_;
-    ak = 1.0;
-    a1 = 1.0;
-    ckr = CONER;
-    cki = CONEI;
-    bk = 1.0 - dnu2;
     if (inu > 0 || n > 1) goto L80;
     // Generate K(fnu, z), 0 <= fnu < 0.5 and n = 1.
-    if (caz >= tol) {
-        zmlt(zr, zi, zr, zi, &czr, &czi);
-        czr = 0.25 * czr;
-        czi = 0.25 * czi;
-        t1 = 0.25 * caz * caz;
-        do {
-            fr = (fr * ak + pr + qr) / bk;
-            fi = (fi * ak + pi_ + qi) / bk;
-            str = 1.0 / (ak - dnu);
-            pr = pr * str;
-            pi_ = pi_ * str;
-            str = 1.0 / (ak + dnu);
-            qr = qr * str;
-            qi = qi * str;
-            str = ckr * czr - cki * czi;
-            rak = 1.0 / ak;
-            cki = (ckr * czi + cki * czr) * rak;
-            ckr = str * rak;
-            s1r = ckr * fr - cki * fi + s1r;
-            s1i = ckr * fi + cki * fr + s1i;
-            a1 = a1 * t1 * rak;
-            bk = bk + ak + ak + 1.0;
-            ak = ak + 1.0;
-        } while (a1 > tol);
-    }
+    TemmeSums(zr, zi, caz, dnu, dnu2, tol, false, fr, fi, pr, pi_, qr, qi, &s1r, &s1i, &s2r, &s2i);
     yr[0] = s1r;
     yi[0] = s1i;
     if (koded == 1) return;
@@ -132,35 +133,7 @@ void zbknu(double zr, double zi, double fnu, int kode, int n, double* yr, double
     return;
     // Generate K(dnu, z) and K(dnu + 1, z) for forward recurrence.
 L80:
-    if (caz >= tol) {
-        zmlt(zr, zi, zr, zi, &czr, &czi);
-        czr = 0.25 * czr;
-        czi = 0.25 * czi;
-        t1 = 0.25 * caz * caz;
-        do {
-            fr = (fr * ak + pr + qr) / bk;
-            fi = (fi * ak + pi_ + qi) / bk;
-            str = 1.0 / (ak - dnu);
-            pr = pr * str;
-            pi_ = pi_ * str;
-            str = 1.0 / (ak + dnu);
-            qr = qr * str;
-            qi = qi * str;
-            str = ckr * czr - cki * czi;
-            rak = 1.0 / ak;
-            cki = (ckr * czi + cki * czr) * rak;
-            ckr = str * rak;
-            s1r = ckr * fr - cki * fi + s1r;
-            s1i = ckr * fi + cki * fr + s1i;
-            str = pr - fr * ak;
-            sti = pi_ - fi * ak;
-            s2r = ckr * str - cki * sti + s2r;
-            s2i = ckr * sti + cki * str + s2i;
-            a1 = a1 * t1 * rak;
-            bk = bk + ak + ak + 1.0;
-            ak = ak + 1.0;
-        } while (a1 > tol);
-    }
+    TemmeSums(zr, zi, caz, dnu, dnu2, tol, true, fr, fi, pr, pi_, qr, qi, &s1r, &s1i, &s2r, &s2i);
     kflag = 2;
     a1 = fnu + 1.0;
     ak = a1 * std::fabs(smur);
@@ -331,25 +304,7 @@ L225:
         s1i = sti;
         ckr = ckr + rzr;
         cki = cki + rzi;
-        if (kflag >= 3) continue;
-        p2r = s2r * p1r;
-        p2i = s2i * p1r;
-        str = std::fabs(p2r);
-        sti = std::fabs(p2i);
-        p2m = std::max(str, sti);
-        if (p2m <= ascle) continue;
-        kflag = kflag + 1;
-        ascle = bry[kflag - 1];
-        s1r = s1r * p1r;
-        s1i = s1i * p1r;
-        s2r = p2r;
-        s2i = p2i;
-        str = cssr[kflag - 1];
-        s1r = s1r * str;
-        s1i = s1i * str;
-        s2r = s2r * str;
-        s2i = s2i * str;
-        p1r = csrr[kflag - 1];
+        Rescale<Larger>(s2r * p1r, s2i * p1r, bry, cssr, csrr, &kflag, &ascle, &p1r, &s1r, &s1i, &s2r, &s2i);
     }
     if (n == 1) {
         s1r = s2r;
@@ -367,39 +322,7 @@ L240:
 L250:
     kk = kk + 1;
     if (kk > n) return;
-    p1r = csrr[kflag - 1];
-    ascle = bry[kflag - 1];
-    for (i = kk; i <= n; ++i) {
-        p2r = s2r;
-        p2i = s2i;
-        s2r = ckr * p2r - cki * p2i + s1r;
-        s2i = cki * p2r + ckr * p2i + s1i;
-        s1r = p2r;
-        s1i = p2i;
-        ckr = ckr + rzr;
-        cki = cki + rzi;
-        p2r = s2r * p1r;
-        p2i = s2i * p1r;
-        yr[i - 1] = p2r;
-        yi[i - 1] = p2i;
-        if (kflag >= 3) continue;
-        str = std::fabs(p2r);
-        sti = std::fabs(p2i);
-        p2m = std::max(str, sti);
-        if (p2m <= ascle) continue;
-        kflag = kflag + 1;
-        ascle = bry[kflag - 1];
-        s1r = s1r * p1r;
-        s1i = s1i * p1r;
-        s2r = p2r;
-        s2i = p2i;
-        str = cssr[kflag - 1];
-        s1r = s1r * str;
-        s1i = s1i * str;
-        s2r = s2r * str;
-        s2i = s2i * str;
-        p1r = csrr[kflag - 1];
-    }
+    RecurKForward<Larger>(kk, n, s1r, s1i, s2r, s2i, ckr, cki, rzr, rzi, kflag, bry, cssr, csrr, yr, yi);
     return;
     // iflag = 1 cases, forward recurrence on the scaled values on underflow.
 L261:
@@ -424,14 +347,7 @@ L261:
         alas = std::log(as);
         p2r = alas - zdr;
         if (p2r < (-elim)) goto L263;
-        zlog(s2r, s2i, &str, &sti, &idum);
-        p2r = str - zdr;
-        p2i = sti - zdi;
-        p2m = std::exp(p2r) / tol;
-        p1r = p2m * std::cos(p2i);
-        p1i = p2m * std::sin(p2i);
-        zuchk(p1r, p1i, &nw, ascle, tol);
-        if (nw != 0) goto L263;
+        if (!ThroughLogOnScale(s2r, s2i, zdr, zdi, ascle, tol, &p1r, &p1i)) goto L263;
         j = 3 - j;
         cyr[j - 1] = p1r;
         cyi[j - 1] = p1i;
