@@ -240,4 +240,16 @@ inline bool ThroughLogOnScale(double sr, double si, double zdr, double zdi, doub
     return nw == 0;
 }
 
+// I backward recurrence in place, y(k) from y(k + 1) and y(k + 2) (1-based), for count members
+// from member k down; ak is the order offset of member k.
+inline void RecurIDownInPlace(double fnu, double rzr, double rzi, int count, int k, double ak, double* yr,
+                              double* yi) {
+    for (int i = 1; i <= count; ++i) {
+        yr[k - 1] = (ak + fnu) * (rzr * yr[k] - rzi * yi[k]) + yr[k + 1];
+        yi[k - 1] = (ak + fnu) * (rzr * yi[k] + rzi * yr[k]) + yi[k + 1];
+        ak = ak - 1.0;
+        k = k - 1;
+    }
+}
+
 }  // namespace tw::amos

@@ -5,8 +5,34 @@
 #include <cstdlib>
 
 #include "special/amos/amos.hpp"
+#include "special/amos/common.hpp"
 
 namespace tw::amos {
+
+namespace {
+
+// One of zacon's first two members: y = cspn K + csgn I with K given and I in y, the pair first
+// through kode 2's underflow check, which also leaves K as checked in sc (the scaled restart of
+// the recurrence).
+void FirstMember(double znr, double zni, int kode, double ascle, double alim, int* iuf, int* nz, double kr, double ki,
+                 double cspnr, double cspni, double csgnr, double csgni, double* yr, double* yi, double* scr,
+                 double* sci) {
+    double c1r = kr, c1i = ki, c2r = *yr, c2i = *yi;
+    if (kode != 1) {
+        int nw = 0;
+        zs1s2(znr, zni, &c1r, &c1i, &c2r, &c2i, &nw, ascle, alim, iuf);
+        *nz = *nz + nw;
+        *scr = c1r;
+        *sci = c1i;
+    }
+    double str = 0.0, sti = 0.0, ptr = 0.0, pti = 0.0;
+    zmlt(cspnr, cspni, c1r, c1i, &str, &sti);
+    zmlt(csgnr, csgni, c2r, c2i, &ptr, &pti);
+    *yr = str + ptr;
+    *yi = sti + pti;
+}
+
+}  // namespace
 
 // K(fnu, zn * exp(mp)) = K(fnu, zn) * exp(-mp*fnu) - mp*I(fnu, zn), mp = pi*mr*i, mr = +1 or -1,
 // Re zn < 0; the result is returned through the continuation of z = -zn.
@@ -16,9 +42,9 @@ void zacon(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
     double cssr[3], csrr[3], bry[3];
     int i = 0, inu = 0, iuf = 0, kflag = 0, nn = 0, nw = 0;
-    double arg = 0, ascle = 0, as2 = 0, azn = 0, bscle = 0, cki = 0, ckr = 0, cpn = 0, cscl = 0, cscr = 0;
+    double ascle = 0, as2 = 0, bscle = 0, cki = 0, ckr = 0, cpn = 0;
     double csgni = 0, csgnr = 0, cspni = 0, cspnr = 0, csr = 0, c1i = 0, c1m = 0, c1r = 0, c2i = 0, c2r = 0;
-    double fmr = 0, fn = 0, pti = 0, ptr = 0, razn = 0, rzi = 0, rzr = 0, sc1i = 0, sc1r = 0, sc2i = 0, sc2r = 0;
+    double fmr = 0, fn = 0, pti = 0, ptr = 0, rzi = 0, rzr = 0, sc1i = 0, sc1r = 0, sc2i = 0, sc2r = 0;
     double sgn = 0, spn = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, yy = 0, zni = 0, znr = 0;
 
     *nz = 0;
@@ -45,74 +71,27 @@ void zacon(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     }
     // Calculate cspn = exp(fnu*pi*i) to minimise losses of significance when fnu is large.
     inu = static_cast<int>(fnu);
-    arg = (fnu - static_cast<double>(inu)) * sgn;
-    cpn = std::cos(arg);
-    spn = std::sin(arg);
-    cspnr = cpn;
-    cspni = spn;
-    if (inu % 2 != 0) {
-        cspnr = -cspnr;
-        cspni = -cspni;
-    }
+    ContinuationPhase(sgn, fnu - static_cast<double>(inu), inu, &cspnr, &cspni);
     iuf = 0;
-    c1r = s1r;
-    c1i = s1i;
-    c2r = yr[0];
-    c2i = yi[0];
     ascle = 1.0e+3 * kD1Mach1 / tol;
-    if (kode != 1) {
-        zs1s2(znr, zni, &c1r, &c1i, &c2r, &c2i, &nw, ascle, alim, &iuf);
-        *nz = *nz + nw;
-        sc1r = c1r;
-        sc1i = c1i;
-    }
-    zmlt(cspnr, cspni, c1r, c1i, &str, &sti);
-    zmlt(csgnr, csgni, c2r, c2i, &ptr, &pti);
-    yr[0] = str + ptr;
-    yi[0] = sti + pti;
+    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s1r, s1i, cspnr, cspni, csgnr, csgni, &yr[0], &yi[0], &sc1r,
+                &sc1i);
     if (n == 1) return;
     cspnr = -cspnr;
     cspni = -cspni;
     s2r = cyr[1];
     s2i = cyi[1];
-    c1r = s2r;
-    c1i = s2i;
-    c2r = yr[1];
-    c2i = yi[1];
-    if (kode != 1) {
-        zs1s2(znr, zni, &c1r, &c1i, &c2r, &c2i, &nw, ascle, alim, &iuf);
-        *nz = *nz + nw;
-        sc2r = c1r;
-        sc2i = c1i;
-    }
-    zmlt(cspnr, cspni, c1r, c1i, &str, &sti);
-    zmlt(csgnr, csgni, c2r, c2i, &ptr, &pti);
-    yr[1] = str + ptr;
-    yi[1] = sti + pti;
+    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s2r, s2i, cspnr, cspni, csgnr, csgni, &yr[1], &yi[1], &sc2r,
+                &sc2i);
     if (n == 2) return;
     cspnr = -cspnr;
     cspni = -cspni;
-    azn = zabs(znr, zni);
-    razn = 1.0 / azn;
-    str = znr * razn;
-    sti = -zni * razn;
-    rzr = (str + str) * razn;
-    rzi = (sti + sti) * razn;
+    TwoOverZ(znr, zni, &rzr, &rzi);
     fn = fnu + 1.0;
     ckr = fn * rzr;
     cki = fn * rzi;
     // Scale near exponent extremes during the recurrence on K functions.
-    cscl = 1.0 / tol;
-    cscr = tol;
-    cssr[0] = cscl;
-    cssr[1] = CONER;
-    cssr[2] = cscr;
-    csrr[0] = cscr;
-    csrr[1] = CONER;
-    csrr[2] = cscl;
-    bry[0] = ascle;
-    bry[1] = 1.0 / ascle;
-    bry[2] = kD1Mach2;
+    ScaleTriplets(tol, cssr, csrr, bry);
     as2 = zabs(s2r, s2i);
     kflag = 2;
     if (as2 > bry[0]) {
@@ -194,7 +173,7 @@ void zacai(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     using namespace data::zacai;
     double cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0};
     int inu = 0, iuf = 0, nn = 0, nw = 0;
-    double arg = 0, ascle = 0, az = 0, csgnr = 0, csgni = 0, cspnr = 0, cspni = 0, c1r = 0, c1i = 0, c2r = 0;
+    double ascle = 0, az = 0, csgnr = 0, csgni = 0, cspnr = 0, cspni = 0, c1r = 0, c1i = 0, c2r = 0;
     double c2i = 0, dfnu = 0, fmr = 0, sgn = 0, yy = 0, znr = 0, zni = 0;
 
     *nz = 0;
@@ -229,13 +208,7 @@ void zacai(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     }
     // Calculate cspn = exp(fnu*pi*i) to minimise losses of significance when fnu is large.
     inu = static_cast<int>(fnu);
-    arg = (fnu - static_cast<double>(inu)) * sgn;
-    cspnr = std::cos(arg);
-    cspni = std::sin(arg);
-    if (inu % 2 != 0) {
-        cspnr = -cspnr;
-        cspni = -cspni;
-    }
+    ContinuationPhase(sgn, fnu - static_cast<double>(inu), inu, &cspnr, &cspni);
     c1r = cyr[0];
     c1i = cyi[0];
     c2r = yr[0];

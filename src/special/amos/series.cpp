@@ -17,7 +17,7 @@ void zseri(double zr, double zi, double fnu, int kode, int n, double* yr, double
     double wr[2] = {0.0, 0.0}, wi[2] = {0.0, 0.0};
     int i = 0, ib = 0, idum = 0, iflag = 0, il = 0, k = 0, l = 0, m = 0, nn = 0, nw = 0;
     double aa = 0, acz = 0, ak = 0, ak1i = 0, ak1r = 0, arm = 0, ascle = 0, atol = 0, az = 0, cki = 0, ckr = 0;
-    double coefi = 0, coefr = 0, crscr = 0, czi = 0, czr = 0, dfnu = 0, fnup = 0, hzi = 0, hzr = 0, raz = 0;
+    double coefi = 0, coefr = 0, crscr = 0, czi = 0, czr = 0, dfnu = 0, fnup = 0, hzi = 0, hzr = 0;
     double rs = 0, rtr1 = 0, rzi = 0, rzr = 0, s = 0, ss = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0;
 
     *nz = 0;
@@ -112,20 +112,11 @@ L50:
     if (nn <= 2) return;
     k = nn - 2;
     ak = static_cast<double>(k);
-    raz = 1.0 / az;
-    str = zr * raz;
-    sti = -zi * raz;
-    rzr = (str + str) * raz;
-    rzi = (sti + sti) * raz;
+    TwoOverZ(zr, zi, &rzr, &rzi);
     if (iflag == 1) goto L120;
     ib = 3;
 L100:
-    for (i = ib; i <= nn; ++i) {
-        yr[k - 1] = (ak + fnu) * (rzr * yr[k] - rzi * yi[k]) + yr[k + 1];
-        yi[k - 1] = (ak + fnu) * (rzr * yi[k] + rzi * yr[k]) + yi[k + 1];
-        ak = ak - 1.0;
-        k = k - 1;
-    }
+    RecurIDownInPlace(fnu, rzr, rzi, nn - ib + 1, k, ak, yr, yi);
     return;
     // Recurrence on scaled values while they stay near the underflow limit.
 L120:
@@ -524,7 +515,7 @@ void zwrsk(double zrr, double zri, double fnu, int kode, int n, double* yr, doub
 void zasyi(double zr, double zi, double fnu, int kode, int n, double* yr, double* yi, int* nz, double rl,
            double tol, double elim, double alim) {
     using namespace data::zasyi;
-    int i = 0, ib = 0, il = 0, inu = 0, j = 0, jl = 0, k = 0, koded = 0, m = 0, nn = 0;
+    int i = 0, il = 0, inu = 0, j = 0, jl = 0, k = 0, koded = 0, m = 0, nn = 0;
     double aa = 0, aez = 0, ak = 0, ak1i = 0, ak1r = 0, arg = 0, arm = 0, atol = 0, az = 0, bb = 0, bk = 0;
     double cki = 0, ckr = 0, cs1i = 0, cs1r = 0, cs2i = 0, cs2r = 0, czi = 0, czr = 0, dfnu = 0, dki = 0, dkr = 0;
     double dnu2 = 0, ezi = 0, ezr = 0, fdn = 0, p1i = 0, p1r = 0, raz = 0, rtr1 = 0, rzi = 0, rzr = 0, s = 0;
@@ -643,17 +634,8 @@ void zasyi(double zr, double zi, double fnu, int kode, int n, double* yr, double
     nn = n;
     k = nn - 2;
     ak = static_cast<double>(k);
-    str = zr * raz;
-    sti = -zi * raz;
-    rzr = (str + str) * raz;
-    rzi = (sti + sti) * raz;
-    ib = 3;
-    for (i = ib; i <= nn; ++i) {
-        yr[k - 1] = (ak + fnu) * (rzr * yr[k] - rzi * yi[k]) + yr[k + 1];
-        yi[k - 1] = (ak + fnu) * (rzr * yi[k] + rzi * yr[k]) + yi[k + 1];
-        ak = ak - 1.0;
-        k = k - 1;
-    }
+    TwoOverZ(zr, zi, &rzr, &rzi);
+    RecurIDownInPlace(fnu, rzr, rzi, nn - 2, k, ak, yr, yi);
     if (koded == 0) return;
     zexp(czr, czi, &ckr, &cki);
     for (i = 1; i <= nn; ++i) {
