@@ -2,8 +2,9 @@
 //
 // The exports ask the drivers for one value; the recurrences over sequences of orders behind them
 // (forward and backward recurrences, their rescaling, the continuation's remaining terms) only run
-// for n > 1. This calls the drivers directly with n = 2..8 at the same kind of points and writes
-// nz, ierr and every member's bits.
+// for n > 1. This calls the drivers directly with n = 2..8 at the same kind of points (and at
+// larger orders) and writes nz, ierr and every member's bits.
+#include <cmath>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
@@ -23,8 +24,10 @@ int main(int argc, char** argv) {
     if (f == nullptr) return 2;
     const long count = argc > 2 ? std::atol(argv[2]) : 20000;
     constexpr int kMax = 8;
-    for (long p = 0; p < count; ++p) {
-        const double v = points::Order();
+    // The first points as for the exports; a further tenth at orders 100..5000, where members of the
+    // uniform expansions' sequences under- and overflow one by one.
+    for (long p = 0; p < count + count / 10; ++p) {
+        const double v = p < count ? points::Order() : 100.0 * std::pow(50.0, points::Uniform());
         const points::Cx z = points::Point();
         const int n = 2 + static_cast<int>(points::Next() % (kMax - 1));
         for (int kode = 1; kode <= 2; ++kode) {

@@ -252,4 +252,41 @@ inline void RecurIDownInPlace(double fnu, double rzr, double rzi, int count, int
     }
 }
 
+// The first member's exponent passes elim: overflow (nz = -1), or the whole sequence underflows
+// (nz = n, all zero). true when the routine is done.
+inline bool FirstMemberOutOfRange(double rs1, double elim, int n, double* yr, double* yi, int* nz) {
+    if (!(std::fabs(rs1) > elim)) return false;
+    if (rs1 > 0.0) {
+        *nz = -1;
+        return true;
+    }
+    *nz = n;
+    for (int i = 1; i <= n; ++i) {
+        yr[i - 1] = 0.0;
+        yi[i - 1] = 0.0;
+    }
+    return true;
+}
+
+// Member nd underflowed: it becomes zero, and zuoik zeroes those below it that underflow too.
+// false when the routine is done (nothing left, or nz = -1 on overflow); otherwise nd members are
+// left to compute.
+inline bool DropUnderflowed(double zr, double zi, double fnu, int kode, double tol, double elim, double alim,
+                            double* yr, double* yi, int* nd, int* nz) {
+    yr[*nd - 1] = 0.0;
+    yi[*nd - 1] = 0.0;
+    *nz = *nz + 1;
+    *nd = *nd - 1;
+    if (*nd == 0) return false;
+    int nuf = 0;
+    zuoik(zr, zi, fnu, kode, 1, *nd, yr, yi, &nuf, tol, elim, alim);
+    if (nuf < 0) {
+        *nz = -1;
+        return false;
+    }
+    *nd = *nd - nuf;
+    *nz = *nz + nuf;
+    return *nd != 0;
+}
+
 }  // namespace tw::amos

@@ -98,6 +98,14 @@ Route LastMemberRoute(double az, double fnu, double fn, double fnul, double tol,
     return Route::kDirect;
 }
 
+// ierr = 1 for a selector or scaling out of its set.
+bool AiryRefused(int id, int kode, int* ierr) {
+    *ierr = 0;
+    if (id < 0 || id > 1) *ierr = 1;
+    if (kode < 1 || kode > 2) *ierr = 1;
+    return *ierr != 0;
+}
+
 // zeta = (2/3) z^(3/2) of the Airy functions, with csq = z^(1/2).
 void AiryZeta(double zr, double zi, double tth, double* csqr, double* csqi, double* ztar, double* ztai) {
     zsqrt(zr, zi, csqr, csqi);
@@ -558,11 +566,8 @@ void zairy(double zr, double zi, int id, int kode, double* air, double* aii, int
     double sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0;
     double ztai = 0, ztar = 0, alaz = 0;
 
-    *ierr = 0;
     *nz = 0;
-    if (id < 0 || id > 1) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (*ierr != 0) return;
+    if (AiryRefused(id, kode, ierr)) return;
     az = zabs(zr, zi);
     tol = std::max(kD1Mach4, 1.0e-18);
     fid = static_cast<double>(id);
@@ -711,11 +716,7 @@ void zbiry(double zr, double zi, int id, int kode, double* bir, double* bii, int
     double fnul = 0, rl = 0, sfac = 0, sti = 0, str = 0, s1i = 0, s1r = 0, s2i = 0, s2r = 0, tol = 0;
     double ztai = 0, ztar = 0, z3r = 0;
 
-    *ierr = 0;
-    nz = 0;
-    if (id < 0 || id > 1) *ierr = 1;
-    if (kode < 1 || kode > 2) *ierr = 1;
-    if (*ierr != 0) return;
+    if (AiryRefused(id, kode, ierr)) return;
     az = zabs(zr, zi);
     tol = std::max(kD1Mach4, 1.0e-18);
     fid = static_cast<double>(id);

@@ -170,7 +170,7 @@ void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double
     double phir = 0.0, phii = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0, zeta2i = 0.0, sumr = 0.0,
            sumi = 0.0;
     double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0;
-    int iflag = 0, init = 0, nn = 0, nuf = 0, nw = 0;
+    int iflag = 0, init = 0, nn = 0, nw = 0;
     *nz = 0;
     int nd = n;
     *nlast = 0;
@@ -185,19 +185,7 @@ void zuni1(double zr, double zi, double fnu, int kode, int n, double* yr, double
     ExponentZeta2(kode, zr, zi, zeta2r, zeta2i, fn, &str, &sti);
     s1r = str - zeta1r;
     s1i = sti - zeta1i;
-    rs1 = s1r;
-    if (std::fabs(rs1) > elim) {
-        if (rs1 > 0.0) {
-            *nz = -1;
-            return;
-        }
-        *nz = n;
-        for (int i = 1; i <= n; ++i) {
-            yr[i - 1] = d::ZEROR;
-            yi[i - 1] = d::ZEROI;
-        }
-        return;
-    }
+    if (FirstMemberOutOfRange(s1r, elim, n, yr, yi, nz)) return;
 L30:
     nn = std::min(2, nd);
     for (int i = 1; i <= nn; ++i) {
@@ -236,19 +224,7 @@ L110:
         *nz = -1;
         return;
     }
-    yr[nd - 1] = d::ZEROR;
-    yi[nd - 1] = d::ZEROI;
-    *nz = *nz + 1;
-    nd = nd - 1;
-    if (nd == 0) return;
-    zuoik(zr, zi, fnu, kode, 1, nd, yr, yi, &nuf, tol, elim, alim);
-    if (nuf < 0) {
-        *nz = -1;
-        return;
-    }
-    nd = nd - nuf;
-    *nz = *nz + nuf;
-    if (nd == 0) return;
+    if (!DropUnderflowed(zr, zi, fnu, kode, tol, elim, alim, yr, yi, &nd, nz)) return;
     fn = fnu + static_cast<double>(nd - 1);
     if (fn >= fnul) goto L30;
     *nlast = nd;
@@ -262,7 +238,7 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
            zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0;
     double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0;
     double air = 0.0, aii = 0.0, dair = 0.0, daii = 0.0;
-    int iflag = 0, nn = 0, nuf = 0, nw = 0, nai = 0, ndai = 0, idum = 0;
+    int iflag = 0, nn = 0, nw = 0, nai = 0, ndai = 0, idum = 0;
     *nz = 0;
     int nd = n;
     *nlast = 0;
@@ -299,19 +275,7 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
     ExponentZeta2(kode, zbr, zbi, zeta2r, zeta2i, fn, &str, &sti);
     s1r = str - zeta1r;
     s1i = sti - zeta1i;
-    rs1 = s1r;
-    if (std::fabs(rs1) > elim) {
-        if (rs1 > 0.0) {
-            *nz = -1;
-            return;
-        }
-        *nz = n;
-        for (int i = 1; i <= n; ++i) {
-            yr[i - 1] = d::ZEROR;
-            yi[i - 1] = d::ZEROI;
-        }
-        return;
-    }
+    if (FirstMemberOutOfRange(s1r, elim, n, yr, yi, nz)) return;
 L40:
     nn = std::min(2, nd);
     for (int i = 1; i <= nn; ++i) {
@@ -363,19 +327,7 @@ L120:
         return;
     }
     // Set underflow and update parameters.
-    yr[nd - 1] = d::ZEROR;
-    yi[nd - 1] = d::ZEROI;
-    *nz = *nz + 1;
-    nd = nd - 1;
-    if (nd == 0) return;
-    zuoik(zr, zi, fnu, kode, 1, nd, yr, yi, &nuf, tol, elim, alim);
-    if (nuf < 0) {
-        *nz = -1;
-        return;
-    }
-    nd = nd - nuf;
-    *nz = *nz + nuf;
-    if (nd == 0) return;
+    if (!DropUnderflowed(zr, zi, fnu, kode, tol, elim, alim, yr, yi, &nd, nz)) return;
     fn = fnu + static_cast<double>(nd - 1);
     if (fn < fnul) {
         *nlast = nd;
