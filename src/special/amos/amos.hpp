@@ -60,6 +60,17 @@ inline void zmlt(double ar, double ai, double br, double bi, double* cr, double*
     *ci = cb;
 }
 
+// arg(a) for a off both axes, from atan(ai/ar) moved into (-pi, pi].
+inline double ArgOffAxes(double ar, double ai) {
+    double dtheta = std::atan(ai / ar);
+    if (dtheta <= 0.0) {
+        if (ar < 0.0) dtheta = dtheta + data::zlog::DPI;
+    } else if (ar < 0.0) {
+        dtheta = dtheta - data::zlog::DPI;
+    }
+    return dtheta;
+}
+
 // Principal logarithm; ierr = 1 for a = 0 (b is then left alone).
 inline void zlog(double ar, double ai, double* br, double* bi, int* ierr) {
     *ierr = 0;
@@ -82,12 +93,7 @@ inline void zlog(double ar, double ai, double* br, double* bi, int* ierr) {
         }
         return;
     }
-    double dtheta = std::atan(ai / ar);
-    if (dtheta <= 0.0) {
-        if (ar < 0.0) dtheta = dtheta + data::zlog::DPI;
-    } else if (ar < 0.0) {
-        dtheta = dtheta - data::zlog::DPI;
-    }
+    double dtheta = ArgOffAxes(ar, ai);
     const double zm = zabs(ar, ai);
     *br = std::log(zm);
     *bi = dtheta;
@@ -120,12 +126,7 @@ inline void zsqrt(double ar, double ai, double* br, double* bi) {
         }
         return;
     }
-    double dtheta = std::atan(ai / ar);
-    if (dtheta <= 0.0) {
-        if (ar < 0.0) dtheta = dtheta + data::zsqrt::DPI;
-    } else if (ar < 0.0) {
-        dtheta = dtheta - data::zsqrt::DPI;
-    }
+    double dtheta = ArgOffAxes(ar, ai);
     dtheta = dtheta * 0.5;
     *br = zm * std::cos(dtheta);
     *bi = zm * std::sin(dtheta);

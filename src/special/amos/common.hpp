@@ -26,6 +26,13 @@ inline void ScaleTriplets(double tol, double* cssr, double* csrr, double* bry) {
     bry[2] = kD1Mach2;
 }
 
+inline void ZeroSequence(int n, double* yr, double* yi) {
+    for (int i = 1; i <= n; ++i) {
+        yr[i - 1] = 0.0;
+        yi[i - 1] = 0.0;
+    }
+}
+
 // rz = 2 / z.
 inline void TwoOverZ(double zr, double zi, double* rzr, double* rzi) {
     const double raz = 1.0 / zabs(zr, zi);
@@ -261,10 +268,7 @@ inline bool FirstMemberOutOfRange(double rs1, double elim, int n, double* yr, do
         return true;
     }
     *nz = n;
-    for (int i = 1; i <= n; ++i) {
-        yr[i - 1] = 0.0;
-        yi[i - 1] = 0.0;
-    }
+    ZeroSequence(n, yr, yi);
     return true;
 }
 
@@ -287,6 +291,21 @@ inline bool DropUnderflowed(double zr, double zi, double fnu, int kode, double t
     *nd = *nd - nuf;
     *nz = *nz + nuf;
     return *nd != 0;
+}
+
+// phi (Ai(arg) asum + Ai'(arg) bsum): the Airy-type expansion's term, the Airy values scaled.
+inline void AiryTypeTerm(double argr, double argi, double asumr, double asumi, double bsumr, double bsumi,
+                         double phir, double phii, double* pr, double* pi) {
+    double air = 0.0, aii = 0.0, dair = 0.0, daii = 0.0;
+    int nai = 0, ndai = 0, idum = 0;
+    zairy(argr, argi, 0, 2, &air, &aii, &nai, &idum);
+    zairy(argr, argi, 1, 2, &dair, &daii, &ndai, &idum);
+    double str = dair * bsumr - daii * bsumi;
+    double sti = dair * bsumi + daii * bsumr;
+    str = str + (air * asumr - aii * asumi);
+    sti = sti + (air * asumi + aii * asumr);
+    *pr = phir * str - phii * sti;
+    *pi = phir * sti + phii * str;
 }
 
 }  // namespace tw::amos

@@ -101,10 +101,7 @@ void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double*
             }
         }
         if (under) {
-            for (int i = 1; i <= nn; ++i) {
-                yr[i - 1] = d::ZEROR;
-                yi[i - 1] = d::ZEROI;
-            }
+            ZeroSequence(nn, yr, yi);
             *nuf = nn;
             return;
         }
@@ -237,8 +234,7 @@ void zuni2(double zr, double zi, double fnu, int kode, int n, double* yr, double
     double phir = 0.0, phii = 0.0, argr = 0.0, argi = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0,
            zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0;
     double str = 0.0, sti = 0.0, s1r = 0.0, s1i = 0.0, s2r = 0.0, s2i = 0.0, rs1 = 0.0;
-    double air = 0.0, aii = 0.0, dair = 0.0, daii = 0.0;
-    int iflag = 0, nn = 0, nw = 0, nai = 0, ndai = 0, idum = 0;
+    int iflag = 0, nn = 0, nw = 0;
     *nz = 0;
     int nd = n;
     *nlast = 0;
@@ -292,14 +288,7 @@ L40:
             }))
             goto L120;
         // Scale s1 to keep intermediate arithmetic on scale near exponent extremes.
-        zairy(argr, argi, 0, 2, &air, &aii, &nai, &idum);
-        zairy(argr, argi, 1, 2, &dair, &daii, &ndai, &idum);
-        str = dair * bsumr - daii * bsumi;
-        sti = dair * bsumi + daii * bsumr;
-        str = str + (air * asumr - aii * asumi);
-        sti = sti + (air * asumi + aii * asumr);
-        s2r = phir * str - phii * sti;
-        s2i = phir * sti + phii * str;
+        AiryTypeTerm(argr, argi, asumr, asumi, bsumr, bsumi, phir, phii, &s2r, &s2i);
         TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
         if (iflag == 1) {
             zuchk(s2r, s2i, &nw, bry[0], tol);

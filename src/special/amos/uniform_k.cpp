@@ -112,10 +112,7 @@ L75:
             // For zr < 0.0, the I function to be added will overflow.
             if (zr < 0.0) goto L300;
             *nz = n;
-            for (i = 1; i <= n; ++i) {
-                yr[i - 1] = d::ZEROR;
-                yi[i - 1] = d::ZEROI;
-            }
+            ZeroSequence(n, yr, yi);
             return;
         }
         // Forward recurrence for the remaining members.
@@ -362,10 +359,7 @@ L85:
             // For zr < 0.0, the I function to be added will overflow.
             if (zr < 0.0) goto L320;
             *nz = n;
-            for (i = 1; i <= n; ++i) {
-                yr[i - 1] = d::ZEROR;
-                yi[i - 1] = d::ZEROI;
-            }
+            ZeroSequence(n, yr, yi);
             return;
         }
         // Forward recurrence for the remaining members.
@@ -429,14 +423,7 @@ L85:
                 return r + std::log(zabs(phidr, phidi)) - 0.25 * std::log(zabs(argdr, argdi)) - d::AIC;
             }))
             goto L280;
-        zairy(argdr, argdi, 0, 2, &air, &aii, &nai, &idum);
-        zairy(argdr, argdi, 1, 2, &dair, &daii, &ndai, &idum);
-        str = dair * bsumdr - daii * bsumdi;
-        sti = dair * bsumdi + daii * bsumdr;
-        str = str + (air * asumdr - aii * asumdi);
-        sti = sti + (air * asumdi + aii * asumdr);
-        ptr = str * phidr - sti * phidi;
-        pti = str * phidi + sti * phidr;
+        AiryTypeTerm(argdr, argdi, asumdr, asumdi, bsumdr, bsumdi, phidr, phidi, &ptr, &pti);
         s2r = ptr * csr - pti * csi;
         s2i = ptr * csi + pti * csr;
         TimesScaledExp(s1r, s1i, cssr[iflag - 1], &s2r, &s2i);
