@@ -46,8 +46,8 @@ int main(int argc, char** argv) {
         return 2;
     }
     const long points = argc > 3 ? std::atol(argv[3]) : 100000;
-    const char* realNames[] = {"TW_CxBesselJr", "TW_CxBesselYr", "TW_CxBesselIr", "TW_CxBesselKr",
-                               "TW_CxBesselJs", "TW_CxBesselYs"};
+    const char* realNames[] = {"TW_CxBesselJr", "TW_CxBesselYr", "TW_CxBesselIr",
+                               "TW_CxBesselKr", "TW_CxBesselJs", "TW_CxBesselYs"};
     RealFn real[6];
     for (int i = 0; i < 6; ++i) real[i] = reinterpret_cast<RealFn>(Sym(lib, realNames[i]));
     const KindFn hr = reinterpret_cast<KindFn>(Sym(lib, "TW_CxBesselHr"));

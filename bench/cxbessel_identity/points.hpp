@@ -34,11 +34,16 @@ inline Cx Point() {
     const double r = std::pow(10.0, -8.0 + 12.0 * Uniform());
     const uint64_t k = Next() % 16;
     switch (k) {
-        case 0: return {r, 0.0};
-        case 1: return {-r, 0.0};
-        case 2: return {0.0, r};
-        case 3: return {0.0, -r};
-        default: break;
+        case 0:
+            return {r, 0.0};
+        case 1:
+            return {-r, 0.0};
+        case 2:
+            return {0.0, r};
+        case 3:
+            return {0.0, -r};
+        default:
+            break;
     }
     const double t = 2.0 * 3.141592653589793 * Uniform() - 3.141592653589793;
     return {r * std::cos(t), r * std::sin(t)};

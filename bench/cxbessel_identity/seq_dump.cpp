@@ -36,12 +36,24 @@ int main(int argc, char** argv) {
                 for (int i = 0; i < kMax; ++i) yr[i] = yi[i] = wr[i] = wi[i] = -7.25;
                 int nz = -99, ierr = -99;
                 switch (fn) {
-                    case 0: zbesj(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr); break;
-                    case 1: zbesy(z.re, z.im, v, kode, n, yr, yi, &nz, wr, wi, &ierr); break;
-                    case 2: zbesi(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr); break;
-                    case 3: zbesk(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr); break;
-                    case 4: zbesh(z.re, z.im, v, kode, 1, n, yr, yi, &nz, &ierr); break;
-                    default: zbesh(z.re, z.im, v, kode, 2, n, yr, yi, &nz, &ierr); break;
+                    case 0:
+                        zbesj(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr);
+                        break;
+                    case 1:
+                        zbesy(z.re, z.im, v, kode, n, yr, yi, &nz, wr, wi, &ierr);
+                        break;
+                    case 2:
+                        zbesi(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr);
+                        break;
+                    case 3:
+                        zbesk(z.re, z.im, v, kode, n, yr, yi, &nz, &ierr);
+                        break;
+                    case 4:
+                        zbesh(z.re, z.im, v, kode, 1, n, yr, yi, &nz, &ierr);
+                        break;
+                    default:
+                        zbesh(z.re, z.im, v, kode, 2, n, yr, yi, &nz, &ierr);
+                        break;
                 }
                 std::fwrite(&nz, sizeof nz, 1, f);
                 std::fwrite(&ierr, sizeof ierr, 1, f);

@@ -232,8 +232,8 @@ inline void RecurIBackwardAddToK(int il, const double* cyr, const double* cyi, i
 
 // c = s exp(-zd) / tol, taken through the logarithm so that neither factor over- or underflows on
 // its own; false when c is still below ascle (zuchk).
-inline bool ThroughLogOnScale(double sr, double si, double zdr, double zdi, double ascle, double tol, double* cr,
-                              double* ci) {
+inline bool ThroughLogOnScale(double sr, double si, double zdr, double zdi, double ascle, double tol,
+                              double* cr, double* ci) {
     double lr = 0.0, li = 0.0;
     int idum = 0;
     zlog(sr, si, &lr, &li, &idum);

@@ -14,9 +14,9 @@ namespace {
 // One of zacon's first two members: y = cspn K + csgn I with K given and I in y, the pair first
 // through kode 2's underflow check, which also leaves K as checked in sc (the scaled restart of
 // the recurrence).
-void FirstMember(double znr, double zni, int kode, double ascle, double alim, int* iuf, int* nz, double kr, double ki,
-                 double cspnr, double cspni, double csgnr, double csgni, double* yr, double* yi, double* scr,
-                 double* sci) {
+void FirstMember(double znr, double zni, int kode, double ascle, double alim, int* iuf, int* nz, double kr,
+                 double ki, double cspnr, double cspni, double csgnr, double csgni, double* yr, double* yi,
+                 double* scr, double* sci) {
     double c1r = kr, c1i = ki, c2r = *yr, c2i = *yi;
     if (kode != 1) {
         int nw = 0;
@@ -74,15 +74,15 @@ void zacon(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     ContinuationPhase(sgn, fnu - static_cast<double>(inu), inu, &cspnr, &cspni);
     iuf = 0;
     ascle = 1.0e+3 * kD1Mach1 / tol;
-    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s1r, s1i, cspnr, cspni, csgnr, csgni, &yr[0], &yi[0], &sc1r,
-                &sc1i);
+    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s1r, s1i, cspnr, cspni, csgnr, csgni, &yr[0], &yi[0],
+                &sc1r, &sc1i);
     if (n == 1) return;
     cspnr = -cspnr;
     cspni = -cspni;
     s2r = cyr[1];
     s2i = cyi[1];
-    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s2r, s2i, cspnr, cspni, csgnr, csgni, &yr[1], &yi[1], &sc2r,
-                &sc2i);
+    FirstMember(znr, zni, kode, ascle, alim, &iuf, nz, s2r, s2i, cspnr, cspni, csgnr, csgni, &yr[1], &yi[1],
+                &sc2r, &sc2i);
     if (n == 2) return;
     cspnr = -cspnr;
     cspni = -cspni;

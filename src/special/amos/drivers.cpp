@@ -68,7 +68,8 @@ bool InRange(double az, double fn, double tol, int* ierr) {
 
 // p = y * c. A y near underflow is first brought up by 1/tol and the product taken down again, so
 // its digits are not lost to denormals on the way.
-void TimesGuarded(double yr, double yi, double cr, double ci, double ascle, double tol, double* pr, double* pi) {
+void TimesGuarded(double yr, double yi, double cr, double ci, double ascle, double tol, double* pr,
+                  double* pi) {
     const double rtol = 1.0 / tol;
     double aa = yr, bb = yi, atol = 1.0;
     if (!(std::max(std::fabs(aa), std::fabs(bb)) > ascle)) {
@@ -115,8 +116,8 @@ void AiryZeta(double zr, double zi, double tth, double* csqr, double* csqi, doub
 
 // The Airy power series for |z| <= 1: s1 and s2 sum the terms in z^3 of the two solutions (id = 0)
 // or of their derivatives (id = 1, fid = 1), both starting from 1; they stay 1 when |z|^3 < tol.
-void AiryPowerSeries(double zr, double zi, double az, double fid, double tol, double* s1r, double* s1i, double* s2r,
-                     double* s2i) {
+void AiryPowerSeries(double zr, double zi, double az, double fid, double tol, double* s1r, double* s1i,
+                     double* s2r, double* s2i) {
     *s1r = 1.0;
     *s1i = 0.0;
     *s2r = 1.0;
@@ -399,10 +400,14 @@ void zbesk(double zr, double zi, double fnu, int kode, int n, double* cyr, doubl
     if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
     switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
-        case Route::kOverflow: goto L180;
-        case Route::kUniform: goto L80;
-        case Route::kDirect: goto L60;
-        case Route::kPreTest: break;
+        case Route::kOverflow:
+            goto L180;
+        case Route::kUniform:
+            goto L80;
+        case Route::kDirect:
+            goto L60;
+        case Route::kPreTest:
+            break;
     }
     zuoik(zr, zi, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
     if (nuf < 0) goto L180;
@@ -476,10 +481,14 @@ void zbesh(double zr, double zi, double fnu, int kode, int m, int n, double* cyr
     if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
     switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
-        case Route::kOverflow: goto L230;
-        case Route::kUniform: goto L90;
-        case Route::kDirect: goto L70;
-        case Route::kPreTest: break;
+        case Route::kOverflow:
+            goto L230;
+        case Route::kUniform:
+            goto L90;
+        case Route::kDirect:
+            goto L70;
+        case Route::kPreTest:
+            break;
     }
     zuoik(znr, zni, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
     if (nuf < 0) goto L230;

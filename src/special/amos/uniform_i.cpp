@@ -8,14 +8,47 @@
 
 namespace tw::amos {
 
+namespace {
+
+// zuoik's underflow test between -alim and -elim: rcz (Re of the exponent) refined by the log of
+// the term's modulus, then the term itself, exp(cz) phi (arg^-1/4 for the Airy-type form) / tol,
+// through zuchk. true when it underflows.
+bool Underflows(double rcz, double czr, double czi, double phir, double phii, double argr, double argi,
+                double aphi, double aarg, int iform, double tol, double elim) {
+    namespace d = data::zuoik;
+    rcz = rcz + std::log(aphi);
+    if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
+    if (!(rcz > -elim)) return true;
+    const double ascle = 1.0e+3 * kD1Mach1 / tol;
+    double str = 0.0, sti = 0.0;
+    int idum = 0;
+    zlog(phir, phii, &str, &sti, &idum);
+    czr = czr + str;
+    czi = czi + sti;
+    if (iform != 1) {
+        zlog(argr, argi, &str, &sti, &idum);
+        czr = czr - 0.25 * str - d::AIC;
+        czi = czi - 0.25 * sti;
+    }
+    const double ax = std::exp(rcz) / tol;
+    const double ay = czi;
+    czr = ax * std::cos(ay);
+    czi = ax * std::sin(ay);
+    int nw = 0;
+    zuchk(czr, czi, &nw, ascle, tol);
+    return nw != 0;
+}
+
+}  // namespace
+
 void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double* yr, double* yi, int* nuf,
            double tol, double elim, double alim) {
     namespace d = data::zuoik;
     double cwrkr[16], cwrki[16];
     double phir = 0.0, phii = 0.0, argr = 0.0, argi = 0.0, zeta1r = 0.0, zeta1i = 0.0, zeta2r = 0.0,
            zeta2i = 0.0, asumr = 0.0, asumi = 0.0, bsumr = 0.0, bsumi = 0.0, sumr = 0.0, sumi = 0.0;
-    double czr = 0.0, czi = 0.0, aarg = 0.0, str = 0.0, sti = 0.0;
-    int init = 0, idum = 0, nw = 0;
+    double czr = 0.0, czi = 0.0, aarg = 0.0;
+    int init = 0;
     *nuf = 0;
     int nn = n;
     double zrr = zr;
@@ -77,29 +110,8 @@ void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double*
     } else {
         // Underflow test.
         bool under = rcz < -elim;
-        if (!under && rcz <= -alim) {
-            rcz = rcz + std::log(aphi);
-            if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
-            if (rcz > -elim) {
-                const double ascle = 1.0e+3 * kD1Mach1 / tol;
-                zlog(phir, phii, &str, &sti, &idum);
-                czr = czr + str;
-                czi = czi + sti;
-                if (iform != 1) {
-                    zlog(argr, argi, &str, &sti, &idum);
-                    czr = czr - 0.25 * str - d::AIC;
-                    czi = czi - 0.25 * sti;
-                }
-                ax = std::exp(rcz) / tol;
-                ay = czi;
-                czr = ax * std::cos(ay);
-                czi = ax * std::sin(ay);
-                zuchk(czr, czi, &nw, ascle, tol);
-                under = nw != 0;
-            } else {
-                under = true;
-            }
-        }
+        if (!under && rcz <= -alim)
+            under = Underflows(rcz, czr, czi, phir, phii, argr, argi, aphi, aarg, iform, tol, elim);
         if (under) {
             ZeroSequence(nn, yr, yi);
             *nuf = nn;
@@ -132,25 +144,7 @@ void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double*
         bool under = rcz < -elim;
         if (!under) {
             if (rcz > -alim) return;
-            rcz = rcz + std::log(aphi);
-            if (iform == 2) rcz = rcz - 0.25 * std::log(aarg) - d::AIC;
-            if (rcz > -elim) {
-                const double ascle = 1.0e+3 * kD1Mach1 / tol;
-                zlog(phir, phii, &str, &sti, &idum);
-                czr = czr + str;
-                czi = czi + sti;
-                if (iform != 1) {
-                    zlog(argr, argi, &str, &sti, &idum);
-                    czr = czr - 0.25 * str - d::AIC;
-                    czi = czi - 0.25 * sti;
-                }
-                ax = std::exp(rcz) / tol;
-                ay = czi;
-                czr = ax * std::cos(ay);
-                czi = ax * std::sin(ay);
-                zuchk(czr, czi, &nw, ascle, tol);
-                if (nw == 0) return;
-            }
+            if (!Underflows(rcz, czr, czi, phir, phii, argr, argi, aphi, aarg, iform, tol, elim)) return;
         }
         yr[nn - 1] = d::ZEROR;
         yi[nn - 1] = d::ZEROI;
