@@ -81,17 +81,27 @@ void TimesGuarded(double yr, double yi, double cr, double ci, double ascle, doub
     *pi = (aa * ci + bb * cr) * atol;
 }
 
-// How K or H gets the last member of the sequence: zero (underflow) at a tiny |z| or when it would
-// overflow at a small one, the uniform expansions past fnul, zuoik's pre-test for orders above 2,
-// or directly.
-enum class Route { kOverflow, kUniform, kPreTest, kDirect };
+// How K or H gets the last member of the sequence: zero (overflow) at a tiny |z| or when it would
+// overflow at a small one, the uniform expansions past fnul, or directly; for orders above 2 zuoik
+// first zeroes the members that underflow (at zn), adding them to nz: kUnderflow when all do.
+enum class Route { kOverflow, kUniform, kUnderflow, kDirect };
 
-Route LastMemberRoute(double az, double fnu, double fn, double fnul, double tol, double elim) {
+Route LastMemberRoute(double az, double fnu, double fn, double fnul, double tol, double elim, double alim,
+                      double znr, double zni, int kode, int* nn, double* cyr, double* cyi, int* nz) {
     const double ufl = kD1Mach1 * 1.0e+3;
     if (az < ufl) return Route::kOverflow;
     if (fnu > fnul) return Route::kUniform;
     if (fn <= 1.0) return Route::kDirect;
-    if (fn > 2.0) return Route::kPreTest;
+    if (fn > 2.0) {
+        int nuf = 0;
+        zuoik(znr, zni, fnu, kode, 2, *nn, cyr, cyi, &nuf, tol, elim, alim);
+        if (nuf < 0) return Route::kOverflow;
+        *nz = *nz + nuf;
+        *nn = *nn - nuf;
+        // Here nn = n or nn = 0 since nuf = 0, nn, or -1 on return from zuoik; if nuf = nn the
+        // sequence underflowed.
+        return *nn == 0 ? Route::kUnderflow : Route::kDirect;
+    }
     if (az > tol) return Route::kDirect;
     const double arg = 0.5 * az;
     const double aln = -fn * std::log(arg);
@@ -388,7 +398,7 @@ L260:
 
 // K(fnu, z): zbknu in the right half plane, zacon to the left, zbunk for large order.
 void zbesk(double zr, double zi, double fnu, int kode, int n, double* cyr, double* cyi, int* nz, int* ierr) {
-    int mr = 0, nn = 0, nuf = 0, nw = 0;
+    int mr = 0, nn = 0, nw = 0;
     double az = 0, fn = 0;
 
     if (Refused((zi == 0.0 && zr == 0.0), fnu, kode, n, nz, ierr)) return;
@@ -399,24 +409,16 @@ void zbesk(double zr, double zi, double fnu, int kode, int n, double* cyr, doubl
     fn = fnu + static_cast<double>(nn - 1);
     if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
-    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
+    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim, alim, zr, zi, kode, &nn, cyr, cyi, nz)) {
         case Route::kOverflow:
             goto L180;
         case Route::kUniform:
             goto L80;
+        case Route::kUnderflow:
+            goto L100;
         case Route::kDirect:
-            goto L60;
-        case Route::kPreTest:
             break;
     }
-    zuoik(zr, zi, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
-    if (nuf < 0) goto L180;
-    *nz = *nz + nuf;
-    nn = nn - nuf;
-    // Here nn = n or nn = 0 since nuf = 0, nn, or -1 on return from zuoik; if nuf = nn the
-    // sequence underflowed.
-    if (nn == 0) goto L100;
-L60:
     if (zr < 0.0) goto L70;
     // Right half plane computation, Re z >= 0.
     zbknu(zr, zi, fnu, kode, nn, cyr, cyi, &nw, tol, elim, alim);
@@ -463,7 +465,7 @@ L260:
 // H(m, fnu, z) = (1/mp) exp(-mp*fnu) K(fnu, z*exp(-mp)), mp = m*pi*i/2 with m = 1 or 2.
 void zbesh(double zr, double zi, double fnu, int kode, int m, int n, double* cyr, double* cyi, int* nz, int* ierr) {
     using namespace data::zbesh;
-    int i = 0, inu = 0, inuh = 0, ir = 0, mm = 0, mr = 0, nn = 0, nuf = 0, nw = 0;
+    int i = 0, inu = 0, inuh = 0, ir = 0, mm = 0, mr = 0, nn = 0, nw = 0;
     double arg = 0, az = 0, fmm = 0, fn = 0, rhpi = 0, sgn = 0, str = 0, zni = 0;
     double znr = 0, zti = 0, ascle = 0, rtol = 0, csgnr = 0, csgni = 0;
 
@@ -480,24 +482,16 @@ void zbesh(double zr, double zi, double fnu, int kode, int m, int n, double* cyr
     az = zabs(zr, zi);
     if (!InRange(az, fn, tol, ierr)) goto L260;
     // Overflow test on the last member of the sequence.
-    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim)) {
+    switch (LastMemberRoute(az, fnu, fn, fnul, tol, elim, alim, znr, zni, kode, &nn, cyr, cyi, nz)) {
         case Route::kOverflow:
             goto L230;
         case Route::kUniform:
             goto L90;
+        case Route::kUnderflow:
+            goto L140;
         case Route::kDirect:
-            goto L70;
-        case Route::kPreTest:
             break;
     }
-    zuoik(znr, zni, fnu, kode, 2, nn, cyr, cyi, &nuf, tol, elim, alim);
-    if (nuf < 0) goto L230;
-    *nz = *nz + nuf;
-    nn = nn - nuf;
-    // Here nn = n or nn = 0 since nuf = 0, nn, or -1 on return from zuoik; if nuf = nn the
-    // sequence underflowed.
-    if (nn == 0) goto L140;
-L70:
     if ((znr < 0.0) || (znr == 0.0 && zni < 0.0 && m == 2)) goto L80;
     // Right half plane computation, xn >= 0 (and not xn = 0, yn < 0 for m = 2).
     zbknu(znr, zni, fnu, kode, nn, cyr, cyi, nz, tol, elim, alim);

@@ -39,6 +39,25 @@ bool Underflows(double rcz, double czr, double czi, double phir, double phii, do
     return nw != 0;
 }
 
+// zbuni's rescaling: once st = s2 / csclr passes ascle, s1 and s2 move to the next scale, csclr
+// taking another factor tol.
+void RescaleBy(double tol, double str, double sti, const double* bry, int* iflag, double* ascle,
+               double* csclr, double* cscrr, double* s1r, double* s1i, double* s2r, double* s2i) {
+    if (*iflag >= 3) return;
+    const double c1m = std::fmax(std::fabs(str), std::fabs(sti));
+    if (c1m <= *ascle) return;
+    *iflag = *iflag + 1;
+    *ascle = bry[*iflag - 1];
+    *s1r = *s1r * *cscrr;
+    *s1i = *s1i * *cscrr;
+    *csclr = *csclr * tol;
+    *cscrr = 1.0 / *csclr;
+    *s1r = *s1r * *csclr;
+    *s1i = *s1i * *csclr;
+    *s2r = str * *csclr;
+    *s2i = sti * *csclr;
+}
+
 }  // namespace
 
 void zuoik(double zr, double zi, double fnu, int kode, int ikflg, int n, double* yr, double* yi, int* nuf,
@@ -395,25 +414,7 @@ void zbuni(double zr, double zi, double fnu, int kode, int n, double* yr, double
         s1r = str;
         s1i = sti;
         fnui = fnui - 1.0;
-        if (iflag >= 3) continue;
-        str = s2r * cscrr;
-        sti = s2i * cscrr;
-        const double c1r = std::fabs(str);
-        const double c1i = std::fabs(sti);
-        const double c1m = std::fmax(c1r, c1i);
-        if (c1m <= ascle) continue;
-        iflag = iflag + 1;
-        ascle = bry[iflag - 1];
-        s1r = s1r * cscrr;
-        s1i = s1i * cscrr;
-        s2r = str;
-        s2i = sti;
-        csclr = csclr * tol;
-        cscrr = 1.0 / csclr;
-        s1r = s1r * csclr;
-        s1i = s1i * csclr;
-        s2r = s2r * csclr;
-        s2i = s2i * csclr;
+        RescaleBy(tol, s2r * cscrr, s2i * cscrr, bry, &iflag, &ascle, &csclr, &cscrr, &s1r, &s1i, &s2r, &s2i);
     }
     yr[n - 1] = s2r * cscrr;
     yi[n - 1] = s2i * cscrr;
@@ -434,23 +435,7 @@ void zbuni(double zr, double zi, double fnu, int kode, int n, double* yr, double
         yi[k - 1] = sti;
         fnui = fnui - 1.0;
         k = k - 1;
-        if (iflag >= 3) continue;
-        const double c1r = std::fabs(str);
-        const double c1i = std::fabs(sti);
-        const double c1m = std::fmax(c1r, c1i);
-        if (c1m <= ascle) continue;
-        iflag = iflag + 1;
-        ascle = bry[iflag - 1];
-        s1r = s1r * cscrr;
-        s1i = s1i * cscrr;
-        s2r = str;
-        s2i = sti;
-        csclr = csclr * tol;
-        cscrr = 1.0 / csclr;
-        s1r = s1r * csclr;
-        s1i = s1i * csclr;
-        s2r = s2r * csclr;
-        s2i = s2i * csclr;
+        RescaleBy(tol, str, sti, bry, &iflag, &ascle, &csclr, &cscrr, &s1r, &s1i, &s2r, &s2i);
     }
 }
 
