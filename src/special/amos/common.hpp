@@ -308,4 +308,29 @@ inline void AiryTypeTerm(double argr, double argi, double asumr, double asumi, d
     *pi = phir * sti + phii * str;
 }
 
+// The last member's exponent, refined near the limits by log |phi|: true when it passes elim.
+inline bool LastMemberOutOfRange(double s1r, double phir, double phii, double elim, double alim,
+                                 double* rs1) {
+    *rs1 = s1r;
+    bool out = std::fabs(*rs1) > elim;
+    if (!out && std::fabs(*rs1) >= alim) {
+        *rs1 = *rs1 + std::log(zabs(phir, phii));
+        out = !(std::fabs(*rs1) < elim);
+    }
+    return out;
+}
+
+// Member i (1-based) underflowed: zero it and, unless already zero, the one before, since the
+// recurrence needs two neighbours on scale; nz counts them.
+inline void ZeroWithPrevious(int i, double* yr, double* yi, int* nz) {
+    yr[i - 1] = 0.0;
+    yi[i - 1] = 0.0;
+    *nz = *nz + 1;
+    if (i == 1) return;
+    if (yr[i - 2] == 0.0 && yi[i - 2] == 0.0) return;
+    yr[i - 2] = 0.0;
+    yi[i - 2] = 0.0;
+    *nz = *nz + 1;
+}
+
 }  // namespace tw::amos

@@ -19,10 +19,10 @@ void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
     int init[2] = {0, 0};
     int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0, kk = 0,
         nw = 0, initd = 0, ic = 0, ipard = 0, j = 0, m = 0;
-    double aphi = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, cspni = 0.0, cspnr = 0.0, c2i = 0.0, c2r = 0.0,
-           fmr = 0.0, fn = 0.0, fnf = 0.0, phidi = 0.0, phidr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0,
-           rzr = 0.0, sgn = 0.0, sti = 0.0, str = 0.0, sumdi = 0.0, sumdr = 0.0, s1i = 0.0, s1r = 0.0,
-           s2i = 0.0, s2r = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zri = 0.0, zrr = 0.0;
+    double cki = 0.0, ckr = 0.0, csgni = 0.0, cspni = 0.0, cspnr = 0.0, c2i = 0.0, c2r = 0.0, fmr = 0.0,
+           fn = 0.0, fnf = 0.0, phidi = 0.0, phidr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0, rzr = 0.0,
+           sgn = 0.0, sti = 0.0, str = 0.0, sumdi = 0.0, sumdr = 0.0, s1i = 0.0, s1r = 0.0, s2i = 0.0,
+           s2r = 0.0, zet1di = 0.0, zet1dr = 0.0, zet2di = 0.0, zet2dr = 0.0, zri = 0.0, zrr = 0.0;
     kdflg = 1;
     *nz = 0;
     // exp(-alim) = exp(-elim)/tol = approximately one digit of precision above the underflow limit.
@@ -69,14 +69,7 @@ void zunk1(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         // For zr < 0.0, the I function to be added will overflow.
         if (zr < 0.0) goto L300;
         kdflg = 1;
-        yr[i - 1] = d::ZEROR;
-        yi[i - 1] = d::ZEROI;
-        *nz = *nz + 1;
-        if (i == 1) continue;
-        if (yr[i - 2] == d::ZEROR && yi[i - 2] == d::ZEROI) continue;
-        yr[i - 2] = d::ZEROR;
-        yi[i - 2] = d::ZEROI;
-        *nz = *nz + 1;
+        ZeroWithPrevious(i, yr, yi, nz);
     }
     i = n;
 L75:
@@ -99,15 +92,7 @@ L75:
         ExponentZeta2(kode, zrr, zri, zet2dr, zet2di, fn, &str, &sti);
         s1r = zet1dr - str;
         s1i = zet1di - sti;
-        rs1 = s1r;
-        bool out = std::fabs(rs1) > elim;
-        if (!out && std::fabs(rs1) >= alim) {
-            // Refine the estimate and test.
-            aphi = zabs(phidr, phidi);
-            rs1 = rs1 + std::log(aphi);
-            out = !(std::fabs(rs1) < elim);
-        }
-        if (out) {
+        if (LastMemberOutOfRange(s1r, phidr, phidi, elim, alim, &rs1)) {
             if (std::fabs(rs1) > 0.0) goto L300;
             // For zr < 0.0, the I function to be added will overflow.
             if (zr < 0.0) goto L300;
@@ -222,7 +207,7 @@ void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
                    zeta2i[2] = {0.0, 0.0}, cyr[2] = {0.0, 0.0}, cyi[2] = {0.0, 0.0}, cssr[3], csrr[3];
     int i = 0, ib = 0, iflag = 0, ifn = 0, il = 0, in = 0, inu = 0, iuf = 0, k = 0, kdflg = 0, kflag = 0,
         kk = 0, nai = 0, ndai = 0, nw = 0, idum = 0, j = 0, ipard = 0, ic = 0;
-    double aii = 0.0, air = 0.0, ang = 0.0, aphi = 0.0, argdi = 0.0, argdr = 0.0, asumdi = 0.0, asumdr = 0.0,
+    double aii = 0.0, air = 0.0, ang = 0.0, argdi = 0.0, argdr = 0.0, asumdi = 0.0, asumdr = 0.0,
            bsumdi = 0.0, bsumdr = 0.0, car = 0.0, cki = 0.0, ckr = 0.0, csgni = 0.0, csi = 0.0, cspni = 0.0,
            cspnr = 0.0, csr = 0.0, c2i = 0.0, c2r = 0.0, daii = 0.0, dair = 0.0, fmr = 0.0, fn = 0.0,
            fnf = 0.0, phidi = 0.0, phidr = 0.0, pti = 0.0, ptr = 0.0, razr = 0.0, rs1 = 0.0, rzi = 0.0,
@@ -313,18 +298,11 @@ void zunk2(double zr, double zi, double fnu, int kode, int mr, int n, double* yr
         if (rs1 > 0.0) goto L320;
         // For zr < 0.0, the I function to be added will overflow.
         if (zr < 0.0) goto L320;
-        kdflg = 1;
-        yr[i - 1] = d::ZEROR;
-        yi[i - 1] = d::ZEROI;
-        *nz = *nz + 1;
         str = csi;
         csi = -csr;
         csr = str;
-        if (i == 1) continue;
-        if (yr[i - 2] == d::ZEROR && yi[i - 2] == d::ZEROI) continue;
-        yr[i - 2] = d::ZEROR;
-        yi[i - 2] = d::ZEROI;
-        *nz = *nz + 1;
+        kdflg = 1;
+        ZeroWithPrevious(i, yr, yi, nz);
     }
     i = n;
 L85:
@@ -346,15 +324,7 @@ L85:
         ExponentZeta2(kode, zbr, zbi, zet2dr, zet2di, fn, &str, &sti);
         s1r = zet1dr - str;
         s1i = zet1di - sti;
-        rs1 = s1r;
-        bool out = std::fabs(rs1) > elim;
-        if (!out && std::fabs(rs1) >= alim) {
-            // Refine the estimate and test.
-            aphi = zabs(phidr, phidi);
-            rs1 = rs1 + std::log(aphi);
-            out = !(std::fabs(rs1) < elim);
-        }
-        if (out) {
+        if (LastMemberOutOfRange(s1r, phidr, phidi, elim, alim, &rs1)) {
             if (rs1 > 0.0) goto L320;
             // For zr < 0.0, the I function to be added will overflow.
             if (zr < 0.0) goto L320;
