@@ -6,6 +6,10 @@
 #    calls), and the two files of statuses and value bits must be the same byte for byte.
 # 2. seq_dump.cpp calls the port's drivers with sequences (n = 2..8), built once from the port's
 #    sources at the reference rev and once from this tree's working copy; same comparison.
+#
+# The reference library is the one built from the reference rev: copy build/libtwanlys.so aside
+# before changing the port, e.g.  cp build/libtwanlys.so.0.1 /tmp/ref.so; git rev-parse HEAD.
+# Exit status 0 when both comparisons find the same bytes.
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
 root=$(cd "$here/../.." && pwd)
