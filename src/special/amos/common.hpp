@@ -1,6 +1,7 @@
 // Blocks the routines of the port repeat word for word in the published package, written once.
 // Each keeps the published arithmetic in its order, so the routines that call it compute the same
-// bits as when the block stood inline.
+// bits as when the block stood inline. Where two copies differed only in the order of the operands
+// of one addition or multiplication (which rounds the same either way), one form serves both.
 #pragma once
 
 #include <algorithm>
