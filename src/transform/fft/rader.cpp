@@ -89,58 +89,69 @@ void ReleaseRaderStage(FftStage* st) {
 }
 
 // The convolutions run on interleaved scratch (work holds 4 p f64), so that the transforms of
-// length p-1 take the kernels' pair loads; the arithmetic is that of split data.
-Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
-                    double* yi, double* work) {
+// length p-1 take the kernels' pair loads; the arithmetic is that of split data. Input j stands at
+// x[j xs] and output k goes to y[k ys]: a leaf reads and writes its sub-transforms where they are,
+// with no column copies. All inputs are read before the first output is written.
+Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, ptrdiff_t xs,
+                    double* yr, double* yi, ptrdiff_t ys, double* work) {
     const int32_t m = p - 1;
     const int32_t* gather = st->raderGather;
     const int32_t* scatter = st->raderScatter;
     double *a = work, *b = work + 2 * static_cast<ptrdiff_t>(m);
     const double x0r = xr[0], x0i = xi[0];
-    for (int32_t q = 0; q < m; ++q) PutPair(a + 2 * q, xr[gather[q + 1]], xi[gather[q + 1]]);
+    // Output 0 sums the inputs in gather order, as the gather goes.
+    double sr = x0r, si = x0i;
+    for (int32_t q = 0; q < m; ++q) {
+        const ptrdiff_t g = gather[q + 1] * xs;
+        const double ur = xr[g], ui = xi[g];
+        sr += ur;
+        si += ui;
+        PutPair(a + 2 * q, ur, ui);
+    }
     if (const Status s = FftComplexForward(st->raderTable, a, a + 1, b, b + 1, 2, 2, m)) return s;
     for (int32_t q = 0; q < m; ++q) ConjugateProductPair(b + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
     if (const Status s = FftComplexForward(st->raderTable, b, b + 1, a, a + 1, 2, 2, m)) return s;
-    // The sum of the inputs (output 0) in gather order: a chain of dependent additions, so it runs
-    // beside the independent scatter rather than on its own.
-    double sr = x0r, si = x0i;
     for (int32_t k = 1; k <= m; ++k) {
-        sr += xr[gather[k]];
-        si += xi[gather[k]];
-        yr[scatter[k]] = a[2 * (k - 1)] + x0r;
-        yi[scatter[k]] = x0i - a[2 * (k - 1) + 1];
+        const ptrdiff_t o = scatter[k] * ys;
+        yr[o] = a[2 * (k - 1)] + x0r;
+        yi[o] = x0i - a[2 * (k - 1) + 1];
     }
     yr[0] = sr;
     yi[0] = si;
     return 0;
 }
 
-Status RaderReal(const FftStage* st, int32_t p, const double* x, double* y, double* work) {
+Status RaderReal(const FftStage* st, int32_t p, const double* x, ptrdiff_t xs, double* y, ptrdiff_t ys,
+                 double* work) {
     const int32_t m = p - 1;
     const int32_t* gather = st->raderGather;
     const int32_t* scatter = st->raderScatter;
     // t (the gathered input, later the second transform) and e (the expanded spectrum).
     double *t = work, *e = work + 2 * static_cast<ptrdiff_t>(m);
     const double x0 = x[0];
-    for (int32_t q = 0; q < m; ++q) t[q] = x[gather[q + 1]];
-    if (const Status s = FftRealForward(st->raderTable, t, y + 1, 1, 1, m)) return s;
+    double sum = x0;
+    for (int32_t q = 0; q < m; ++q) {
+        t[q] = x[gather[q + 1] * xs];
+        sum += t[q];
+    }
+    // The half-complex result goes behind output 0, at the output's stride.
+    double* h = y + ys;
+    if (const Status s = FftRealForward(st->raderTable, t, h, 1, ys, m)) return s;
     // m = p - 1 is even: expand the half-complex result into the full spectrum.
-    const double* h = y + 1;
     PutPair(e, h[0], 0);
-    PutPair(e + m, h[m / 2], 0);
+    PutPair(e + m, h[(m / 2) * ys], 0);
     for (int32_t k = 1; k < m / 2; ++k) {
-        PutPair(e + 2 * k, h[k], h[m - k]);
-        PutPair(e + 2 * (m - k), h[k], -h[m - k]);
+        const double re = h[k * ys], im = h[(m - k) * ys];
+        PutPair(e + 2 * k, re, im);
+        PutPair(e + 2 * (m - k), re, -im);
     }
     for (int32_t q = 0; q < m; ++q) ConjugateProductPair(e + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
     if (const Status s = FftComplexForward(st->raderTable, e, e + 1, t, t + 1, 2, 2, m)) return s;
-    double sum = x0;
     for (int32_t k = 1; k <= m; ++k) {
-        sum += x[gather[k]];
         const int32_t j = scatter[k];
         if (j <= p / 2) {
-            y[j] = t[2 * (k - 1)] + x0;
-            y[p - j] = -t[2 * (k - 1) + 1];
+            y[j * ys] = t[2 * (k - 1)] + x0;
+            y[(p - j) * ys] = -t[2 * (k - 1) + 1];
         }
     }
     y[0] = sum;
