@@ -18,6 +18,7 @@
 #include <emmintrin.h>
 
 #include <cstddef>
+#include <cstdint>
 
 #ifndef TW_FFT_ISA
 #define TW_FFT_ISA sse2
@@ -71,6 +72,16 @@ struct Sse2Lanes {
     }
     static void StorePair(double* p, ptrdiff_t lane, V re, V im) {
         _mm_storeu_pd(p, _mm_unpacklo_pd(re, im));
+        _mm_storeu_pd(p + lane, _mm_unpackhi_pd(re, im));
+    }
+    // The stores of a block whose first `skip` lanes repeat transforms already done: only the
+    // lanes from skip on are written.
+    static void StoreFrom(double* p, ptrdiff_t lane, V v, int32_t skip) {
+        if (skip <= 0) _mm_storel_pd(p, v);
+        _mm_storeh_pd(p + lane, v);
+    }
+    static void StorePairFrom(double* p, ptrdiff_t lane, V re, V im, int32_t skip) {
+        if (skip <= 0) _mm_storeu_pd(p, _mm_unpacklo_pd(re, im));
         _mm_storeu_pd(p + lane, _mm_unpackhi_pd(re, im));
     }
 };

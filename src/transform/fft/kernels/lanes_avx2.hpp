@@ -44,6 +44,21 @@ struct Avx2Lanes {
         _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
         _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
     }
+    // Only the lanes from skip on (see lanes.hpp); the last lane is always written.
+    static void StoreFrom(double* p, ptrdiff_t lane, V v, int32_t skip) {
+        const __m128d lo = _mm256_castpd256_pd128(v), hi = _mm256_extractf128_pd(v, 1);
+        if (skip <= 0) _mm_storel_pd(p, lo);
+        if (skip <= 1) _mm_storeh_pd(p + lane, lo);
+        if (skip <= 2) _mm_storel_pd(p + 2 * lane, hi);
+        _mm_storeh_pd(p + 3 * lane, hi);
+    }
+    static void StorePairFrom(double* p, ptrdiff_t lane, V re, V im, int32_t skip) {
+        const __m256d a = _mm256_unpacklo_pd(re, im), b = _mm256_unpackhi_pd(re, im);
+        if (skip <= 0) _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
+        if (skip <= 1) _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
+        if (skip <= 2) _mm_storeu_pd(p + 2 * lane, _mm256_extractf128_pd(a, 1));
+        _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
+    }
 };
 
 }  // namespace tw::fft::TW_FFT_ISA

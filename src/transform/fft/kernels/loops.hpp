@@ -44,14 +44,22 @@ struct ComplexIn {
     }
 };
 
-template <class L, bool Pair>
+// Masked: the lanes below `skip` repeat transforms already done and are not stored (the last
+// block of a loop, moved back so that it ends with the last transform).
+template <class L, bool Pair, bool Masked = false>
 struct ComplexOut {
     using V = typename L::V;
     double* re;
     double* im;
     ptrdiff_t step, lane;
+    int32_t skip;
     TW_FFT_INLINE void C(int32_t k, V r, V i) const {
-        if constexpr (Pair) {
+        if constexpr (Masked && Pair) {
+            L::StorePairFrom(re + k * step, lane, r, i, skip);
+        } else if constexpr (Masked) {
+            L::StoreFrom(re + k * step, lane, r, skip);
+            L::StoreFrom(im + k * step, lane, i, skip);
+        } else if constexpr (Pair) {
             L::StorePair(re + k * step, lane, r, i);
         } else {
             L::Store(re + k * step, lane, r);
@@ -96,12 +104,18 @@ struct RealIn {
     }
 };
 
-template <class L>
+template <class L, bool Masked = false>
 struct RealOut {
     using V = typename L::V;
     double* p;
     ptrdiff_t step, lane;
-    TW_FFT_INLINE void R(int32_t k, V y) const { L::Store(p + k * step, lane, y); }
+    int32_t skip;
+    TW_FFT_INLINE void R(int32_t k, V y) const {
+        if constexpr (Masked)
+            L::StoreFrom(p + k * step, lane, y, skip);
+        else
+            L::Store(p + k * step, lane, y);
+    }
 };
 
 // The column pair (k, m-k) of a real combine as one complex column; lanes run over neighbouring
@@ -125,20 +139,24 @@ struct PairColumnIn {
 
 // Output q is X[k + q m]; below the middle it is stored as it is, above as the conjugate of its
 // mirror (r - q) m - k. The order of the two stores does not matter: they go to different columns.
-template <class L, bool Unit>
+template <class L, bool Unit, bool Masked = false>
 struct PairColumnOut {
     using V = typename L::V;
     double* front;
     double* back;
     ptrdiff_t ms, s;
     int32_t r;
+    int32_t skip;
     TW_FFT_INLINE void C(int32_t q, V re, V im) const {
         double* a = front + q * ms;
         double* b = back + (r - 1 - q) * ms;
         // Below the middle: re to the front, im to the back; above: re to the back, -im to the front.
         const bool low = 2 * q < r;
         const V f = low ? re : -im, g = low ? im : re;
-        if constexpr (Unit) {
+        if constexpr (Masked) {
+            L::StoreFrom(a, s, f, skip);
+            L::StoreFrom(b, -s, g, skip);
+        } else if constexpr (Unit) {
             L::StoreUnit(a, f);
             L::StoreBack(b, g);
         } else {
@@ -233,8 +251,17 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
     for (; q + L::kWidth <= count; q += L::kWidth) {
         const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, step, is};
-        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro};
+        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro, 0};
         if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
+    }
+    if constexpr (L::kWidth > 1) {
+        if (q < count && count >= L::kWidth) {
+            const int32_t q0 = count - L::kWidth;
+            const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
+            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, q - q0};
+            q = count;
+            return RunComplex<typename L::V>(p, in, out);
+        }
     }
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafComplexFrom[P::kRadix](inRe, inIm, outRe, outIm, is, os, count, q);
@@ -250,8 +277,17 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
     for (; q + L::kWidth <= count; q += L::kWidth) {
         const RealIn<L, Unit> x{in + q * is, step, is};
-        const RealOut<L> y{out + q * ro, os, ro};
+        const RealOut<L> y{out + q * ro, os, ro, 0};
         if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
+    }
+    if constexpr (L::kWidth > 1) {
+        if (q < count && count >= L::kWidth) {
+            const int32_t q0 = count - L::kWidth;
+            const RealIn<L, Unit> x{in + q0 * is, step, is};
+            const RealOut<L, true> y{out + q0 * ro, os, ro, q - q0};
+            q = count;
+            return RunReal<typename L::V>(p, x, y);
+        }
     }
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafRealFrom[P::kRadix](in, out, is, os, count, q);
@@ -269,8 +305,21 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
     for (; j + L::kWidth <= m; j += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(j, m);
         const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, m - 1};
-        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s};
+        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+    }
+    // The rest as one block that ends at column m-1; its first lanes repeat finished columns (all
+    // at 1 or above, so their twiddles exist) and are not stored. In place this is sound: a block
+    // loads all its inputs before it stores.
+    if constexpr (L::kWidth > 1) {
+        if (j < m && m - L::kWidth >= 1) {
+            const int32_t j0 = m - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(j0, m);
+            const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j0 * s, im + j0 * s, ms, s}, twRe + w, twIm + w, m - 1};
+            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, j - j0};
+            j = m;
+            return RunComplex<typename L::V>(p, in, out);
+        }
     }
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (j < m) BaselineCodelets().combineComplexFrom[P::kRadix](re, im, twRe, twIm, s, m, j);
@@ -291,8 +340,20 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
         double* front = data + k * s;
         double* back = data + (m - k) * s;
         const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
-        const PairColumnOut<L, Unit> out{front, back, ms, s, r};
+        const PairColumnOut<L, Unit> out{front, back, ms, s, r, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+    }
+    if constexpr (L::kWidth > 1) {
+        if (k <= pairs && pairs + 1 - L::kWidth >= 1) {
+            const int32_t k0 = pairs + 1 - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(k0, m);
+            double* front = data + k0 * s;
+            double* back = data + (m - k0) * s;
+            const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
+            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, k - k0};
+            k = pairs + 1;
+            return RunComplex<typename L::V>(p, in, out);
+        }
     }
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (k <= pairs) BaselineCodelets().combineRealFrom[P::kRadix](data, twRe, twIm, s, m, k);
@@ -309,7 +370,7 @@ Status RealCombineEdges(const P& p, double* data, const double* twRe, const doub
                         int32_t m) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0}))
+    if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0, 0}))
         return st;
     if (m % 2 != 0) return 0;
     const ptrdiff_t w = ColumnTwiddles(m / 2, m);
@@ -356,7 +417,7 @@ Status ComplexCombineForm(const P& p, double* re, double* im, const double* twRe
                           ptrdiff_t s, int32_t m) {
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
     if (const Status st = RunComplex<double>(p, ComplexIn<ScalarLanes, false>{re, im, ms, 0},
-                                             ComplexOut<ScalarLanes, false>{re, im, ms, 0}))
+                                             ComplexOut<ScalarLanes, false>{re, im, ms, 0, 0}))
         return st;
     return ComplexCombineColumns<L>(p, re, im, twRe, twIm, s, m, 1);
 }
