@@ -243,26 +243,43 @@ TW_FFT_INLINE Status RunReal(const P& p, const In& in, const Out& out) {
     }
 }
 
+// The loops below run transforms `from` to `to`-1 in blocks of the lanes' width. What does not
+// fill the last block runs first, as one block ending at `to`-1 that stores only its last lanes:
+// its other lanes repeat transforms that a later block does (they must lie at `lowest` or above),
+// and reading them before that block has written them keeps the wide loads clear of recent
+// narrower stores. In place this is sound, since a block loads all its inputs before it stores.
+// Returns where the whole blocks end: `to` when there is no such tail block.
+template <class L>
+inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
+    if constexpr (L::kWidth == 1) {
+        return to;
+    } else {
+        const int32_t rest = (to - from) % L::kWidth;
+        return rest != 0 && to - L::kWidth >= lowest ? to - rest : to;
+    }
+}
+
 // Sub-transforms q0..q1-1 of a leaf: q reads in[(q + j count) inStride] and writes
 // out[(q r + k) outStride]. Returns the first sub-transform not done.
 template <class L, bool Pair, class P>
 Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
                        ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t& q) {
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    for (; q + L::kWidth <= count; q += L::kWidth) {
+    const int32_t end = TailFirst<L>(q, count, 0);
+    if constexpr (L::kWidth > 1) {
+        if (end < count) {
+            const int32_t q0 = count - L::kWidth;
+            const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
+            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, end - q0};
+            if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
+        }
+    }
+    for (; q + L::kWidth <= end; q += L::kWidth) {
         const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, step, is};
         const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro, 0};
         if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
     }
-    if constexpr (L::kWidth > 1) {
-        if (q < count && count >= L::kWidth) {
-            const int32_t q0 = count - L::kWidth;
-            const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
-            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, q - q0};
-            q = count;
-            return RunComplex<typename L::V>(p, in, out);
-        }
-    }
+    if (end < count) q = count;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafComplexFrom[P::kRadix](inRe, inIm, outRe, outIm, is, os, count, q);
     } else if constexpr (L::kWidth > 1) {
@@ -275,20 +292,21 @@ template <class L, bool Unit, class P>
 Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
                     int32_t& q) {
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    for (; q + L::kWidth <= count; q += L::kWidth) {
+    const int32_t end = TailFirst<L>(q, count, 0);
+    if constexpr (L::kWidth > 1) {
+        if (end < count) {
+            const int32_t q0 = count - L::kWidth;
+            const RealIn<L, Unit> x{in + q0 * is, step, is};
+            const RealOut<L, true> y{out + q0 * ro, os, ro, end - q0};
+            if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
+        }
+    }
+    for (; q + L::kWidth <= end; q += L::kWidth) {
         const RealIn<L, Unit> x{in + q * is, step, is};
         const RealOut<L> y{out + q * ro, os, ro, 0};
         if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
     }
-    if constexpr (L::kWidth > 1) {
-        if (q < count && count >= L::kWidth) {
-            const int32_t q0 = count - L::kWidth;
-            const RealIn<L, Unit> x{in + q0 * is, step, is};
-            const RealOut<L, true> y{out + q0 * ro, os, ro, q - q0};
-            q = count;
-            return RunReal<typename L::V>(p, x, y);
-        }
-    }
+    if (end < count) q = count;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafRealFrom[P::kRadix](in, out, is, os, count, q);
     } else if constexpr (L::kWidth > 1) {
@@ -302,25 +320,24 @@ template <class L, bool Pair, class P>
 Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                           ptrdiff_t s, int32_t m, int32_t& j) {
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    for (; j + L::kWidth <= m; j += L::kWidth) {
+    // Columns from 1 on have twiddles, so the tail block may start at 1.
+    const int32_t end = TailFirst<L>(j, m, 1);
+    if constexpr (L::kWidth > 1) {
+        if (end < m) {
+            const int32_t j0 = m - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(j0, m);
+            const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j0 * s, im + j0 * s, ms, s}, twRe + w, twIm + w, m - 1};
+            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, end - j0};
+            if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+        }
+    }
+    for (; j + L::kWidth <= end; j += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(j, m);
         const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, m - 1};
         const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
-    // The rest as one block that ends at column m-1; its first lanes repeat finished columns (all
-    // at 1 or above, so their twiddles exist) and are not stored. In place this is sound: a block
-    // loads all its inputs before it stores.
-    if constexpr (L::kWidth > 1) {
-        if (j < m && m - L::kWidth >= 1) {
-            const int32_t j0 = m - L::kWidth;
-            const ptrdiff_t w = ColumnTwiddles(j0, m);
-            const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j0 * s, im + j0 * s, ms, s}, twRe + w, twIm + w, m - 1};
-            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, j - j0};
-            j = m;
-            return RunComplex<typename L::V>(p, in, out);
-        }
-    }
+    if (end < m) j = m;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (j < m) BaselineCodelets().combineComplexFrom[P::kRadix](re, im, twRe, twIm, s, m, j);
     } else if constexpr (L::kWidth > 1) {
@@ -335,7 +352,19 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
                         int32_t m, int32_t pairs, int32_t& k) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    for (; k + L::kWidth <= pairs + 1; k += L::kWidth) {
+    const int32_t end = TailFirst<L>(k, pairs + 1, 1);
+    if constexpr (L::kWidth > 1) {
+        if (end <= pairs) {
+            const int32_t k0 = pairs + 1 - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(k0, m);
+            double* front = data + k0 * s;
+            double* back = data + (m - k0) * s;
+            const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
+            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, end - k0};
+            if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+        }
+    }
+    for (; k + L::kWidth <= end; k += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(k, m);
         double* front = data + k * s;
         double* back = data + (m - k) * s;
@@ -343,18 +372,7 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
         const PairColumnOut<L, Unit> out{front, back, ms, s, r, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
-    if constexpr (L::kWidth > 1) {
-        if (k <= pairs && pairs + 1 - L::kWidth >= 1) {
-            const int32_t k0 = pairs + 1 - L::kWidth;
-            const ptrdiff_t w = ColumnTwiddles(k0, m);
-            double* front = data + k0 * s;
-            double* back = data + (m - k0) * s;
-            const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
-            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, k - k0};
-            k = pairs + 1;
-            return RunComplex<typename L::V>(p, in, out);
-        }
-    }
+    if (end <= pairs) k = pairs + 1;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (k <= pairs) BaselineCodelets().combineRealFrom[P::kRadix](data, twRe, twIm, s, m, k);
     } else if constexpr (L::kWidth > 1) {
