@@ -23,23 +23,23 @@ int32_t SmallestPrimitiveRoot(int32_t p) {
     }
 }
 
-// The product of a transformed element by the kernel, conjugated: a forward transform of the
-// conjugate is the conjugate of the inverse, so the second pass needs no inverse kernel.
-inline void ConjugateProduct(double& u, double& v, double c, double d) {
-    const double re = c * u - d * v;
-    const double im = -(d * u) - c * v;
-    u = re;
-    v = im;
-}
-
 // Interleaved pairs are written with one 16-byte store: the transforms read them that way, and a
 // wide load of two narrow stores still in flight would stall.
 inline void PutPair(double* p, double re, double im) { _mm_storeu_pd(p, _mm_set_pd(im, re)); }
 
-inline void ConjugateProductPair(double* p, double c, double d) {
-    double u = p[0], v = p[1];
-    ConjugateProduct(u, v, c, d);
-    PutPair(p, u, v);
+// The product of each transformed element (u, v) by the kernel (c, d), conjugated: a forward
+// transform of the conjugate is the conjugate of the inverse, so the second pass needs no inverse
+// kernel. The element is (c u - d v, -(d u) - c v); with the kernel laid out as (c, -c, d, d) it is
+// (u, v) (c, -c) - (v, u) (d, d), whose second lane -(c v) - d u is the same sum of the same two
+// products.
+inline void ConjugateProducts(double* x, const double* k, int32_t n) {
+    for (int32_t q = 0; q < n; ++q) {
+        const __m128d uv = _mm_loadu_pd(x + 2 * q);
+        const __m128d vu = _mm_shuffle_pd(uv, uv, 1);
+        const __m128d a = _mm_mul_pd(uv, _mm_loadu_pd(k + 4 * q));
+        const __m128d b = _mm_mul_pd(vu, _mm_loadu_pd(k + 4 * q + 2));
+        _mm_storeu_pd(x + 2 * q, _mm_sub_pd(a, b));
+    }
 }
 
 }  // namespace
@@ -51,8 +51,9 @@ bool SetupRaderStage(FftStage* st, int32_t p) {
     st->raderScatter = static_cast<int32_t*>(PlainAlloc(static_cast<size_t>(p) * sizeof(int32_t)));
     st->raderKernelRe = static_cast<double*>(PlainAlloc(static_cast<size_t>(m) * sizeof(double)));
     st->raderKernelIm = static_cast<double*>(PlainAlloc(static_cast<size_t>(m) * sizeof(double)));
+    st->raderKernelPairs = static_cast<double*>(PlainAlloc(4 * static_cast<size_t>(m) * sizeof(double)));
     if (st->raderTable == nullptr || st->raderGather == nullptr || st->raderScatter == nullptr ||
-        st->raderKernelRe == nullptr || st->raderKernelIm == nullptr)
+        st->raderKernelRe == nullptr || st->raderKernelIm == nullptr || st->raderKernelPairs == nullptr)
         return false;
     const int32_t g = SmallestPrimitiveRoot(p);
     st->raderGather[0] = 0;
@@ -77,6 +78,12 @@ bool SetupRaderStage(FftStage* st, int32_t p) {
     }
     Status s = FftComplexForward(st->raderTable, cr, ci, st->raderKernelRe, st->raderKernelIm, 1, 1, m);
     s = MergeRelease(s, w.Release());
+    for (int32_t q = 0; q < m; ++q) {
+        double* k = st->raderKernelPairs + 4 * static_cast<ptrdiff_t>(q);
+        k[0] = st->raderKernelRe[q];
+        k[1] = -st->raderKernelRe[q];
+        k[2] = k[3] = st->raderKernelIm[q];
+    }
     return s == 0;
 }
 
@@ -86,6 +93,7 @@ void ReleaseRaderStage(FftStage* st) {
     PlainFree(st->raderScatter);
     PlainFree(st->raderKernelRe);
     PlainFree(st->raderKernelIm);
+    PlainFree(st->raderKernelPairs);
 }
 
 // The convolutions run on interleaved scratch (work holds 4 p f64), so that the transforms of
@@ -109,7 +117,7 @@ Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const doubl
         PutPair(a + 2 * q, ur, ui);
     }
     if (const Status s = FftComplexForward(st->raderTable, a, a + 1, b, b + 1, 2, 2, m)) return s;
-    for (int32_t q = 0; q < m; ++q) ConjugateProductPair(b + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
+    ConjugateProducts(b, st->raderKernelPairs, m);
     if (const Status s = FftComplexForward(st->raderTable, b, b + 1, a, a + 1, 2, 2, m)) return s;
     for (int32_t k = 1; k <= m; ++k) {
         const ptrdiff_t o = scatter[k] * ys;
@@ -145,7 +153,7 @@ Status RaderReal(const FftStage* st, int32_t p, const double* x, ptrdiff_t xs, d
         PutPair(e + 2 * k, re, im);
         PutPair(e + 2 * (m - k), re, -im);
     }
-    for (int32_t q = 0; q < m; ++q) ConjugateProductPair(e + 2 * q, st->raderKernelRe[q], st->raderKernelIm[q]);
+    ConjugateProducts(e, st->raderKernelPairs, m);
     if (const Status s = FftComplexForward(st->raderTable, e, e + 1, t, t + 1, 2, 2, m)) return s;
     for (int32_t k = 1; k <= m; ++k) {
         const int32_t j = scatter[k];
