@@ -420,10 +420,82 @@ Status RealLeafForm(const P& p, const double* in, double* out, ptrdiff_t is, ptr
     return RealLeafLoop<L, false>(p, in, out, is, os, count, q);
 }
 
+// Combines whose rows lie far apart (the upper levels of long transforms) run in chunks of
+// kChunk columns copied into a buffer: rows a power of two apart would fall into one cache set, and
+// every block would fetch its rows again from far out. The arithmetic is the same, on the copies.
+// The copies move values in the widths the kernels load and store them, so that no load straddles
+// stores of another width.
+inline constexpr int32_t kChunk = 16;
+inline constexpr ptrdiff_t kChunkedRows = 512;  // f64 between rows from which combines go through the buffer
+
+// Interleaved complex data at unit complex stride (s = 2): columns from..(whole chunks) of a
+// complex combine. Returns the first column not done.
+template <class L, class P>
+int32_t ComplexCombineChunks(const P& p, double* data, const double* twRe, const double* twIm, int32_t m,
+                             int32_t from) {
+    constexpr int32_t R = P::kRadix, C = kChunk;
+    const ptrdiff_t ms = 2 * static_cast<ptrdiff_t>(m);
+    double buf[R * 2 * C];
+    int32_t j0 = from;
+    for (; j0 + C <= m; j0 += C) {
+        for (int32_t i = 0; i < R; ++i)
+            for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(buf + i * 2 * C + c, _mm_loadu_pd(data + i * ms + 2 * j0 + c));
+        for (int32_t j = 0; j < C; j += L::kWidth) {
+            const ptrdiff_t w = ColumnTwiddles(j0 + j, m);
+            const TwiddledIn<L, ComplexIn<L, true>> in{{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2}, twRe + w, twIm + w, m - 1};
+            const ComplexOut<L, true> out{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2, 0};
+            RunComplex<typename L::V>(p, in, out);
+        }
+        for (int32_t i = 0; i < R; ++i)
+            for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(data + i * ms + 2 * j0 + c, _mm_loadu_pd(buf + i * 2 * C + c));
+    }
+    return j0;
+}
+
+// Unit stride: column pairs from..(whole chunks) of a real combine; a chunk's buffer row holds the
+// front columns k0..k0+C-1 and behind them the back columns m-k0-C+1..m-k0. Returns the first pair
+// not done.
+template <class L, class P>
+int32_t RealCombineChunks(const P& p, double* data, const double* twRe, const double* twIm, int32_t m,
+                          int32_t pairs, int32_t from) {
+    constexpr int32_t R = P::kRadix, C = kChunk, W = L::kWidth;
+    const ptrdiff_t ms = m;
+    double buf[R * 2 * C];
+    int32_t k0 = from;
+    for (; k0 + C - 1 <= pairs; k0 += C) {
+        const ptrdiff_t back = m - k0 - C + 1;
+        for (int32_t i = 0; i < R; ++i) {
+            for (int32_t c = 0; c < C; c += W) {
+                L::StoreUnit(buf + i * 2 * C + c, L::LoadUnit(data + i * ms + k0 + c));
+                L::StoreUnit(buf + i * 2 * C + C + c, L::LoadUnit(data + i * ms + back + c));
+            }
+        }
+        for (int32_t k = 0; k < C; k += W) {
+            const ptrdiff_t w = ColumnTwiddles(k0 + k, m);
+            double* front = buf + k;
+            double* mirror = buf + 2 * C - 1 - k;
+            const TwiddledIn<L, PairColumnIn<L, true>> in{{front, mirror, 2 * C, 1}, twRe + w, twIm + w, m - 1};
+            const PairColumnOut<L, true> out{front, mirror, 2 * C, 1, R, 0};
+            RunComplex<typename L::V>(p, in, out);
+        }
+        for (int32_t i = 0; i < R; ++i) {
+            for (int32_t c = 0; c < C; c += W) {
+                L::StoreUnit(data + i * ms + k0 + c, L::LoadUnit(buf + i * 2 * C + c));
+                L::StoreUnit(data + i * ms + back + c, L::LoadUnit(buf + i * 2 * C + C + c));
+            }
+        }
+    }
+    return k0;
+}
+
 template <class L, class P>
 Status ComplexCombineColumns(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                              ptrdiff_t s, int32_t m, int32_t from) {
     int32_t j = from;
+    if constexpr (L::kWidth > 1 && P::kRadix > 0) {
+        if (im == re + 1 && s == 2 && 2 * static_cast<ptrdiff_t>(m) >= kChunkedRows)
+            j = ComplexCombineChunks<L>(p, re, twRe, twIm, m, j);
+    }
     if constexpr (L::kWidth > 1) {
         if (im == re + 1) return ComplexCombineLoop<L, true>(p, re, im, twRe, twIm, s, m, j);
     }
@@ -444,6 +516,9 @@ template <class L, class P>
 Status RealCombinePairsFrom(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
                             int32_t m, int32_t from) {
     int32_t k = from;
+    if constexpr (L::kWidth > 1 && P::kRadix > 0) {
+        if (s == 1 && m >= kChunkedRows) k = RealCombineChunks<L>(p, data, twRe, twIm, m, (m - 1) / 2, k);
+    }
     if constexpr (L::kWidth > 1) {
         if (s == 1) return RealCombinePairs<L, true>(p, data, twRe, twIm, s, m, (m - 1) / 2, k);
     }
