@@ -107,22 +107,41 @@ Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const doubl
     const int32_t* scatter = st->raderScatter;
     double *a = work, *b = work + 2 * static_cast<ptrdiff_t>(m);
     const double x0r = xr[0], x0i = xi[0];
-    // Output 0 sums the inputs in gather order, as the gather goes.
+    // Output 0 sums the inputs in gather order, as the gather goes. Interleaved data move as pairs:
+    // the sum of pairs is the two sums, and (t_re + x0_re, x0_im - t_im) is x0 plus (t_re, -t_im).
+    const bool pairs = xi == xr + 1 && yi == yr + 1;
     double sr = x0r, si = x0i;
-    for (int32_t q = 0; q < m; ++q) {
-        const ptrdiff_t g = gather[q + 1] * xs;
-        const double ur = xr[g], ui = xi[g];
-        sr += ur;
-        si += ui;
-        PutPair(a + 2 * q, ur, ui);
+    if (pairs) {
+        __m128d sum = _mm_loadu_pd(xr);
+        for (int32_t q = 0; q < m; ++q) {
+            const __m128d u = _mm_loadu_pd(xr + gather[q + 1] * xs);
+            sum = _mm_add_pd(sum, u);
+            _mm_storeu_pd(a + 2 * q, u);
+        }
+        sr = _mm_cvtsd_f64(sum);
+        si = _mm_cvtsd_f64(_mm_unpackhi_pd(sum, sum));
+    } else {
+        for (int32_t q = 0; q < m; ++q) {
+            const ptrdiff_t g = gather[q + 1] * xs;
+            const double ur = xr[g], ui = xi[g];
+            sr += ur;
+            si += ui;
+            PutPair(a + 2 * q, ur, ui);
+        }
     }
     if (const Status s = FftComplexForward(st->raderTable, a, a + 1, b, b + 1, 2, 2, m)) return s;
     ConjugateProducts(b, st->raderKernelPairs, m);
     if (const Status s = FftComplexForward(st->raderTable, b, b + 1, a, a + 1, 2, 2, m)) return s;
-    for (int32_t k = 1; k <= m; ++k) {
-        const ptrdiff_t o = scatter[k] * ys;
-        yr[o] = a[2 * (k - 1)] + x0r;
-        yi[o] = x0i - a[2 * (k - 1) + 1];
+    if (pairs) {
+        const __m128d x0 = _mm_set_pd(x0i, x0r), conj = _mm_set_pd(-0.0, 0.0);
+        for (int32_t k = 1; k <= m; ++k)
+            _mm_storeu_pd(yr + scatter[k] * ys, _mm_add_pd(x0, _mm_xor_pd(_mm_loadu_pd(a + 2 * (k - 1)), conj)));
+    } else {
+        for (int32_t k = 1; k <= m; ++k) {
+            const ptrdiff_t o = scatter[k] * ys;
+            yr[o] = a[2 * (k - 1)] + x0r;
+            yi[o] = x0i - a[2 * (k - 1) + 1];
+        }
     }
     yr[0] = sr;
     yi[0] = si;
