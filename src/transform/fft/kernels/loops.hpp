@@ -46,6 +46,33 @@ struct ComplexIn {
 
 // Masked: the lanes below `skip` repeat transforms already done and are not stored (the last
 // block of a loop, moved back so that it ends with the last transform).
+// A short leaf's input: lane i reads the sub-transform at offset o[i] (see ShortLeaf).
+template <class L, bool Pair>
+struct OffsetComplexIn {
+    using V = typename L::V;
+    const double* re;
+    const double* im;
+    ptrdiff_t step;
+    const ptrdiff_t* o;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        if constexpr (Pair) {
+            L::LoadPairAt(re + j * step, o, r, i);
+        } else {
+            r = L::LoadAt(re + j * step, o);
+            i = L::LoadAt(im + j * step, o);
+        }
+    }
+};
+
+template <class L>
+struct OffsetRealIn {
+    using V = typename L::V;
+    const double* p;
+    ptrdiff_t step;
+    const ptrdiff_t* o;
+    TW_FFT_INLINE void R(int32_t j, V& x) const { x = L::LoadAt(p + j * step, o); }
+};
+
 template <class L, bool Pair, bool Masked = false>
 struct ComplexOut {
     using V = typename L::V;
@@ -259,11 +286,44 @@ inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
     }
 }
 
+// A leaf of fewer sub-transforms than the widest lanes (2 or 3 of 4) runs as one block whose first
+// W - count lanes repeat sub-transform 0 and are not stored: lane i reads sub-transform
+// max(0, i - skip) and writes where sub-transform i - skip goes. Only the inlined radices take it
+// (the outlined ones would need one more copy each of their large blocks).
+template <class L, class P>
+constexpr bool ShortLeafFits() {
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest> && P::kRadix > 0)
+        return !P::kOutlined;
+    else
+        return false;
+}
+template <class L, class P>
+constexpr bool kShortLeaf = ShortLeafFits<L, P>();
+
+template <class L>
+struct ShortLeafLanes {
+    int32_t skip;
+    ptrdiff_t o[L::kWidth];
+    ShortLeafLanes(int32_t count, ptrdiff_t lane) : skip(L::kWidth - count) {
+        for (int32_t i = 0; i < L::kWidth; ++i) o[i] = (i > skip ? i - skip : 0) * lane;
+    }
+};
+
 // Sub-transforms q0..q1-1 of a leaf: q reads in[(q + j count) inStride] and writes
 // out[(q r + k) outStride]. Returns the first sub-transform not done.
 template <class L, bool Pair, class P>
 Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
                        ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t& q) {
+    if constexpr (kShortLeaf<L, P>) {
+        if (q == 0 && count >= 2 && count < L::kWidth) {
+            const ShortLeafLanes<L> lanes(count, is);
+            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os, back = lanes.skip * ro;
+            const OffsetComplexIn<L, Pair> in{inRe, inIm, static_cast<ptrdiff_t>(count) * is, lanes.o};
+            const ComplexOut<L, Pair, true> out{outRe - back, outIm - back, os, ro, lanes.skip};
+            q = count;
+            return RunComplex<typename L::V>(p, in, out);
+        }
+    }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
     const int32_t end = TailFirst<L>(q, count, 0);
     if constexpr (L::kWidth > 1) {
@@ -291,6 +351,16 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
 template <class L, bool Unit, class P>
 Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
                     int32_t& q) {
+    if constexpr (kShortLeaf<L, P>) {
+        if (q == 0 && count >= 2 && count < L::kWidth) {
+            const ShortLeafLanes<L> lanes(count, is);
+            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os;
+            const OffsetRealIn<L> x{in, static_cast<ptrdiff_t>(count) * is, lanes.o};
+            const RealOut<L, true> y{out - lanes.skip * ro, os, ro, lanes.skip};
+            q = count;
+            return RunReal<typename L::V>(p, x, y);
+        }
+    }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
     const int32_t end = TailFirst<L>(q, count, 0);
     if constexpr (L::kWidth > 1) {
