@@ -1,7 +1,7 @@
 // Rader's algorithm for a prime stage p: the DFT at the indices other than 0 is a cyclic
 // convolution of length p-1 in the order of the powers of a primitive root, carried out by two
 // forward transforms on a shared table of length p-1.
-#include <emmintrin.h>
+#include <immintrin.h>
 
 #include "transform/fft/generic_dft.hpp"
 #include "transform/fft/table_internal.hpp"
@@ -32,14 +32,40 @@ inline void PutPair(double* p, double re, double im) { _mm_storeu_pd(p, _mm_set_
 // kernel. The element is (c u - d v, -(d u) - c v); with the kernel laid out as (c, -c, d, d) it is
 // (u, v) (c, -c) - (v, u) (d, d), whose second lane -(c v) - d u is the same sum of the same two
 // products.
-inline void ConjugateProducts(double* x, const double* k, int32_t n) {
-    for (int32_t q = 0; q < n; ++q) {
+void ConjugateProductsSse2(double* x, const double* k, int32_t n, int32_t q) {
+    for (; q < n; ++q) {
         const __m128d uv = _mm_loadu_pd(x + 2 * q);
         const __m128d vu = _mm_shuffle_pd(uv, uv, 1);
         const __m128d a = _mm_mul_pd(uv, _mm_loadu_pd(k + 4 * q));
         const __m128d b = _mm_mul_pd(vu, _mm_loadu_pd(k + 4 * q + 2));
         _mm_storeu_pd(x + 2 * q, _mm_sub_pd(a, b));
     }
+}
+
+// The same two elements at a time, lane for lane (no fused products).
+__attribute__((target("avx2"))) void ConjugateProductsAvx2(double* x, const double* k, int32_t n) {
+    int32_t q = 0;
+    for (; q + 2 <= n; q += 2) {
+        const __m256d uv = _mm256_loadu_pd(x + 2 * q);
+        const __m256d vu = _mm256_permute_pd(uv, 5);
+        // Kernel values q and q+1: (c, -c) of both, then (d, d) of both.
+        const __m256d k0 = _mm256_loadu_pd(k + 4 * q), k1 = _mm256_loadu_pd(k + 4 * q + 4);
+        const __m256d cc = _mm256_permute2f128_pd(k0, k1, 0x20), dd = _mm256_permute2f128_pd(k0, k1, 0x31);
+        _mm256_storeu_pd(x + 2 * q, _mm256_sub_pd(_mm256_mul_pd(uv, cc), _mm256_mul_pd(vu, dd)));
+    }
+    ConjugateProductsSse2(x, k, n, q);
+}
+
+const bool kAvx2 = [] {
+    __builtin_cpu_init();
+    return __builtin_cpu_supports("avx2") != 0;
+}();
+
+inline void ConjugateProducts(double* x, const double* k, int32_t n) {
+    if (kAvx2)
+        ConjugateProductsAvx2(x, k, n);
+    else
+        ConjugateProductsSse2(x, k, n, 0);
 }
 
 }  // namespace
