@@ -13,7 +13,7 @@ SMOOTH_PRIMES = (2, 3, 5, 7, 11, 13, 17, 19, 29, 31, 37, 41, 43)
 RADER_LENGTHS = (53, 59, 61, 97, 2 * 53, 10 * 53, 53 * 53, 53 * 59, 23 * 23, 1009, 10007, 65537)
 # Combines whose rows lie far apart go through a buffer in chunks of columns: whole chunks only,
 # a partial last chunk, and the top levels of long transforms.
-CHUNKED_LENGTHS = (4000, 8192, 3 * 2 ** 16, 2 ** 18)
+CHUNKED_LENGTHS = (10000, 8192, 3 * 2 ** 16, 2 ** 18)
 WORST = {}
 
 

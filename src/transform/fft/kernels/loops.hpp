@@ -497,6 +497,7 @@ Status RealLeafForm(const P& p, const double* in, double* out, ptrdiff_t is, ptr
 // stores of another width.
 inline constexpr int32_t kChunk = 16;
 inline constexpr ptrdiff_t kChunkedRows = 512;  // f64 between rows from which combines go through the buffer
+inline constexpr int32_t kChunkedRadix = 8;     // fewer rows share the cache sets without harm
 
 // Interleaved complex data at unit complex stride (s = 2): columns from..(whole chunks) of a
 // complex combine. Returns the first column not done.
@@ -562,7 +563,7 @@ template <class L, class P>
 Status ComplexCombineColumns(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                              ptrdiff_t s, int32_t m, int32_t from) {
     int32_t j = from;
-    if constexpr (L::kWidth > 1 && P::kRadix > 0) {
+    if constexpr (L::kWidth > 1 && P::kRadix >= kChunkedRadix) {
         if (im == re + 1 && s == 2 && 2 * static_cast<ptrdiff_t>(m) >= kChunkedRows)
             j = ComplexCombineChunks<L>(p, re, twRe, twIm, m, j);
     }
@@ -586,7 +587,7 @@ template <class L, class P>
 Status RealCombinePairsFrom(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
                             int32_t m, int32_t from) {
     int32_t k = from;
-    if constexpr (L::kWidth > 1 && P::kRadix > 0) {
+    if constexpr (L::kWidth > 1 && P::kRadix >= kChunkedRadix) {
         if (s == 1 && m >= kChunkedRows) k = RealCombineChunks<L>(p, data, twRe, twIm, m, (m - 1) / 2, k);
     }
     if constexpr (L::kWidth > 1) {
