@@ -54,20 +54,20 @@ struct Avx2Lanes {
         re = _mm256_unpacklo_pd(a, b);
         im = _mm256_unpackhi_pd(a, b);
     }
-    // Only the lanes from skip on (see lanes.hpp); the last lane is always written.
-    static void StoreFrom(double* p, ptrdiff_t lane, V v, int32_t skip) {
+    // Only the lanes whose bits are set in `keep` (see lanes.hpp).
+    static void StoreKeep(double* p, ptrdiff_t lane, V v, int32_t keep) {
         const __m128d lo = _mm256_castpd256_pd128(v), hi = _mm256_extractf128_pd(v, 1);
-        if (skip <= 0) _mm_storel_pd(p, lo);
-        if (skip <= 1) _mm_storeh_pd(p + lane, lo);
-        if (skip <= 2) _mm_storel_pd(p + 2 * lane, hi);
-        _mm_storeh_pd(p + 3 * lane, hi);
+        if (keep & 1) _mm_storel_pd(p, lo);
+        if (keep & 2) _mm_storeh_pd(p + lane, lo);
+        if (keep & 4) _mm_storel_pd(p + 2 * lane, hi);
+        if (keep & 8) _mm_storeh_pd(p + 3 * lane, hi);
     }
-    static void StorePairFrom(double* p, ptrdiff_t lane, V re, V im, int32_t skip) {
+    static void StorePairKeep(double* p, ptrdiff_t lane, V re, V im, int32_t keep) {
         const __m256d a = _mm256_unpacklo_pd(re, im), b = _mm256_unpackhi_pd(re, im);
-        if (skip <= 0) _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
-        if (skip <= 1) _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
-        if (skip <= 2) _mm_storeu_pd(p + 2 * lane, _mm256_extractf128_pd(a, 1));
-        _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
+        if (keep & 1) _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
+        if (keep & 2) _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
+        if (keep & 4) _mm_storeu_pd(p + 2 * lane, _mm256_extractf128_pd(a, 1));
+        if (keep & 8) _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
     }
 };
 

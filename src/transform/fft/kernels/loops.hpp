@@ -44,9 +44,9 @@ struct ComplexIn {
     }
 };
 
-// Masked: the lanes below `skip` repeat transforms already done and are not stored (the last
-// block of a loop, moved back so that it ends with the last transform).
-// A short leaf's input: lane i reads the sub-transform at offset o[i] (see ShortLeaf).
+// Masked: only the lanes whose bits are set in `keep` are stored; the others repeat transforms
+// done elsewhere (the partial block of a loop, and short leaves).
+// A short leaf's input: lane i reads the sub-transform at offset o[i] (see ShortLeafLanes).
 template <class L, bool Pair>
 struct OffsetComplexIn {
     using V = typename L::V;
@@ -79,13 +79,13 @@ struct ComplexOut {
     double* re;
     double* im;
     ptrdiff_t step, lane;
-    int32_t skip;
+    int32_t keep;
     TW_FFT_INLINE void C(int32_t k, V r, V i) const {
         if constexpr (Masked && Pair) {
-            L::StorePairFrom(re + k * step, lane, r, i, skip);
+            L::StorePairKeep(re + k * step, lane, r, i, keep);
         } else if constexpr (Masked) {
-            L::StoreFrom(re + k * step, lane, r, skip);
-            L::StoreFrom(im + k * step, lane, i, skip);
+            L::StoreKeep(re + k * step, lane, r, keep);
+            L::StoreKeep(im + k * step, lane, i, keep);
         } else if constexpr (Pair) {
             L::StorePair(re + k * step, lane, r, i);
         } else {
@@ -136,10 +136,10 @@ struct RealOut {
     using V = typename L::V;
     double* p;
     ptrdiff_t step, lane;
-    int32_t skip;
+    int32_t keep;
     TW_FFT_INLINE void R(int32_t k, V y) const {
         if constexpr (Masked)
-            L::StoreFrom(p + k * step, lane, y, skip);
+            L::StoreKeep(p + k * step, lane, y, keep);
         else
             L::Store(p + k * step, lane, y);
     }
@@ -173,7 +173,7 @@ struct PairColumnOut {
     double* back;
     ptrdiff_t ms, s;
     int32_t r;
-    int32_t skip;
+    int32_t keep;
     TW_FFT_INLINE void C(int32_t q, V re, V im) const {
         double* a = front + q * ms;
         double* b = back + (r - 1 - q) * ms;
@@ -181,8 +181,8 @@ struct PairColumnOut {
         const bool low = 2 * q < r;
         const V f = low ? re : -im, g = low ? im : re;
         if constexpr (Masked) {
-            L::StoreFrom(a, s, f, skip);
-            L::StoreFrom(b, -s, g, skip);
+            L::StoreKeep(a, s, f, keep);
+            L::StoreKeep(b, -s, g, keep);
         } else if constexpr (Unit) {
             L::StoreUnit(a, f);
             L::StoreBack(b, g);
@@ -276,6 +276,12 @@ TW_FFT_INLINE Status RunReal(const P& p, const In& in, const Out& out) {
 // and reading them before that block has written them keeps the wide loads clear of recent
 // narrower stores. In place this is sound, since a block loads all its inputs before it stores.
 // Returns where the whole blocks end: `to` when there is no such tail block.
+// The lanes of the partial block that are stored: those from `skip` on.
+template <class L>
+inline int32_t TailLanes(int32_t skip) {
+    return ((1 << L::kWidth) - 1) & ~((1 << skip) - 1);
+}
+
 template <class L>
 inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
     if constexpr (L::kWidth == 1) {
@@ -286,10 +292,9 @@ inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
     }
 }
 
-// A leaf of fewer sub-transforms than the widest lanes (2 or 3 of 4) runs as one block whose first
-// W - count lanes repeat sub-transform 0 and are not stored: lane i reads sub-transform
-// max(0, i - skip) and writes where sub-transform i - skip goes. Only the inlined radices take it
-// (the outlined ones would need one more copy each of their large blocks).
+// A leaf of fewer sub-transforms than the widest lanes (2 or 3 of 4) runs as one block whose last
+// lanes repeat the last sub-transform and are not stored. Only the inlined radices take it (the
+// outlined ones would need one more copy each of their large blocks).
 template <class L, class P>
 constexpr bool ShortLeafFits() {
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest> && P::kRadix > 0)
@@ -302,10 +307,10 @@ constexpr bool kShortLeaf = ShortLeafFits<L, P>();
 
 template <class L>
 struct ShortLeafLanes {
-    int32_t skip;
+    int32_t keep;
     ptrdiff_t o[L::kWidth];
-    ShortLeafLanes(int32_t count, ptrdiff_t lane) : skip(L::kWidth - count) {
-        for (int32_t i = 0; i < L::kWidth; ++i) o[i] = (i > skip ? i - skip : 0) * lane;
+    ShortLeafLanes(int32_t count, ptrdiff_t lane) : keep((1 << count) - 1) {
+        for (int32_t i = 0; i < L::kWidth; ++i) o[i] = (i < count ? i : count - 1) * lane;
     }
 };
 
@@ -317,9 +322,9 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
     if constexpr (kShortLeaf<L, P>) {
         if (q == 0 && count >= 2 && count < L::kWidth) {
             const ShortLeafLanes<L> lanes(count, is);
-            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os, back = lanes.skip * ro;
+            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os;
             const OffsetComplexIn<L, Pair> in{inRe, inIm, static_cast<ptrdiff_t>(count) * is, lanes.o};
-            const ComplexOut<L, Pair, true> out{outRe - back, outIm - back, os, ro, lanes.skip};
+            const ComplexOut<L, Pair, true> out{outRe, outIm, os, ro, lanes.keep};
             q = count;
             return RunComplex<typename L::V>(p, in, out);
         }
@@ -330,7 +335,7 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
         if (end < count) {
             const int32_t q0 = count - L::kWidth;
             const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
-            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, end - q0};
+            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, TailLanes<L>(end - q0)};
             if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
         }
     }
@@ -356,7 +361,7 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
             const ShortLeafLanes<L> lanes(count, is);
             const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os;
             const OffsetRealIn<L> x{in, static_cast<ptrdiff_t>(count) * is, lanes.o};
-            const RealOut<L, true> y{out - lanes.skip * ro, os, ro, lanes.skip};
+            const RealOut<L, true> y{out, os, ro, lanes.keep};
             q = count;
             return RunReal<typename L::V>(p, x, y);
         }
@@ -367,7 +372,7 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
         if (end < count) {
             const int32_t q0 = count - L::kWidth;
             const RealIn<L, Unit> x{in + q0 * is, step, is};
-            const RealOut<L, true> y{out + q0 * ro, os, ro, end - q0};
+            const RealOut<L, true> y{out + q0 * ro, os, ro, TailLanes<L>(end - q0)};
             if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
         }
     }
@@ -397,7 +402,7 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
             const int32_t j0 = m - L::kWidth;
             const ptrdiff_t w = ColumnTwiddles(j0, m);
             const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j0 * s, im + j0 * s, ms, s}, twRe + w, twIm + w, m - 1};
-            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, end - j0};
+            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, TailLanes<L>(end - j0)};
             if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
         }
     }
@@ -430,7 +435,7 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
             double* front = data + k0 * s;
             double* back = data + (m - k0) * s;
             const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
-            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, end - k0};
+            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, TailLanes<L>(end - k0)};
             if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
         }
     }
