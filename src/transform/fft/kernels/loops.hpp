@@ -282,9 +282,22 @@ inline int32_t TailLanes(int32_t skip) {
     return ((1 << L::kWidth) - 1) & ~((1 << skip) - 1);
 }
 
-template <class L>
+// The leaves of the outlined radices leave their rest to the narrower lanes: a masked copy of
+// their large blocks would double the code that the loop runs through the instruction cache, for
+// a leaf that runs once. (Their combines run many partial blocks, one per call, and gain.)
+template <class L, class P, bool Leaf>
+constexpr bool TailBlocksFit() {
+    if constexpr (L::kWidth > 1)
+        return !(Leaf && P::kOutlined);
+    else
+        return false;
+}
+template <class L, class P, bool Leaf>
+constexpr bool kTailBlocks = TailBlocksFit<L, P, Leaf>();
+
+template <class L, class P, bool Leaf>
 inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
-    if constexpr (L::kWidth == 1) {
+    if constexpr (!kTailBlocks<L, P, Leaf>) {
         return to;
     } else {
         const int32_t rest = (to - from) % L::kWidth;
@@ -330,8 +343,8 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
         }
     }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    const int32_t end = TailFirst<L>(q, count, 0);
-    if constexpr (L::kWidth > 1) {
+    const int32_t end = TailFirst<L, P, true>(q, count, 0);
+    if constexpr (kTailBlocks<L, P, true>) {
         if (end < count) {
             const int32_t q0 = count - L::kWidth;
             const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
@@ -367,8 +380,8 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
         }
     }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    const int32_t end = TailFirst<L>(q, count, 0);
-    if constexpr (L::kWidth > 1) {
+    const int32_t end = TailFirst<L, P, true>(q, count, 0);
+    if constexpr (kTailBlocks<L, P, true>) {
         if (end < count) {
             const int32_t q0 = count - L::kWidth;
             const RealIn<L, Unit> x{in + q0 * is, step, is};
@@ -396,8 +409,8 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
                           ptrdiff_t s, int32_t m, int32_t& j) {
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
     // Columns from 1 on have twiddles, so the tail block may start at 1.
-    const int32_t end = TailFirst<L>(j, m, 1);
-    if constexpr (L::kWidth > 1) {
+    const int32_t end = TailFirst<L, P, false>(j, m, 1);
+    if constexpr (kTailBlocks<L, P, false>) {
         if (end < m) {
             const int32_t j0 = m - L::kWidth;
             const ptrdiff_t w = ColumnTwiddles(j0, m);
@@ -427,8 +440,8 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
                         int32_t m, int32_t pairs, int32_t& k) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    const int32_t end = TailFirst<L>(k, pairs + 1, 1);
-    if constexpr (L::kWidth > 1) {
+    const int32_t end = TailFirst<L, P, false>(k, pairs + 1, 1);
+    if constexpr (kTailBlocks<L, P, false>) {
         if (end <= pairs) {
             const int32_t k0 = pairs + 1 - L::kWidth;
             const ptrdiff_t w = ColumnTwiddles(k0, m);
