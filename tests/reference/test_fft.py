@@ -10,7 +10,10 @@ from twanlys import lowlevel as tw
 lib = tw.lib
 EPS = 2.0 ** -52
 SMOOTH_PRIMES = (2, 3, 5, 7, 11, 13, 17, 19, 29, 31, 37, 41, 43)
-RADER_LENGTHS = (53, 59, 61, 97, 2 * 53, 53 * 53, 23 * 23, 1009, 10007, 65537)
+RADER_LENGTHS = (53, 59, 61, 97, 2 * 53, 10 * 53, 53 * 53, 53 * 59, 23 * 23, 1009, 10007, 65537)
+# Combines whose rows lie far apart go through a buffer in chunks of columns: whole chunks only,
+# a partial last chunk, and the top levels of long transforms.
+CHUNKED_LENGTHS = (10000, 8192, 3 * 2 ** 16, 2 ** 18)
 WORST = {}
 
 
@@ -87,6 +90,11 @@ class Differential(unittest.TestCase):
     def test_odd_and_rader_lengths(self):
         rng = np.random.default_rng(2)
         for n in RADER_LENGTHS:
+            self.all_four(n, rng)
+
+    def test_chunked_combine_lengths(self):
+        rng = np.random.default_rng(5)
+        for n in CHUNKED_LENGTHS:
             self.all_four(n, rng)
 
     def test_random_smooth_lengths_to_2_20(self):

@@ -46,6 +46,9 @@ struct FftStage {
     // at (k-1)(m-1) + (j-1), so that neighbouring columns j are neighbours in memory.
     double* laneTwiddleRe;
     double* laneTwiddleIm;
+    // KindRader: the kernel once more as (c, -c, d, d) per value, the factors of the conjugating
+    // product in the order one vector of an interleaved element takes them.
+    double* raderKernelPairs;
 };
 
 struct FftTable {

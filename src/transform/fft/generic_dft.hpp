@@ -24,8 +24,11 @@ inline size_t GenericScratch(int32_t p) { return 8 * static_cast<size_t>(p); }
 Status OddComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
                   double* yi, double* work);
 Status OddReal(const FftStage* st, int32_t p, const double* x, double* y, double* work);
-Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
-                    double* yi, double* work);
-Status RaderReal(const FftStage* st, int32_t p, const double* x, double* y, double* work);
+// Rader's DFT reads input j at x[j xs] and writes output k to y[k ys] (x and y apart); work holds
+// 4 p f64.
+Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, ptrdiff_t xs,
+                    double* yr, double* yi, ptrdiff_t ys, double* work);
+Status RaderReal(const FftStage* st, int32_t p, const double* x, ptrdiff_t xs, double* y, ptrdiff_t ys,
+                 double* work);
 
 }  // namespace tw::fft

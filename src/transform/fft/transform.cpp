@@ -12,11 +12,11 @@ namespace fft {
 
 Status GenericDft::Complex(const double* xr, const double* xi, double* yr, double* yi) const {
     return kind == KindOdd ? OddComplex(stage, radix, xr, xi, yr, yi, work)
-                           : RaderComplex(stage, radix, xr, xi, yr, yi, work);
+                           : RaderComplex(stage, radix, xr, xi, 1, yr, yi, 1, work);
 }
 
 Status GenericDft::Real(const double* x, double* y) const {
-    return kind == KindOdd ? OddReal(stage, radix, x, y, work) : RaderReal(stage, radix, x, y, work);
+    return kind == KindOdd ? OddReal(stage, radix, x, y, work) : RaderReal(stage, radix, x, 1, y, 1, work);
 }
 
 Status OddComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
@@ -104,11 +104,39 @@ Status WithGeneric(const FftTable* t, int32_t i, F f) {
     return MergeRelease(s, scratch.Release());
 }
 
+// A Rader leaf runs its sub-transforms where they stand: sub-transform q reads at the stride
+// count si from in + q si and writes p values at so from out + q p so.
+Status RaderLeaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
+    const int32_t p = t->factors[i];
+    Scratch<double> scratch;
+    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p))) return s;
+    Status s = 0;
+    for (int32_t q = 0; q < count && s == 0; ++q)
+        s = RaderReal(t->stages[i], p, in.p + q * si, count * si, out.p + static_cast<ptrdiff_t>(q) * p * so, so,
+                      scratch.get());
+    return MergeRelease(s, scratch.Release());
+}
+
+Status RaderLeaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff_t si, ptrdiff_t so,
+                 int32_t count) {
+    const int32_t p = t->factors[i];
+    Scratch<double> scratch;
+    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p))) return s;
+    Status s = 0;
+    for (int32_t q = 0; q < count && s == 0; ++q) {
+        const ptrdiff_t o = static_cast<ptrdiff_t>(q) * p * so;
+        s = RaderComplex(t->stages[i], p, in.re + q * si, in.im + q * si, count * si, out.re + o, out.im + o, so,
+                         scratch.get());
+    }
+    return MergeRelease(s, scratch.Release());
+}
+
 Status Leaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
     if (t->kinds[i] == KindCodelet) {
         t->leafReal[i](in.p, out.p, si, so, count);
         return 0;
     }
+    if (t->kinds[i] == KindRader) return RaderLeaf(t, i, in, out, si, so, count);
     return WithGeneric(t, i, [&](GenericDft& d) {
         return sse2::RealLeafForm<sse2::ScalarLanes>(d, in.p, out.p, si, so, count);
     });
@@ -120,6 +148,7 @@ Status Leaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff
         t->leafComplex[i](in.re, in.im, out.re, out.im, si, so, count);
         return 0;
     }
+    if (t->kinds[i] == KindRader) return RaderLeaf(t, i, in, out, si, so, count);
     return WithGeneric(t, i, [&](GenericDft& d) {
         return sse2::ComplexLeafForm<sse2::ScalarLanes>(d, in.re, in.im, out.re, out.im, si, so, count);
     });

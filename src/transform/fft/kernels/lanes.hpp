@@ -18,6 +18,7 @@
 #include <emmintrin.h>
 
 #include <cstddef>
+#include <cstdint>
 
 #ifndef TW_FFT_ISA
 #define TW_FFT_ISA sse2
@@ -72,6 +73,16 @@ struct Sse2Lanes {
     static void StorePair(double* p, ptrdiff_t lane, V re, V im) {
         _mm_storeu_pd(p, _mm_unpacklo_pd(re, im));
         _mm_storeu_pd(p + lane, _mm_unpackhi_pd(re, im));
+    }
+    // The stores of a block some of whose lanes repeat transforms done elsewhere: only the lanes
+    // whose bits are set in `keep` are written.
+    static void StoreKeep(double* p, ptrdiff_t lane, V v, int32_t keep) {
+        if (keep & 1) _mm_storel_pd(p, v);
+        if (keep & 2) _mm_storeh_pd(p + lane, v);
+    }
+    static void StorePairKeep(double* p, ptrdiff_t lane, V re, V im, int32_t keep) {
+        if (keep & 1) _mm_storeu_pd(p, _mm_unpacklo_pd(re, im));
+        if (keep & 2) _mm_storeu_pd(p + lane, _mm_unpackhi_pd(re, im));
     }
 };
 

@@ -44,6 +44,31 @@ struct Avx2Lanes {
         _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
         _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
     }
+    // Loads whose lanes 1 to 3 stand at the offsets o[1..3] (o[0] is 0), for blocks that repeat a
+    // transform in several lanes.
+    static V LoadAt(const double* p, const ptrdiff_t* o) { return _mm256_set_pd(p[o[3]], p[o[2]], p[o[1]], p[0]); }
+    static void LoadPairAt(const double* p, const ptrdiff_t* o, V& re, V& im) {
+        const __m256d a = _mm256_insertf128_pd(_mm256_castpd128_pd256(_mm_loadu_pd(p)), _mm_loadu_pd(p + o[2]), 1);
+        const __m256d b =
+            _mm256_insertf128_pd(_mm256_castpd128_pd256(_mm_loadu_pd(p + o[1])), _mm_loadu_pd(p + o[3]), 1);
+        re = _mm256_unpacklo_pd(a, b);
+        im = _mm256_unpackhi_pd(a, b);
+    }
+    // Only the lanes whose bits are set in `keep` (see lanes.hpp).
+    static void StoreKeep(double* p, ptrdiff_t lane, V v, int32_t keep) {
+        const __m128d lo = _mm256_castpd256_pd128(v), hi = _mm256_extractf128_pd(v, 1);
+        if (keep & 1) _mm_storel_pd(p, lo);
+        if (keep & 2) _mm_storeh_pd(p + lane, lo);
+        if (keep & 4) _mm_storel_pd(p + 2 * lane, hi);
+        if (keep & 8) _mm_storeh_pd(p + 3 * lane, hi);
+    }
+    static void StorePairKeep(double* p, ptrdiff_t lane, V re, V im, int32_t keep) {
+        const __m256d a = _mm256_unpacklo_pd(re, im), b = _mm256_unpackhi_pd(re, im);
+        if (keep & 1) _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
+        if (keep & 2) _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
+        if (keep & 4) _mm_storeu_pd(p + 2 * lane, _mm256_extractf128_pd(a, 1));
+        if (keep & 8) _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
+    }
 };
 
 }  // namespace tw::fft::TW_FFT_ISA

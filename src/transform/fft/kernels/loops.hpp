@@ -44,14 +44,49 @@ struct ComplexIn {
     }
 };
 
+// Masked: only the lanes whose bits are set in `keep` are stored; the others repeat transforms
+// done elsewhere (the partial block of a loop, and short leaves).
+// A short leaf's input: lane i reads the sub-transform at offset o[i] (see ShortLeafLanes).
 template <class L, bool Pair>
+struct OffsetComplexIn {
+    using V = typename L::V;
+    const double* re;
+    const double* im;
+    ptrdiff_t step;
+    const ptrdiff_t* o;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        if constexpr (Pair) {
+            L::LoadPairAt(re + j * step, o, r, i);
+        } else {
+            r = L::LoadAt(re + j * step, o);
+            i = L::LoadAt(im + j * step, o);
+        }
+    }
+};
+
+template <class L>
+struct OffsetRealIn {
+    using V = typename L::V;
+    const double* p;
+    ptrdiff_t step;
+    const ptrdiff_t* o;
+    TW_FFT_INLINE void R(int32_t j, V& x) const { x = L::LoadAt(p + j * step, o); }
+};
+
+template <class L, bool Pair, bool Masked = false>
 struct ComplexOut {
     using V = typename L::V;
     double* re;
     double* im;
     ptrdiff_t step, lane;
+    int32_t keep;
     TW_FFT_INLINE void C(int32_t k, V r, V i) const {
-        if constexpr (Pair) {
+        if constexpr (Masked && Pair) {
+            L::StorePairKeep(re + k * step, lane, r, i, keep);
+        } else if constexpr (Masked) {
+            L::StoreKeep(re + k * step, lane, r, keep);
+            L::StoreKeep(im + k * step, lane, i, keep);
+        } else if constexpr (Pair) {
             L::StorePair(re + k * step, lane, r, i);
         } else {
             L::Store(re + k * step, lane, r);
@@ -96,12 +131,18 @@ struct RealIn {
     }
 };
 
-template <class L>
+template <class L, bool Masked = false>
 struct RealOut {
     using V = typename L::V;
     double* p;
     ptrdiff_t step, lane;
-    TW_FFT_INLINE void R(int32_t k, V y) const { L::Store(p + k * step, lane, y); }
+    int32_t keep;
+    TW_FFT_INLINE void R(int32_t k, V y) const {
+        if constexpr (Masked)
+            L::StoreKeep(p + k * step, lane, y, keep);
+        else
+            L::Store(p + k * step, lane, y);
+    }
 };
 
 // The column pair (k, m-k) of a real combine as one complex column; lanes run over neighbouring
@@ -125,20 +166,24 @@ struct PairColumnIn {
 
 // Output q is X[k + q m]; below the middle it is stored as it is, above as the conjugate of its
 // mirror (r - q) m - k. The order of the two stores does not matter: they go to different columns.
-template <class L, bool Unit>
+template <class L, bool Unit, bool Masked = false>
 struct PairColumnOut {
     using V = typename L::V;
     double* front;
     double* back;
     ptrdiff_t ms, s;
     int32_t r;
+    int32_t keep;
     TW_FFT_INLINE void C(int32_t q, V re, V im) const {
         double* a = front + q * ms;
         double* b = back + (r - 1 - q) * ms;
         // Below the middle: re to the front, im to the back; above: re to the back, -im to the front.
         const bool low = 2 * q < r;
         const V f = low ? re : -im, g = low ? im : re;
-        if constexpr (Unit) {
+        if constexpr (Masked) {
+            L::StoreKeep(a, s, f, keep);
+            L::StoreKeep(b, -s, g, keep);
+        } else if constexpr (Unit) {
             L::StoreUnit(a, f);
             L::StoreBack(b, g);
         } else {
@@ -225,17 +270,94 @@ TW_FFT_INLINE Status RunReal(const P& p, const In& in, const Out& out) {
     }
 }
 
+// The loops below run transforms `from` to `to`-1 in blocks of the lanes' width. What does not
+// fill the last block runs first, as one block ending at `to`-1 that stores only its last lanes:
+// its other lanes repeat transforms that a later block does (they must lie at `lowest` or above),
+// and reading them before that block has written them keeps the wide loads clear of recent
+// narrower stores. In place this is sound, since a block loads all its inputs before it stores.
+// Returns where the whole blocks end: `to` when there is no such tail block.
+// The lanes of the partial block that are stored: those from `skip` on.
+template <class L>
+inline int32_t TailLanes(int32_t skip) {
+    return ((1 << L::kWidth) - 1) & ~((1 << skip) - 1);
+}
+
+// The leaves of the outlined radices leave their rest to the narrower lanes: a masked copy of
+// their large blocks would double the code that the loop runs through the instruction cache, for
+// a leaf that runs once. (Their combines run many partial blocks, one per call, and gain.)
+template <class L, class P, bool Leaf>
+constexpr bool TailBlocksFit() {
+    if constexpr (L::kWidth > 1)
+        return !(Leaf && P::kOutlined);
+    else
+        return false;
+}
+template <class L, class P, bool Leaf>
+constexpr bool kTailBlocks = TailBlocksFit<L, P, Leaf>();
+
+template <class L, class P, bool Leaf>
+inline int32_t TailFirst(int32_t from, int32_t to, int32_t lowest) {
+    if constexpr (!kTailBlocks<L, P, Leaf>) {
+        return to;
+    } else {
+        const int32_t rest = (to - from) % L::kWidth;
+        return rest != 0 && to - L::kWidth >= lowest ? to - rest : to;
+    }
+}
+
+// A leaf of fewer sub-transforms than the widest lanes (2 or 3 of 4) runs as one block whose last
+// lanes repeat the last sub-transform and are not stored. Only the inlined radices take it (the
+// outlined ones would need one more copy each of their large blocks).
+template <class L, class P>
+constexpr bool ShortLeafFits() {
+    if constexpr (std::is_same_v<typename L::Narrower, BaselineRest> && P::kRadix > 0)
+        return !P::kOutlined;
+    else
+        return false;
+}
+template <class L, class P>
+constexpr bool kShortLeaf = ShortLeafFits<L, P>();
+
+template <class L>
+struct ShortLeafLanes {
+    int32_t keep;
+    ptrdiff_t o[L::kWidth];
+    ShortLeafLanes(int32_t count, ptrdiff_t lane) : keep((1 << count) - 1) {
+        for (int32_t i = 0; i < L::kWidth; ++i) o[i] = (i < count ? i : count - 1) * lane;
+    }
+};
+
 // Sub-transforms q0..q1-1 of a leaf: q reads in[(q + j count) inStride] and writes
 // out[(q r + k) outStride]. Returns the first sub-transform not done.
 template <class L, bool Pair, class P>
 Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
                        ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t& q) {
+    if constexpr (kShortLeaf<L, P>) {
+        if (q == 0 && count >= 2 && count < L::kWidth) {
+            const ShortLeafLanes<L> lanes(count, is);
+            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os;
+            const OffsetComplexIn<L, Pair> in{inRe, inIm, static_cast<ptrdiff_t>(count) * is, lanes.o};
+            const ComplexOut<L, Pair, true> out{outRe, outIm, os, ro, lanes.keep};
+            q = count;
+            return RunComplex<typename L::V>(p, in, out);
+        }
+    }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    for (; q + L::kWidth <= count; q += L::kWidth) {
+    const int32_t end = TailFirst<L, P, true>(q, count, 0);
+    if constexpr (kTailBlocks<L, P, true>) {
+        if (end < count) {
+            const int32_t q0 = count - L::kWidth;
+            const ComplexIn<L, Pair> in{inRe + q0 * is, inIm + q0 * is, step, is};
+            const ComplexOut<L, Pair, true> out{outRe + q0 * ro, outIm + q0 * ro, os, ro, TailLanes<L>(end - q0)};
+            if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
+        }
+    }
+    for (; q + L::kWidth <= end; q += L::kWidth) {
         const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, step, is};
-        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro};
+        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro, 0};
         if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
     }
+    if (end < count) q = count;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafComplexFrom[P::kRadix](inRe, inIm, outRe, outIm, is, os, count, q);
     } else if constexpr (L::kWidth > 1) {
@@ -247,12 +369,32 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
 template <class L, bool Unit, class P>
 Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
                     int32_t& q) {
+    if constexpr (kShortLeaf<L, P>) {
+        if (q == 0 && count >= 2 && count < L::kWidth) {
+            const ShortLeafLanes<L> lanes(count, is);
+            const ptrdiff_t ro = static_cast<ptrdiff_t>(p.radix) * os;
+            const OffsetRealIn<L> x{in, static_cast<ptrdiff_t>(count) * is, lanes.o};
+            const RealOut<L, true> y{out, os, ro, lanes.keep};
+            q = count;
+            return RunReal<typename L::V>(p, x, y);
+        }
+    }
     const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
-    for (; q + L::kWidth <= count; q += L::kWidth) {
+    const int32_t end = TailFirst<L, P, true>(q, count, 0);
+    if constexpr (kTailBlocks<L, P, true>) {
+        if (end < count) {
+            const int32_t q0 = count - L::kWidth;
+            const RealIn<L, Unit> x{in + q0 * is, step, is};
+            const RealOut<L, true> y{out + q0 * ro, os, ro, TailLanes<L>(end - q0)};
+            if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
+        }
+    }
+    for (; q + L::kWidth <= end; q += L::kWidth) {
         const RealIn<L, Unit> x{in + q * is, step, is};
-        const RealOut<L> y{out + q * ro, os, ro};
+        const RealOut<L> y{out + q * ro, os, ro, 0};
         if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
     }
+    if (end < count) q = count;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (q < count) BaselineCodelets().leafRealFrom[P::kRadix](in, out, is, os, count, q);
     } else if constexpr (L::kWidth > 1) {
@@ -266,12 +408,24 @@ template <class L, bool Pair, class P>
 Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                           ptrdiff_t s, int32_t m, int32_t& j) {
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    for (; j + L::kWidth <= m; j += L::kWidth) {
+    // Columns from 1 on have twiddles, so the tail block may start at 1.
+    const int32_t end = TailFirst<L, P, false>(j, m, 1);
+    if constexpr (kTailBlocks<L, P, false>) {
+        if (end < m) {
+            const int32_t j0 = m - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(j0, m);
+            const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j0 * s, im + j0 * s, ms, s}, twRe + w, twIm + w, m - 1};
+            const ComplexOut<L, Pair, true> out{re + j0 * s, im + j0 * s, ms, s, TailLanes<L>(end - j0)};
+            if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+        }
+    }
+    for (; j + L::kWidth <= end; j += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(j, m);
         const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, m - 1};
-        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s};
+        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
+    if (end < m) j = m;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (j < m) BaselineCodelets().combineComplexFrom[P::kRadix](re, im, twRe, twIm, s, m, j);
     } else if constexpr (L::kWidth > 1) {
@@ -286,14 +440,27 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
                         int32_t m, int32_t pairs, int32_t& k) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    for (; k + L::kWidth <= pairs + 1; k += L::kWidth) {
+    const int32_t end = TailFirst<L, P, false>(k, pairs + 1, 1);
+    if constexpr (kTailBlocks<L, P, false>) {
+        if (end <= pairs) {
+            const int32_t k0 = pairs + 1 - L::kWidth;
+            const ptrdiff_t w = ColumnTwiddles(k0, m);
+            double* front = data + k0 * s;
+            double* back = data + (m - k0) * s;
+            const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
+            const PairColumnOut<L, Unit, true> out{front, back, ms, s, r, TailLanes<L>(end - k0)};
+            if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
+        }
+    }
+    for (; k + L::kWidth <= end; k += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(k, m);
         double* front = data + k * s;
         double* back = data + (m - k) * s;
         const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
-        const PairColumnOut<L, Unit> out{front, back, ms, s, r};
+        const PairColumnOut<L, Unit> out{front, back, ms, s, r, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
+    if (end <= pairs) k = pairs + 1;
     if constexpr (std::is_same_v<typename L::Narrower, BaselineRest>) {
         if (k <= pairs) BaselineCodelets().combineRealFrom[P::kRadix](data, twRe, twIm, s, m, k);
     } else if constexpr (L::kWidth > 1) {
@@ -309,7 +476,7 @@ Status RealCombineEdges(const P& p, double* data, const double* twRe, const doub
                         int32_t m) {
     const int32_t r = p.radix;
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
-    if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0}))
+    if (const Status st = RunReal<double>(p, RealIn<ScalarLanes, false>{data, ms, 0}, RealOut<ScalarLanes>{data, ms, 0, 0}))
         return st;
     if (m % 2 != 0) return 0;
     const ptrdiff_t w = ColumnTwiddles(m / 2, m);
@@ -341,10 +508,83 @@ Status RealLeafForm(const P& p, const double* in, double* out, ptrdiff_t is, ptr
     return RealLeafLoop<L, false>(p, in, out, is, os, count, q);
 }
 
+// Combines whose rows lie far apart (the upper levels of long transforms) run in chunks of
+// kChunk columns copied into a buffer: rows a power of two apart would fall into one cache set, and
+// every block would fetch its rows again from far out. The arithmetic is the same, on the copies.
+// The copies move values in the widths the kernels load and store them, so that no load straddles
+// stores of another width.
+inline constexpr int32_t kChunk = 16;
+inline constexpr ptrdiff_t kChunkedRows = 512;  // f64 between rows from which combines go through the buffer
+inline constexpr int32_t kChunkedRadix = 8;     // fewer rows share the cache sets without harm
+
+// Interleaved complex data at unit complex stride (s = 2): columns from..(whole chunks) of a
+// complex combine. Returns the first column not done.
+template <class L, class P>
+int32_t ComplexCombineChunks(const P& p, double* data, const double* twRe, const double* twIm, int32_t m,
+                             int32_t from) {
+    constexpr int32_t R = P::kRadix, C = kChunk;
+    const ptrdiff_t ms = 2 * static_cast<ptrdiff_t>(m);
+    double buf[R * 2 * C];
+    int32_t j0 = from;
+    for (; j0 + C <= m; j0 += C) {
+        for (int32_t i = 0; i < R; ++i)
+            for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(buf + i * 2 * C + c, _mm_loadu_pd(data + i * ms + 2 * j0 + c));
+        for (int32_t j = 0; j < C; j += L::kWidth) {
+            const ptrdiff_t w = ColumnTwiddles(j0 + j, m);
+            const TwiddledIn<L, ComplexIn<L, true>> in{{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2}, twRe + w, twIm + w, m - 1};
+            const ComplexOut<L, true> out{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2, 0};
+            RunComplex<typename L::V>(p, in, out);
+        }
+        for (int32_t i = 0; i < R; ++i)
+            for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(data + i * ms + 2 * j0 + c, _mm_loadu_pd(buf + i * 2 * C + c));
+    }
+    return j0;
+}
+
+// Unit stride: column pairs from..(whole chunks) of a real combine; a chunk's buffer row holds the
+// front columns k0..k0+C-1 and behind them the back columns m-k0-C+1..m-k0. Returns the first pair
+// not done.
+template <class L, class P>
+int32_t RealCombineChunks(const P& p, double* data, const double* twRe, const double* twIm, int32_t m,
+                          int32_t pairs, int32_t from) {
+    constexpr int32_t R = P::kRadix, C = kChunk, W = L::kWidth;
+    const ptrdiff_t ms = m;
+    double buf[R * 2 * C];
+    int32_t k0 = from;
+    for (; k0 + C - 1 <= pairs; k0 += C) {
+        const ptrdiff_t back = m - k0 - C + 1;
+        for (int32_t i = 0; i < R; ++i) {
+            for (int32_t c = 0; c < C; c += W) {
+                L::StoreUnit(buf + i * 2 * C + c, L::LoadUnit(data + i * ms + k0 + c));
+                L::StoreUnit(buf + i * 2 * C + C + c, L::LoadUnit(data + i * ms + back + c));
+            }
+        }
+        for (int32_t k = 0; k < C; k += W) {
+            const ptrdiff_t w = ColumnTwiddles(k0 + k, m);
+            double* front = buf + k;
+            double* mirror = buf + 2 * C - 1 - k;
+            const TwiddledIn<L, PairColumnIn<L, true>> in{{front, mirror, 2 * C, 1}, twRe + w, twIm + w, m - 1};
+            const PairColumnOut<L, true> out{front, mirror, 2 * C, 1, R, 0};
+            RunComplex<typename L::V>(p, in, out);
+        }
+        for (int32_t i = 0; i < R; ++i) {
+            for (int32_t c = 0; c < C; c += W) {
+                L::StoreUnit(data + i * ms + k0 + c, L::LoadUnit(buf + i * 2 * C + c));
+                L::StoreUnit(data + i * ms + back + c, L::LoadUnit(buf + i * 2 * C + C + c));
+            }
+        }
+    }
+    return k0;
+}
+
 template <class L, class P>
 Status ComplexCombineColumns(const P& p, double* re, double* im, const double* twRe, const double* twIm,
                              ptrdiff_t s, int32_t m, int32_t from) {
     int32_t j = from;
+    if constexpr (L::kWidth > 1 && P::kRadix >= kChunkedRadix) {
+        if (im == re + 1 && s == 2 && 2 * static_cast<ptrdiff_t>(m) >= kChunkedRows)
+            j = ComplexCombineChunks<L>(p, re, twRe, twIm, m, j);
+    }
     if constexpr (L::kWidth > 1) {
         if (im == re + 1) return ComplexCombineLoop<L, true>(p, re, im, twRe, twIm, s, m, j);
     }
@@ -356,7 +596,7 @@ Status ComplexCombineForm(const P& p, double* re, double* im, const double* twRe
                           ptrdiff_t s, int32_t m) {
     const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
     if (const Status st = RunComplex<double>(p, ComplexIn<ScalarLanes, false>{re, im, ms, 0},
-                                             ComplexOut<ScalarLanes, false>{re, im, ms, 0}))
+                                             ComplexOut<ScalarLanes, false>{re, im, ms, 0, 0}))
         return st;
     return ComplexCombineColumns<L>(p, re, im, twRe, twIm, s, m, 1);
 }
@@ -365,6 +605,9 @@ template <class L, class P>
 Status RealCombinePairsFrom(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
                             int32_t m, int32_t from) {
     int32_t k = from;
+    if constexpr (L::kWidth > 1 && P::kRadix >= kChunkedRadix) {
+        if (s == 1 && m >= kChunkedRows) k = RealCombineChunks<L>(p, data, twRe, twIm, m, (m - 1) / 2, k);
+    }
     if constexpr (L::kWidth > 1) {
         if (s == 1) return RealCombinePairs<L, true>(p, data, twRe, twIm, s, m, (m - 1) / 2, k);
     }
