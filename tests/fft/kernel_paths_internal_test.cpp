@@ -20,7 +20,8 @@ struct PathCase {
 };
 
 // Leaves of two or three sub-transforms, partial last blocks, combines whose rows lie far apart
-// (chunked, with and without a partial last chunk), Rader leaves and combines, nested Rader.
+// (chunked, with and without a partial last chunk), Rader leaves and combines, nested Rader, and
+// long transforms whose top-level sub-transforms run in groups.
 const PathCase kCases[] = {
     {20, "leaf 10 of 2"},         {48, "leaf 16 of 3"},
     {60, "leaf 10 of 3, radix-3 combine of 20 columns"},
@@ -33,6 +34,10 @@ const PathCase kCases[] = {
     {106, "Rader leaf of 2"},      {530, "Rader leaf of 10"},
     {53 * 59, "Rader combine over a Rader leaf"},
     {10007, "Rader three deep: 10007, 5003, 61"},
+    {100000, "top level of 10 in a group of 8 with leaves side by side, and 2 alone"},
+    {1 << 20, "radix-32 leaves side by side under four radix-32 levels"},
+    {71875, "group of 5 over radix-23 leaves: 4 in vector lanes, 1 alone"},
+    {127253, "group of 7 over Rader-53 leaves, one by one"},
 };
 
 struct Layout {

@@ -116,12 +116,25 @@ struct CodeletForms {
         ComplexCombineColumns<L>(CodeletDft<R>{}, re, im, twRe, twIm, s, m, from);
     }
 
+    template <int R>
+    static void RealLeafLanes(const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
+                              int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+        RealLeafLanesForm<L>(CodeletDft<R>{}, in, out, is, os, count, group, il, ol);
+    }
+    template <int R>
+    static void ComplexLeafLanes(const double* inRe, const double* inIm, double* outRe, double* outIm,
+                                 ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t group, ptrdiff_t il,
+                                 ptrdiff_t ol) {
+        ComplexLeafLanesForm<L>(CodeletDft<R>{}, inRe, inIm, outRe, outIm, is, os, count, group, il, ol);
+    }
+
     template <int... R>
     static void Put(CodeletTables& t, std::integer_sequence<int, R...>) {
         ((t.leafReal[R] = &RealLeaf<R>, t.combineReal[R] = &RealCombine<R>, t.leafComplex[R] = &ComplexLeaf<R>,
           t.combineComplex[R] = &ComplexCombine<R>, t.leafRealFrom[R] = &RealLeafFrom<R>,
           t.combineRealFrom[R] = &RealCombineFrom<R>, t.leafComplexFrom[R] = &ComplexLeafFrom<R>,
-          t.combineComplexFrom[R] = &ComplexCombineFrom<R>),
+          t.combineComplexFrom[R] = &ComplexCombineFrom<R>, t.leafRealLanes[R] = &RealLeafLanes<R>,
+          t.leafComplexLanes[R] = &ComplexLeafLanes<R>),
          ...);
     }
 };

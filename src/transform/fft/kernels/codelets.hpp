@@ -18,6 +18,13 @@ using FftComplexLeafFrom = void (*)(const double* inRe, const double* inIm, doub
 using FftComplexCombineFrom = void (*)(double* re, double* im, const double* twRe, const double* twIm,
                                        ptrdiff_t stride, int32_t m, int32_t from);
 
+// Leaves side by side: `group` leaves, leaf g at in + g inLane and out + g outLane.
+using FftRealLeafLanes = void (*)(const double* in, double* out, ptrdiff_t inStride, ptrdiff_t outStride,
+                                  int32_t count, int32_t group, ptrdiff_t inLane, ptrdiff_t outLane);
+using FftComplexLeafLanes = void (*)(const double* inRe, const double* inIm, double* outRe, double* outIm,
+                                     ptrdiff_t inStride, ptrdiff_t outStride, int32_t count, int32_t group,
+                                     ptrdiff_t inLane, ptrdiff_t outLane);
+
 struct CodeletTables {
     FftRealLeaf leafReal[kFftMaxRadix + 1];
     FftRealCombine combineReal[kFftMaxRadix + 1];
@@ -27,6 +34,8 @@ struct CodeletTables {
     FftRealCombineFrom combineRealFrom[kFftMaxRadix + 1];
     FftComplexLeafFrom leafComplexFrom[kFftMaxRadix + 1];
     FftComplexCombineFrom combineComplexFrom[kFftMaxRadix + 1];
+    FftRealLeafLanes leafRealLanes[kFftMaxRadix + 1];
+    FftComplexLeafLanes leafComplexLanes[kFftMaxRadix + 1];
 };
 
 // The narrower lanes of the widest vectors: the baseline tables' From entries.

@@ -508,6 +508,58 @@ Status RealLeafForm(const P& p, const double* in, double* out, ptrdiff_t is, ptr
     return RealLeafLoop<L, false>(p, in, out, is, os, count, q);
 }
 
+// `group` leaves side by side, leaf g at in + g inLane and out + g outLane, each as the form
+// above. The vector lanes run across the leaves, not across one leaf's sub-transforms: in a long
+// transform the leaves of neighbouring top-level sub-transforms read neighbouring inputs, so one
+// cache line feeds them all, where one leaf alone would use one value of each line it fetches.
+// Every DFT is the one the single leaves compute, so no result bit depends on the grouping.
+template <class L, class P>
+void RealLeafLanesForm(const P& p, const double* in, double* out, ptrdiff_t is, ptrdiff_t os, int32_t count,
+                       int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+    int32_t g = 0;
+    if constexpr (L::kWidth > 1) {
+        const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
+        const int32_t whole = group - group % L::kWidth;
+        for (int32_t q = 0; q < count && whole > 0; ++q) {
+            for (int32_t h = 0; h < whole; h += L::kWidth) {
+                const double* x = in + q * is + h * il;
+                double* y = out + q * ro + h * ol;
+                if (il == 1)
+                    RunReal<typename L::V>(p, RealIn<L, true>{x, step, 1}, RealOut<L>{y, os, ol, 0});
+                else
+                    RunReal<typename L::V>(p, RealIn<L, false>{x, step, il}, RealOut<L>{y, os, ol, 0});
+            }
+        }
+        g = whole;
+    }
+    for (; g < group; ++g) RealLeafForm<L>(p, in + g * il, out + g * ol, is, os, count);
+}
+
+template <class L, class P>
+void ComplexLeafLanesForm(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
+                          ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+    int32_t g = 0;
+    if constexpr (L::kWidth > 1) {
+        const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
+        const int32_t whole = group - group % L::kWidth;
+        const bool pair = inIm == inRe + 1 && outIm == outRe + 1;
+        for (int32_t q = 0; q < count && whole > 0; ++q) {
+            for (int32_t h = 0; h < whole; h += L::kWidth) {
+                const ptrdiff_t x = q * is + h * il, y = q * ro + h * ol;
+                if (pair)
+                    RunComplex<typename L::V>(p, ComplexIn<L, true>{inRe + x, inIm + x, step, il},
+                                              ComplexOut<L, true>{outRe + y, outIm + y, os, ol, 0});
+                else
+                    RunComplex<typename L::V>(p, ComplexIn<L, false>{inRe + x, inIm + x, step, il},
+                                              ComplexOut<L, false>{outRe + y, outIm + y, os, ol, 0});
+            }
+        }
+        g = whole;
+    }
+    for (; g < group; ++g)
+        ComplexLeafForm<L>(p, inRe + g * il, inIm + g * il, outRe + g * ol, outIm + g * ol, is, os, count);
+}
+
 // Combines whose rows lie far apart (the upper levels of long transforms) run in chunks of
 // kChunk columns copied into a buffer: rows a power of two apart would fall into one cache set, and
 // every block would fetch its rows again from far out. The arithmetic is the same, on the copies.
