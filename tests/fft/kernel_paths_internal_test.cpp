@@ -36,7 +36,8 @@ const PathCase kCases[] = {
     {10007, "Rader three deep: 10007, 5003, 61"},
     {100000, "top level of 10 in a group of 8 with leaves side by side, and 2 alone"},
     {1 << 20, "radix-32 leaves side by side under four radix-32 levels"},
-    {71875, "group of 5 over radix-23 leaves: 4 in vector lanes, 1 alone"},
+    {78125, "group of 5 over radix-5 leaves: 4 in vector lanes, 1 alone"},
+    {71875, "group of 5 over radix-23 leaves, one by one"},
     {127253, "group of 7 over Rader-53 leaves, one by one"},
 };
 
