@@ -177,8 +177,8 @@ Status Combine(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32
 }
 
 // Leaves side by side (see RealLeafLanesForm): leaf g reads from in + g il and writes to out + g ol.
-Status LeafLanes(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count,
-                 int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+Status LeafLanes(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so,
+                 int32_t count, int32_t group, ptrdiff_t il, ptrdiff_t ol) {
     if (t->kinds[i] == KindCodelet) {
         Codelets().leafRealLanes[t->factors[i]](in.p, out.p, si, so, count, group, il, ol);
         return 0;
@@ -191,7 +191,8 @@ Status LeafLanes(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_
 Status LeafLanes(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff_t si, ptrdiff_t so,
                  int32_t count, int32_t group, ptrdiff_t il, ptrdiff_t ol) {
     if (t->kinds[i] == KindCodelet) {
-        Codelets().leafComplexLanes[t->factors[i]](in.re, in.im, out.re, out.im, si, so, count, group, il, ol);
+        const FftComplexLeafLanes leaf = Codelets().leafComplexLanes[t->factors[i]];
+        leaf(in.re, in.im, out.re, out.im, si, so, count, group, il, ol);
         return 0;
     }
     for (int32_t g = 0; g < group; ++g)
@@ -199,12 +200,12 @@ Status LeafLanes(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, pt
     return 0;
 }
 
-// Long transforms run the sub-transforms of the top level in groups, in step: each leaf call serves
-// the leaves of the whole group at once, and each combine runs once per member. Members of a group
-// start at neighbouring inputs, so their leaves share the cache lines that one leaf alone, reading
-// one value per line at a stride of a power of two, would fetch again and again. Each member does
-// the work of its own recursion, only in another order among independent parts: the bits are those
-// of the plain recursion.
+// Long transforms run the sub-transforms of their first level of radix 4 or more (with two levels
+// below it) in groups, in step: each leaf call serves the leaves of the whole group at once, and
+// each combine runs once per member. Members of a group start at neighbouring inputs, so their
+// leaves share the cache lines that one leaf alone, reading one value per line at a stride of a
+// power of two, would fetch again and again. Each member does the work of its own recursion, only
+// in another order among independent parts: the bits are those of the plain recursion.
 inline constexpr int32_t kLaneGroup = 8;
 inline constexpr int32_t kLaneGroupSize = 1 << 16;  // shorter transforms keep their input in cache
 
@@ -216,8 +217,8 @@ Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D ou
         if (const Status s = LeafLanes(t, level + 1, in, out, si, so, r, group, il, ol); s < 0) return s;
     } else {
         for (int32_t q = 0; q < r; ++q) {
-            const Status s = RecurseLanes(t, level + 1, m, in.At(q * si), out.At(static_cast<ptrdiff_t>(q) * m * so),
-                                          r * si, so, group, il, ol);
+            const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
+            const Status s = RecurseLanes(t, level + 1, m, in.At(q * si), out.At(o), r * si, so, group, il, ol);
             if (s < 0) return s;
         }
     }
@@ -229,17 +230,18 @@ Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D ou
 template <class D>
 Status Recurse(const FftTable* t, int32_t level, int32_t length, D in, D out, ptrdiff_t si, ptrdiff_t so) {
     const int32_t r = t->factors[level], m = length / r;
-    if (level == 0 && t->stageCount >= 3 && length >= kLaneGroupSize && r >= 4) {
+    if (level + 3 <= t->stageCount && t->size >= kLaneGroupSize && r >= 4) {
         const int32_t group = r < kLaneGroup ? r : kLaneGroup;
         int32_t q = 0;
         for (; q + group <= r; q += group) {
             const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
-            const Status s = RecurseLanes(t, 1, m, in.At(q * si), out.At(o), r * si, so, group, si,
+            const Status s = RecurseLanes(t, level + 1, m, in.At(q * si), out.At(o), r * si, so, group, si,
                                           static_cast<ptrdiff_t>(m) * so);
             if (s < 0) return s;
         }
         for (; q < r; ++q) {
-            const Status s = Recurse(t, 1, m, in.At(q * si), out.At(static_cast<ptrdiff_t>(q) * m * so), r * si, so);
+            const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
+            const Status s = Recurse(t, level + 1, m, in.At(q * si), out.At(o), r * si, so);
             if (s < 0) return s;
         }
         return Combine(t, level, out, so, m);

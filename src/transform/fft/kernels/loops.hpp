@@ -537,7 +537,8 @@ void RealLeafLanesForm(const P& p, const double* in, double* out, ptrdiff_t is, 
 
 template <class L, class P>
 void ComplexLeafLanesForm(const P& p, const double* inRe, const double* inIm, double* outRe, double* outIm,
-                          ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+                          ptrdiff_t is, ptrdiff_t os, int32_t count, int32_t group, ptrdiff_t il,
+                          ptrdiff_t ol) {
     int32_t g = 0;
     if constexpr (L::kWidth > 1) {
         const ptrdiff_t step = static_cast<ptrdiff_t>(count) * is, ro = static_cast<ptrdiff_t>(p.radix) * os;
