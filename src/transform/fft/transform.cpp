@@ -207,7 +207,7 @@ Status LeafLanes(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, pt
 // power of two, would fetch again and again. Each member does the work of its own recursion, only
 // in another order among independent parts: the bits are those of the plain recursion.
 inline constexpr int32_t kLaneGroup = 8;
-inline constexpr int32_t kLaneGroupSize = 1 << 16;  // shorter transforms keep their input in cache
+inline constexpr int32_t kLaneGroupSize = 1 << 12;  // shorter transforms keep their input in cache
 
 template <class D>
 Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D out, ptrdiff_t si, ptrdiff_t so,
