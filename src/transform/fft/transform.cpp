@@ -230,22 +230,6 @@ Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D ou
 template <class D>
 Status Recurse(const FftTable* t, int32_t level, int32_t length, D in, D out, ptrdiff_t si, ptrdiff_t so) {
     const int32_t r = t->factors[level], m = length / r;
-    if (level + 3 <= t->stageCount && t->size >= kLaneGroupSize && r >= 4) {
-        const int32_t group = r < kLaneGroup ? r : kLaneGroup;
-        int32_t q = 0;
-        for (; q + group <= r; q += group) {
-            const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
-            const Status s = RecurseLanes(t, level + 1, m, in.At(q * si), out.At(o), r * si, so, group, si,
-                                          static_cast<ptrdiff_t>(m) * so);
-            if (s < 0) return s;
-        }
-        for (; q < r; ++q) {
-            const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
-            const Status s = Recurse(t, level + 1, m, in.At(q * si), out.At(o), r * si, so);
-            if (s < 0) return s;
-        }
-        return Combine(t, level, out, so, m);
-    }
     if (level == t->stageCount - 2) {
         if (const Status s = Leaf(t, level + 1, in, out, si, so, r); s < 0) return s;
     } else {
@@ -258,9 +242,34 @@ Status Recurse(const FftTable* t, int32_t level, int32_t length, D in, D out, pt
     return Combine(t, level, out, so, m);
 }
 
+// The recursion of long transforms, down to the level whose sub-transforms run in groups; kept out
+// of line, so that the plain recursion of the many short transforms stays as lean as it was.
+template <class D>
+__attribute__((noinline)) Status RecurseLong(const FftTable* t, int32_t level, int32_t length, D in, D out,
+                                             ptrdiff_t si, ptrdiff_t so) {
+    const int32_t r = t->factors[level], m = length / r;
+    if (level + 3 > t->stageCount) return Recurse(t, level, length, in, out, si, so);
+    const int32_t group = r < 4 ? 0 : r < kLaneGroup ? r : kLaneGroup;
+    int32_t q = 0;
+    for (; group > 0 && q + group <= r; q += group) {
+        const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
+        const Status s = RecurseLanes(t, level + 1, m, in.At(q * si), out.At(o), r * si, so, group, si,
+                                      static_cast<ptrdiff_t>(m) * so);
+        if (s < 0) return s;
+    }
+    for (; q < r; ++q) {
+        const ptrdiff_t o = static_cast<ptrdiff_t>(q) * m * so;
+        const Status s = group > 0 ? Recurse(t, level + 1, m, in.At(q * si), out.At(o), r * si, so)
+                                   : RecurseLong(t, level + 1, m, in.At(q * si), out.At(o), r * si, so);
+        if (s < 0) return s;
+    }
+    return Combine(t, level, out, so, m);
+}
+
 template <class D>
 Status Forward(const FftTable* t, D in, D out, ptrdiff_t si, ptrdiff_t so) {
     if (t->stageCount == 1) return Leaf(t, 0, in, out, si, so, 1);
+    if (t->size >= kLaneGroupSize) return RecurseLong(t, 0, t->size, in, out, si, so);
     return Recurse(t, 0, t->size, in, out, si, so);
 }
 
