@@ -3,6 +3,8 @@
 // forward transforms on a shared table of length p-1.
 #include <immintrin.h>
 
+#include <type_traits>
+
 #include "transform/fft/generic_dft.hpp"
 #include "transform/fft/table_internal.hpp"
 
@@ -68,6 +70,76 @@ inline void ConjugateProducts(double* x, const double* k, int32_t n) {
         ConjugateProductsSse2(x, k, n, 0);
 }
 
+// Output 0 of each member sums the inputs in gather order, as the gather goes; the members' sums
+// are independent chains, so a group keeps several adders busy. Interleaved data move as pairs
+// (the sum of pairs is the two sums).
+template <int G>
+void GatherPairs(const int32_t* gather, int32_t m, const double* x, ptrdiff_t xs, ptrdiff_t xl, double* a,
+                 double* sums) {
+    __m128d sum[G];
+    for (int32_t g = 0; g < G; ++g) sum[g] = _mm_loadu_pd(x + g * xl);
+    for (int32_t q = 0; q < m; ++q) {
+        const ptrdiff_t o = gather[q + 1] * xs;
+        for (int32_t g = 0; g < G; ++g) {
+            const __m128d u = _mm_loadu_pd(x + g * xl + o);
+            sum[g] = _mm_add_pd(sum[g], u);
+            _mm_storeu_pd(a + 2 * (g * static_cast<ptrdiff_t>(m) + q), u);
+        }
+    }
+    for (int32_t g = 0; g < G; ++g) _mm_storeu_pd(sums + 2 * g, sum[g]);
+}
+
+template <int G>
+void GatherSplit(const int32_t* gather, int32_t m, const double* xr, const double* xi, ptrdiff_t xs,
+                 ptrdiff_t xl, double* a, double* sums) {
+    double sr[G], si[G];
+    for (int32_t g = 0; g < G; ++g) {
+        sr[g] = xr[g * xl];
+        si[g] = xi[g * xl];
+    }
+    for (int32_t q = 0; q < m; ++q) {
+        const ptrdiff_t o = gather[q + 1] * xs;
+        for (int32_t g = 0; g < G; ++g) {
+            const double ur = xr[g * xl + o], ui = xi[g * xl + o];
+            sr[g] += ur;
+            si[g] += ui;
+            PutPair(a + 2 * (g * static_cast<ptrdiff_t>(m) + q), ur, ui);
+        }
+    }
+    for (int32_t g = 0; g < G; ++g) {
+        sums[2 * g] = sr[g];
+        sums[2 * g + 1] = si[g];
+    }
+}
+
+template <int G>
+void GatherReal(const int32_t* gather, int32_t m, const double* x, ptrdiff_t xs, ptrdiff_t xl, double* t,
+                ptrdiff_t tl, double* sums) {
+    double sum[G];
+    for (int32_t g = 0; g < G; ++g) sum[g] = x[g * xl];
+    for (int32_t q = 0; q < m; ++q) {
+        const ptrdiff_t o = gather[q + 1] * xs;
+        for (int32_t g = 0; g < G; ++g) {
+            const double u = x[g * xl + o];
+            sum[g] += u;
+            t[g * tl + q] = u;
+        }
+    }
+    for (int32_t g = 0; g < G; ++g) sums[g] = sum[g];
+}
+
+// Calls f with the group's size (1 to kRaderGroup) as a compile-time constant.
+template <class F>
+void WithGroupSize(int32_t group, F f) {
+    static_assert(kRaderGroup == 4);
+    switch (group) {
+        case 4: f(std::integral_constant<int, 4>{}); break;
+        case 3: f(std::integral_constant<int, 3>{}); break;
+        case 2: f(std::integral_constant<int, 2>{}); break;
+        default: f(std::integral_constant<int, 1>{}); break;
+    }
+}
+
 }  // namespace
 
 bool SetupRaderStage(FftStage* st, int32_t p) {
@@ -122,92 +194,92 @@ void ReleaseRaderStage(FftStage* st) {
     PlainFree(st->raderKernelPairs);
 }
 
-// The convolutions run on interleaved scratch (work holds 4 p f64), so that the transforms of
-// length p-1 take the kernels' pair loads; the arithmetic is that of split data. Input j stands at
-// x[j xs] and output k goes to y[k ys]: a leaf reads and writes its sub-transforms where they are,
-// with no column copies. All inputs are read before the first output is written.
+// The convolutions run on interleaved scratch (member g's two vectors of 2 (p-1) f64 at work +
+// 2 g (p-1) and behind the group's first vectors), so that the transforms of length p-1 take the
+// kernels' pair loads; the arithmetic is that of split data. Input j of member g stands at
+// x[g xl + j xs] and its output k goes to y[g yl + k ys]: a leaf reads and writes its
+// sub-transforms where they are, with no column copies. The members' transforms run side by side
+// (see ComplexForwardGroup); each member's arithmetic is that of one DFT alone. All inputs are
+// read before the first output is written.
 Status RaderComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, ptrdiff_t xs,
-                    double* yr, double* yi, ptrdiff_t ys, double* work) {
+                    ptrdiff_t xl, double* yr, double* yi, ptrdiff_t ys, ptrdiff_t yl, int32_t group,
+                    double* work) {
     const int32_t m = p - 1;
-    const int32_t* gather = st->raderGather;
+    const ptrdiff_t ml = 2 * static_cast<ptrdiff_t>(m);
     const int32_t* scatter = st->raderScatter;
-    double *a = work, *b = work + 2 * static_cast<ptrdiff_t>(m);
-    const double x0r = xr[0], x0i = xi[0];
-    // Output 0 sums the inputs in gather order, as the gather goes. Interleaved data move as pairs:
-    // the sum of pairs is the two sums, and (t_re + x0_re, x0_im - t_im) is x0 plus (t_re, -t_im).
+    double *a = work, *b = work + group * ml;
+    double x0[2 * kRaderGroup], sums[2 * kRaderGroup];
+    for (int32_t g = 0; g < group; ++g) {
+        x0[2 * g] = xr[g * xl];
+        x0[2 * g + 1] = xi[g * xl];
+    }
     const bool pairs = xi == xr + 1 && yi == yr + 1;
-    double sr = x0r, si = x0i;
-    if (pairs) {
-        __m128d sum = _mm_loadu_pd(xr);
-        for (int32_t q = 0; q < m; ++q) {
-            const __m128d u = _mm_loadu_pd(xr + gather[q + 1] * xs);
-            sum = _mm_add_pd(sum, u);
-            _mm_storeu_pd(a + 2 * q, u);
+    if (pairs)
+        WithGroupSize(group, [&](auto g) { GatherPairs<g>(st->raderGather, m, xr, xs, xl, a, sums); });
+    else
+        WithGroupSize(group, [&](auto g) { GatherSplit<g>(st->raderGather, m, xr, xi, xs, xl, a, sums); });
+    if (const Status s = ComplexForwardGroup(st->raderTable, a, a + 1, b, b + 1, 2, 2, group, ml, ml)) return s;
+    for (int32_t g = 0; g < group; ++g) ConjugateProducts(b + g * ml, st->raderKernelPairs, m);
+    if (const Status s = ComplexForwardGroup(st->raderTable, b, b + 1, a, a + 1, 2, 2, group, ml, ml)) return s;
+    // (t_re + x0_re, x0_im - t_im) is x0 plus (t_re, -t_im).
+    for (int32_t g = 0; g < group; ++g) {
+        const double* t = a + g * ml;
+        double *zr = yr + g * yl, *zi = yi + g * yl;
+        if (pairs) {
+            const __m128d x = _mm_loadu_pd(x0 + 2 * g), conj = _mm_set_pd(-0.0, 0.0);
+            for (int32_t k = 1; k <= m; ++k)
+                _mm_storeu_pd(zr + scatter[k] * ys, _mm_add_pd(x, _mm_xor_pd(_mm_loadu_pd(t + 2 * (k - 1)), conj)));
+        } else {
+            for (int32_t k = 1; k <= m; ++k) {
+                const ptrdiff_t o = scatter[k] * ys;
+                zr[o] = t[2 * (k - 1)] + x0[2 * g];
+                zi[o] = x0[2 * g + 1] - t[2 * (k - 1) + 1];
+            }
         }
-        sr = _mm_cvtsd_f64(sum);
-        si = _mm_cvtsd_f64(_mm_unpackhi_pd(sum, sum));
-    } else {
-        for (int32_t q = 0; q < m; ++q) {
-            const ptrdiff_t g = gather[q + 1] * xs;
-            const double ur = xr[g], ui = xi[g];
-            sr += ur;
-            si += ui;
-            PutPair(a + 2 * q, ur, ui);
-        }
+        zr[0] = sums[2 * g];
+        zi[0] = sums[2 * g + 1];
     }
-    if (const Status s = FftComplexForward(st->raderTable, a, a + 1, b, b + 1, 2, 2, m)) return s;
-    ConjugateProducts(b, st->raderKernelPairs, m);
-    if (const Status s = FftComplexForward(st->raderTable, b, b + 1, a, a + 1, 2, 2, m)) return s;
-    if (pairs) {
-        const __m128d x0 = _mm_set_pd(x0i, x0r), conj = _mm_set_pd(-0.0, 0.0);
-        for (int32_t k = 1; k <= m; ++k)
-            _mm_storeu_pd(yr + scatter[k] * ys, _mm_add_pd(x0, _mm_xor_pd(_mm_loadu_pd(a + 2 * (k - 1)), conj)));
-    } else {
-        for (int32_t k = 1; k <= m; ++k) {
-            const ptrdiff_t o = scatter[k] * ys;
-            yr[o] = a[2 * (k - 1)] + x0r;
-            yi[o] = x0i - a[2 * (k - 1) + 1];
-        }
-    }
-    yr[0] = sr;
-    yi[0] = si;
     return 0;
 }
 
-Status RaderReal(const FftStage* st, int32_t p, const double* x, ptrdiff_t xs, double* y, ptrdiff_t ys,
-                 double* work) {
+Status RaderReal(const FftStage* st, int32_t p, const double* x, ptrdiff_t xs, ptrdiff_t xl, double* y,
+                 ptrdiff_t ys, ptrdiff_t yl, int32_t group, double* work) {
     const int32_t m = p - 1;
-    const int32_t* gather = st->raderGather;
+    const ptrdiff_t ml = 2 * static_cast<ptrdiff_t>(m);
     const int32_t* scatter = st->raderScatter;
-    // t (the gathered input, later the second transform) and e (the expanded spectrum).
-    double *t = work, *e = work + 2 * static_cast<ptrdiff_t>(m);
-    const double x0 = x[0];
-    double sum = x0;
-    for (int32_t q = 0; q < m; ++q) {
-        t[q] = x[gather[q + 1] * xs];
-        sum += t[q];
-    }
-    // The half-complex result goes behind output 0, at the output's stride.
-    double* h = y + ys;
-    if (const Status s = FftRealForward(st->raderTable, t, h, 1, ys, m)) return s;
-    // m = p - 1 is even: expand the half-complex result into the full spectrum.
-    PutPair(e, h[0], 0);
-    PutPair(e + m, h[(m / 2) * ys], 0);
-    for (int32_t k = 1; k < m / 2; ++k) {
-        const double re = h[k * ys], im = h[(m - k) * ys];
-        PutPair(e + 2 * k, re, im);
-        PutPair(e + 2 * (m - k), re, -im);
-    }
-    ConjugateProducts(e, st->raderKernelPairs, m);
-    if (const Status s = FftComplexForward(st->raderTable, e, e + 1, t, t + 1, 2, 2, m)) return s;
-    for (int32_t k = 1; k <= m; ++k) {
-        const int32_t j = scatter[k];
-        if (j <= p / 2) {
-            y[j * ys] = t[2 * (k - 1)] + x0;
-            y[(p - j) * ys] = -t[2 * (k - 1) + 1];
+    // t (the gathered input, later the second transform) and e (the expanded spectrum), per member.
+    double *t = work, *e = work + group * ml;
+    double sums[kRaderGroup];
+    WithGroupSize(group, [&](auto g) { GatherReal<g>(st->raderGather, m, x, xs, xl, t, ml, sums); });
+    // The half-complex results go behind output 0, at the output's stride.
+    if (const Status s = RealForwardGroup(st->raderTable, t, y + ys, 1, ys, group, ml, yl)) return s;
+    for (int32_t g = 0; g < group; ++g) {
+        // m = p - 1 is even: expand the half-complex result into the full spectrum.
+        const double* h = y + g * yl + ys;
+        double* eg = e + g * ml;
+        PutPair(eg, h[0], 0);
+        PutPair(eg + m, h[(m / 2) * ys], 0);
+        for (int32_t k = 1; k < m / 2; ++k) {
+            const double re = h[k * ys], im = h[(m - k) * ys];
+            PutPair(eg + 2 * k, re, im);
+            PutPair(eg + 2 * (m - k), re, -im);
         }
+        ConjugateProducts(eg, st->raderKernelPairs, m);
     }
-    y[0] = sum;
+    if (const Status s = ComplexForwardGroup(st->raderTable, e, e + 1, t, t + 1, 2, 2, group, ml, ml)) return s;
+    for (int32_t g = 0; g < group; ++g) {
+        const double x0 = x[g * xl];
+        const double* tg = t + g * ml;
+        double* z = y + g * yl;
+        for (int32_t k = 1; k <= m; ++k) {
+            const int32_t j = scatter[k];
+            if (j <= p / 2) {
+                z[j * ys] = tg[2 * (k - 1)] + x0;
+                z[(p - j) * ys] = -tg[2 * (k - 1) + 1];
+            }
+        }
+        z[0] = sums[g];
+    }
     return 0;
 }
 

@@ -12,11 +12,11 @@ namespace fft {
 
 Status GenericDft::Complex(const double* xr, const double* xi, double* yr, double* yi) const {
     return kind == KindOdd ? OddComplex(stage, radix, xr, xi, yr, yi, work)
-                           : RaderComplex(stage, radix, xr, xi, 1, yr, yi, 1, work);
+                           : RaderComplex(stage, radix, xr, xi, 1, 0, yr, yi, 1, 0, 1, work);
 }
 
 Status GenericDft::Real(const double* x, double* y) const {
-    return kind == KindOdd ? OddReal(stage, radix, x, y, work) : RaderReal(stage, radix, x, 1, y, 1, work);
+    return kind == KindOdd ? OddReal(stage, radix, x, y, work) : RaderReal(stage, radix, x, 1, 0, y, 1, 0, 1, work);
 }
 
 Status OddComplex(const FftStage* st, int32_t p, const double* xr, const double* xi, double* yr,
@@ -105,28 +105,39 @@ Status WithGeneric(const FftTable* t, int32_t i, F f) {
 }
 
 // A Rader leaf runs its sub-transforms where they stand: sub-transform q reads at the stride
-// count si from in + q si and writes p values at so from out + q p so.
+// count si from in + q si and writes p values at so from out + q p so. Neighbouring ones run in
+// groups whose transforms of length p-1 share vector lanes (see ComplexForwardGroup); those of
+// long ones run one by one, as their data fill the cache alone.
+inline constexpr int32_t kRaderGroupLength = 1 << 12;
+
+int32_t RaderGroup(int32_t p, int32_t count) {
+    return p - 1 < kRaderGroupLength ? std::min(count, kRaderGroup) : 1;
+}
+
 Status RaderLeaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
-    const int32_t p = t->factors[i];
+    const int32_t p = t->factors[i], group = RaderGroup(p, count);
     Scratch<double> scratch;
-    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p))) return s;
+    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p) * static_cast<size_t>(group))) return s;
     Status s = 0;
-    for (int32_t q = 0; q < count && s == 0; ++q)
-        s = RaderReal(t->stages[i], p, in.p + q * si, count * si, out.p + static_cast<ptrdiff_t>(q) * p * so, so,
-                      scratch.get());
+    for (int32_t q = 0; q < count && s == 0; q += group) {
+        const int32_t g = std::min(group, count - q);
+        s = RaderReal(t->stages[i], p, in.p + q * si, count * si, si, out.p + static_cast<ptrdiff_t>(q) * p * so, so,
+                      static_cast<ptrdiff_t>(p) * so, g, scratch.get());
+    }
     return MergeRelease(s, scratch.Release());
 }
 
 Status RaderLeaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff_t si, ptrdiff_t so,
                  int32_t count) {
-    const int32_t p = t->factors[i];
+    const int32_t p = t->factors[i], group = RaderGroup(p, count);
     Scratch<double> scratch;
-    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p))) return s;
+    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p) * static_cast<size_t>(group))) return s;
     Status s = 0;
-    for (int32_t q = 0; q < count && s == 0; ++q) {
+    for (int32_t q = 0; q < count && s == 0; q += group) {
+        const int32_t g = std::min(group, count - q);
         const ptrdiff_t o = static_cast<ptrdiff_t>(q) * p * so;
-        s = RaderComplex(t->stages[i], p, in.re + q * si, in.im + q * si, count * si, out.re + o, out.im + o, so,
-                         scratch.get());
+        s = RaderComplex(t->stages[i], p, in.re + q * si, in.im + q * si, count * si, si, out.re + o, out.im + o, so,
+                         static_cast<ptrdiff_t>(p) * so, g, scratch.get());
     }
     return MergeRelease(s, scratch.Release());
 }
@@ -273,7 +284,27 @@ Status Forward(const FftTable* t, D in, D out, ptrdiff_t si, ptrdiff_t so) {
     return Recurse(t, 0, t->size, in, out, si, so);
 }
 
+template <class D>
+Status ForwardGroup(const FftTable* t, D in, D out, ptrdiff_t si, ptrdiff_t so, int32_t group, ptrdiff_t il,
+                    ptrdiff_t ol) {
+    if (group == 1) return Forward(t, in, out, si, so);
+    if (t->stageCount == 1) return LeafLanes(t, 0, in, out, si, so, 1, group, il, ol);
+    return RecurseLanes(t, 0, t->size, in, out, si, so, group, il, ol);
+}
+
 }  // namespace
+
+Status ComplexForwardGroup(const FftTable* t, const double* inRe, const double* inIm, double* outRe,
+                           double* outIm, ptrdiff_t is, ptrdiff_t os, int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+    return ForwardGroup(t, ComplexPtr{const_cast<double*>(inRe), const_cast<double*>(inIm)}, ComplexPtr{outRe, outIm},
+                        is, os, group, il, ol);
+}
+
+Status RealForwardGroup(const FftTable* t, const double* in, double* out, ptrdiff_t is, ptrdiff_t os,
+                        int32_t group, ptrdiff_t il, ptrdiff_t ol) {
+    return ForwardGroup(t, RealPtr{const_cast<double*>(in)}, RealPtr{out}, is, os, group, il, ol);
+}
+
 }  // namespace fft
 
 Status FftRealForward(const FftTable* t, const double* in, double* out, ptrdiff_t inStride,

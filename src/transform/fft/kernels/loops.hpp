@@ -20,6 +20,15 @@ namespace tw::fft::TW_FFT_ISA {
 
 #define TW_FFT_INLINE inline __attribute__((always_inline))
 
+// The value, hidden from the optimiser: a loop that launders its strides at each block computes
+// the block's addresses afresh from them, where it would otherwise keep one induction pointer per
+// load and store of the block, far more than there are registers, and step them on the stack.
+template <class P, class T>
+TW_FFT_INLINE T Opaque(T x) {
+    if constexpr (!P::kOutlined) asm("" : "+r"(x));
+    return x;
+}
+
 template <class V>
 TW_FFT_INLINE void Twiddle(V& re, V& im, V c, V d) {
     const V a = re, b = im;
@@ -353,8 +362,9 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
         }
     }
     for (; q + L::kWidth <= end; q += L::kWidth) {
-        const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, step, is};
-        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, os, ro, 0};
+        const ptrdiff_t st = Opaque<P>(step), li = Opaque<P>(is), so = Opaque<P>(os), lo = Opaque<P>(ro);
+        const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, st, li};
+        const ComplexOut<L, Pair> out{outRe + q * ro, outIm + q * ro, so, lo, 0};
         if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
     }
     if (end < count) q = count;
@@ -390,8 +400,9 @@ Status RealLeafLoop(const P& p, const double* in, double* out, ptrdiff_t is, ptr
         }
     }
     for (; q + L::kWidth <= end; q += L::kWidth) {
-        const RealIn<L, Unit> x{in + q * is, step, is};
-        const RealOut<L> y{out + q * ro, os, ro, 0};
+        const ptrdiff_t st = Opaque<P>(step), so = Opaque<P>(os), lo = Opaque<P>(ro);
+        const RealIn<L, Unit> x{in + q * is, st, is};
+        const RealOut<L> y{out + q * ro, so, lo, 0};
         if (const Status s = RunReal<typename L::V>(p, x, y)) return s;
     }
     if (end < count) q = count;
@@ -420,9 +431,9 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
         }
     }
     for (; j + L::kWidth <= end; j += L::kWidth) {
-        const ptrdiff_t w = ColumnTwiddles(j, m);
-        const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, ms, s}, twRe + w, twIm + w, m - 1};
-        const ComplexOut<L, Pair> out{re + j * s, im + j * s, ms, s, 0};
+        const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ls = Opaque<P>(s), ws = Opaque<P, ptrdiff_t>(m - 1);
+        const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, rs, ls}, twRe + w, twIm + w, ws};
+        const ComplexOut<L, Pair> out{re + j * s, im + j * s, rs, ls, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
     if (end < m) j = m;
@@ -456,8 +467,9 @@ Status RealCombinePairs(const P& p, double* data, const double* twRe, const doub
         const ptrdiff_t w = ColumnTwiddles(k, m);
         double* front = data + k * s;
         double* back = data + (m - k) * s;
-        const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, ms, s}, twRe + w, twIm + w, m - 1};
-        const PairColumnOut<L, Unit> out{front, back, ms, s, r, 0};
+        const ptrdiff_t rs = Opaque<P>(ms), ls = Opaque<P>(s), ws = Opaque<P, ptrdiff_t>(m - 1);
+        const TwiddledIn<L, PairColumnIn<L, Unit>> in{{front, back, rs, ls}, twRe + w, twIm + w, ws};
+        const PairColumnOut<L, Unit> out{front, back, rs, ls, r, 0};
         if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
     }
     if (end <= pairs) k = pairs + 1;
@@ -524,10 +536,11 @@ void RealLeafLanesForm(const P& p, const double* in, double* out, ptrdiff_t is, 
             for (int32_t h = 0; h < whole; h += L::kWidth) {
                 const double* x = in + q * is + h * il;
                 double* y = out + q * ro + h * ol;
+                const ptrdiff_t st = Opaque<P>(step), li = Opaque<P>(il), so = Opaque<P>(os), lo = Opaque<P>(ol);
                 if (il == 1)
-                    RunReal<typename L::V>(p, RealIn<L, true>{x, step, 1}, RealOut<L>{y, os, ol, 0});
+                    RunReal<typename L::V>(p, RealIn<L, true>{x, st, 1}, RealOut<L>{y, so, lo, 0});
                 else
-                    RunReal<typename L::V>(p, RealIn<L, false>{x, step, il}, RealOut<L>{y, os, ol, 0});
+                    RunReal<typename L::V>(p, RealIn<L, false>{x, st, li}, RealOut<L>{y, so, lo, 0});
             }
         }
         g = whole;
@@ -547,12 +560,13 @@ void ComplexLeafLanesForm(const P& p, const double* inRe, const double* inIm, do
         for (int32_t q = 0; q < count && whole > 0; ++q) {
             for (int32_t h = 0; h < whole; h += L::kWidth) {
                 const ptrdiff_t x = q * is + h * il, y = q * ro + h * ol;
+                const ptrdiff_t st = Opaque<P>(step), li = Opaque<P>(il), so = Opaque<P>(os), lo = Opaque<P>(ol);
                 if (pair)
-                    RunComplex<typename L::V>(p, ComplexIn<L, true>{inRe + x, inIm + x, step, il},
-                                              ComplexOut<L, true>{outRe + y, outIm + y, os, ol, 0});
+                    RunComplex<typename L::V>(p, ComplexIn<L, true>{inRe + x, inIm + x, st, li},
+                                              ComplexOut<L, true>{outRe + y, outIm + y, so, lo, 0});
                 else
-                    RunComplex<typename L::V>(p, ComplexIn<L, false>{inRe + x, inIm + x, step, il},
-                                              ComplexOut<L, false>{outRe + y, outIm + y, os, ol, 0});
+                    RunComplex<typename L::V>(p, ComplexIn<L, false>{inRe + x, inIm + x, st, li},
+                                              ComplexOut<L, false>{outRe + y, outIm + y, so, lo, 0});
             }
         }
         g = whole;
