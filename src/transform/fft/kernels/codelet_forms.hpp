@@ -38,13 +38,13 @@ struct CodeletDft {
     // store of the previous pass, which makes compile time grow with the square of the radix.
     static constexpr bool kOutlined = R > 16;
     template <class V, class In, class Out>
-    __attribute__((noinline)) static void OutlinedComplex(const In& in, const Out& out) {
+    __attribute__((noinline, aligned(64))) static void OutlinedComplex(const In& in, const Out& out) {
         const In i = in;
         const Out o = out;
         DftBlock<R>::template Complex<V>(i, o);
     }
     template <class V, class In, class Out>
-    __attribute__((noinline)) static void OutlinedReal(const In& in, const Out& out) {
+    __attribute__((noinline, aligned(64))) static void OutlinedReal(const In& in, const Out& out) {
         const In i = in;
         const Out o = out;
         DftBlock<R>::template Real<V>(i, o);
