@@ -32,7 +32,7 @@ const PathCase kCases[] = {
     {48000, "radix-10 combine of 1600 columns: chunks and a partial chunk"},
     {65536, "radix-32 combine of 1024 columns, below a radix-2 combine of 32768"},
     {106, "Rader leaf of 2 as one group"}, {159, "Rader leaf of 3 as one group"},
-    {530, "Rader leaf of 10 in groups of 4, 4 and 2"},
+    {530, "Rader leaf of 10 in groups of 4, 4 and 2; the radix-4 combines of a group of 4 in lanes"},
     {53 * 59, "Rader combine over a Rader leaf"},
     {10007, "Rader three deep: 10007, 5003 one by one, 61 in groups of 4 and a last one"},
     {100000, "top level of 10 in a group of 8 with leaves side by side, and 2 alone"},

@@ -211,6 +211,32 @@ Status LeafLanes(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, pt
     return 0;
 }
 
+// Combines side by side (combine g at data + g lane). Short complex ones of a group that lies
+// within the first-level cache share vector lanes across the group (see ComplexCombineLanesForm);
+// the others run one by one, with lanes across their own columns.
+inline constexpr int32_t kLaneCombineColumns = 32;
+inline constexpr ptrdiff_t kLaneCombineSpan = 1 << 12;  // f64
+
+Status CombineLanes(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int32_t m, int32_t group,
+                    ptrdiff_t lane) {
+    for (int32_t g = 0; g < group; ++g)
+        if (const Status st = Combine(t, i, data.At(g * lane), s, m); st < 0) return st;
+    return 0;
+}
+
+Status CombineLanes(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32_t m, int32_t group,
+                    ptrdiff_t lane) {
+    if (t->kinds[i] == KindCodelet && m <= kLaneCombineColumns && group * lane <= kLaneCombineSpan) {
+        const FftStage* st = t->stages[i];
+        Codelets().combineComplexLanes[t->factors[i]](data.re, data.im, st->laneTwiddleRe, st->laneTwiddleIm, s, m,
+                                                      group, lane);
+        return 0;
+    }
+    for (int32_t g = 0; g < group; ++g)
+        if (const Status st = Combine(t, i, data.At(g * lane), s, m); st < 0) return st;
+    return 0;
+}
+
 // Long transforms run the sub-transforms of their first level of radix 4 or more (with two levels
 // below it) in groups, in step: each leaf call serves the leaves of the whole group at once, and
 // each combine runs once per member. Members of a group start at neighbouring inputs, so their
@@ -233,9 +259,7 @@ Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D ou
             if (s < 0) return s;
         }
     }
-    for (int32_t g = 0; g < group; ++g)
-        if (const Status s = Combine(t, level, out.At(g * ol), so, m); s < 0) return s;
-    return 0;
+    return CombineLanes(t, level, out, so, m, group, ol);
 }
 
 template <class D>

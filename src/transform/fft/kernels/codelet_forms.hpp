@@ -128,13 +128,19 @@ struct CodeletForms {
         ComplexLeafLanesForm<L>(CodeletDft<R>{}, inRe, inIm, outRe, outIm, is, os, count, group, il, ol);
     }
 
+    template <int R>
+    static void ComplexCombineLanes(double* re, double* im, const double* twRe, const double* twIm, ptrdiff_t s,
+                                    int32_t m, int32_t group, ptrdiff_t lane) {
+        ComplexCombineLanesForm<L>(CodeletDft<R>{}, re, im, twRe, twIm, s, m, group, lane);
+    }
+
     template <int... R>
     static void Put(CodeletTables& t, std::integer_sequence<int, R...>) {
         ((t.leafReal[R] = &RealLeaf<R>, t.combineReal[R] = &RealCombine<R>, t.leafComplex[R] = &ComplexLeaf<R>,
           t.combineComplex[R] = &ComplexCombine<R>, t.leafRealFrom[R] = &RealLeafFrom<R>,
           t.combineRealFrom[R] = &RealCombineFrom<R>, t.leafComplexFrom[R] = &ComplexLeafFrom<R>,
           t.combineComplexFrom[R] = &ComplexCombineFrom<R>, t.leafRealLanes[R] = &RealLeafLanes<R>,
-          t.leafComplexLanes[R] = &ComplexLeafLanes<R>),
+          t.leafComplexLanes[R] = &ComplexLeafLanes<R>, t.combineComplexLanes[R] = &ComplexCombineLanes<R>),
          ...);
     }
 };

@@ -33,6 +33,7 @@ struct ScalarLanes {
     static V Load(const double* p, ptrdiff_t) { return *p; }
     static void Store(double* p, ptrdiff_t, V v) { *p = v; }
     static V LoadUnit(const double* p) { return *p; }
+    static V Broadcast(const double* p) { return *p; }
     static void StoreUnit(double* p, V v) { *p = v; }
     static V LoadBack(const double* p) { return *p; }
     static void StoreBack(double* p, V v) { *p = v; }
@@ -58,6 +59,7 @@ struct Sse2Lanes {
         _mm_storeh_pd(p + lane, v);
     }
     static V LoadUnit(const double* p) { return _mm_loadu_pd(p); }
+    static V Broadcast(const double* p) { return _mm_load1_pd(p); }
     static void StoreUnit(double* p, V v) { _mm_storeu_pd(p, v); }
     // Lanes stepping backwards from p.
     static V LoadBack(const double* p) {

@@ -26,6 +26,7 @@ struct Avx2Lanes {
         _mm_storeh_pd(p + 3 * lane, hi);
     }
     static V LoadUnit(const double* p) { return _mm256_loadu_pd(p); }
+    static V Broadcast(const double* p) { return _mm256_broadcast_sd(p); }
     static void StoreUnit(double* p, V v) { _mm256_storeu_pd(p, v); }
     static V LoadBack(const double* p) { return _mm256_permute4x64_pd(_mm256_loadu_pd(p - 3), 0x1B); }
     static void StoreBack(double* p, V v) { _mm256_storeu_pd(p - 3, _mm256_permute4x64_pd(v, 0x1B)); }

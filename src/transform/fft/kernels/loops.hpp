@@ -126,6 +126,21 @@ struct TwiddledIn {
     }
 };
 
+// The same with one column's twiddles for all lanes, which then run across transforms that are
+// at the same column (see ComplexCombineLanesForm).
+template <class L, class In>
+struct SharedTwiddledIn {
+    using V = typename L::V;
+    In data;
+    const double* wr;
+    const double* wi;
+    ptrdiff_t wstep;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        data.C(j, r, i);
+        if (j > 0) Twiddle(r, i, L::Broadcast(wr + j * wstep), L::Broadcast(wi + j * wstep));
+    }
+};
+
 // Real values at p, element j at j step; lanes at `lane`, which is 1 when Unit.
 template <class L, bool Unit>
 struct RealIn {
@@ -573,6 +588,40 @@ void ComplexLeafLanesForm(const P& p, const double* inRe, const double* inIm, do
     }
     for (; g < group; ++g)
         ComplexLeafForm<L>(p, inRe + g * il, inIm + g * il, outRe + g * ol, outIm + g * ol, is, os, count);
+}
+
+// `group` complex combines side by side, combine g at re + g lane (im likewise). The vector lanes
+// run across the combines, column by column, with each column's twiddles shared: a short combine
+// fills them where its own few columns would leave partial blocks and a scalar column 0. Every DFT
+// is the one the single combines compute. Interleaved data only (the Rader groups' scratch); split
+// data run one by one.
+template <class L, class P>
+void ComplexCombineLanesLoop(const P& p, double* re, double* im, const double* twRe, const double* twIm,
+                             ptrdiff_t s, int32_t m, int32_t whole, ptrdiff_t lane) {
+    const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
+    for (int32_t h = 0; h < whole; h += L::kWidth) {
+        double* r = re + h * lane;
+        double* i = im + h * lane;
+        RunComplex<typename L::V>(p, ComplexIn<L, true>{r, i, ms, lane}, ComplexOut<L, true>{r, i, ms, lane, 0});
+        for (int32_t j = 1; j < m; ++j) {
+            const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ls = Opaque<P>(lane);
+            const SharedTwiddledIn<L, ComplexIn<L, true>> in{{r + j * s, i + j * s, rs, ls}, twRe + w, twIm + w, m - 1};
+            RunComplex<typename L::V>(p, in, ComplexOut<L, true>{r + j * s, i + j * s, rs, ls, 0});
+        }
+    }
+}
+
+template <class L, class P>
+void ComplexCombineLanesForm(const P& p, double* re, double* im, const double* twRe, const double* twIm,
+                             ptrdiff_t s, int32_t m, int32_t group, ptrdiff_t lane) {
+    int32_t g = 0;
+    if constexpr (L::kWidth > 1) {
+        if (im == re + 1) {
+            g = group - group % L::kWidth;
+            ComplexCombineLanesLoop<L>(p, re, im, twRe, twIm, s, m, g, lane);
+        }
+    }
+    for (; g < group; ++g) ComplexCombineForm<L>(p, re + g * lane, im + g * lane, twRe, twIm, s, m);
 }
 
 // Combines whose rows lie far apart (the upper levels of long transforms) run in chunks of
