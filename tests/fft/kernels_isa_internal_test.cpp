@@ -115,4 +115,31 @@ TEST_F(KernelIsa, ComplexCombines) {
     }
 }
 
+// Combines side by side: the lanes across a group give each member the bits of its own combine,
+// in both instruction sets; 5 members leave one to run alone, and split data run one by one.
+TEST_F(KernelIsa, ComplexCombinesSideBySide) {
+    const int32_t group = 5;
+    for (int32_t r = 2; r <= tw::kFftMaxRadix; ++r) {
+        if (base_.combineComplex[r] == nullptr) continue;
+        for (const int32_t m : {1, 3, 13}) {
+            for (const bool interleaved : {true, false}) {
+                const std::vector<double> twRe = Random(static_cast<size_t>(r - 1) * (m - 1) + 1, gen_);
+                const std::vector<double> twIm = Random(twRe.size(), gen_);
+                const ptrdiff_t s = interleaved ? 2 : 1, lane = 2 * static_cast<ptrdiff_t>(r) * m + 6;
+                const size_t half = static_cast<size_t>(lane) * group;
+                const ptrdiff_t gap = interleaved ? 1 : static_cast<ptrdiff_t>(half);
+                const std::vector<double> data = Random(2 * half, gen_);
+                std::vector<double> one = data, a = data, b = data;
+                for (int32_t g = 0; g < group; ++g)
+                    base_.combineComplex[r](one.data() + g * lane, one.data() + g * lane + gap, twRe.data(),
+                                            twIm.data(), s, m);
+                base_.combineComplexLanes[r](a.data(), a.data() + gap, twRe.data(), twIm.data(), s, m, group, lane);
+                wide_->combineComplexLanes[r](b.data(), b.data() + gap, twRe.data(), twIm.data(), s, m, group, lane);
+                EXPECT_TRUE(Same(one, a) && Same(one, b)) << "radix " << r << " m " << m << " interleaved "
+                                                          << interleaved;
+            }
+        }
+    }
+}
+
 }  // namespace
