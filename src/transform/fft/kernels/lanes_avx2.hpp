@@ -45,6 +45,20 @@ struct Avx2Lanes {
         _mm_storeu_pd(p + lane, _mm256_castpd256_pd128(b));
         _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
     }
+    // Four neighbouring interleaved values (lane stride 2), whole, in the lane order 0, 2, 1, 3:
+    // one unpack of the two loads sorts them into that order, and one unpack back restores the
+    // interleaving. Values that go with these lanes (twiddles) load crossed into the same order.
+    static constexpr bool kUnitPairs = true;
+    static void LoadPairUnit(const double* p, V& re, V& im) {
+        const __m256d a = _mm256_loadu_pd(p), b = _mm256_loadu_pd(p + 4);
+        re = _mm256_unpacklo_pd(a, b);
+        im = _mm256_unpackhi_pd(a, b);
+    }
+    static void StorePairUnit(double* p, V re, V im) {
+        _mm256_storeu_pd(p, _mm256_unpacklo_pd(re, im));
+        _mm256_storeu_pd(p + 4, _mm256_unpackhi_pd(re, im));
+    }
+    static V LoadUnitCrossed(const double* p) { return _mm256_permute4x64_pd(_mm256_loadu_pd(p), 0xD8); }
     // Loads whose lanes 1 to 3 stand at the offsets o[1..3] (o[0] is 0), for blocks that repeat a
     // transform in several lanes.
     static V LoadAt(const double* p, const ptrdiff_t* o) { return _mm256_set_pd(p[o[3]], p[o[2]], p[o[1]], p[0]); }

@@ -112,8 +112,9 @@ inline ptrdiff_t ColumnTwiddles(int32_t c, int32_t m) {
 }
 
 // An input whose element j >= 1 is multiplied by the twiddle at j of its column; w is the
-// column's ColumnTwiddles offset, rows of twiddles stand wstep apart.
-template <class L, class In>
+// column's ColumnTwiddles offset, rows of twiddles stand wstep apart. Crossed: the lanes are in
+// the order of the unit pair loads below.
+template <class L, class In, bool Crossed = false>
 struct TwiddledIn {
     using V = typename L::V;
     In data;
@@ -122,8 +123,34 @@ struct TwiddledIn {
     ptrdiff_t wstep;
     TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
         data.C(j, r, i);
-        if (j > 0) Twiddle(r, i, L::LoadUnit(wr + j * wstep), L::LoadUnit(wi + j * wstep));
+        if (j > 0) {
+            if constexpr (Crossed)
+                Twiddle(r, i, L::LoadUnitCrossed(wr + j * wstep), L::LoadUnitCrossed(wi + j * wstep));
+            else
+                Twiddle(r, i, L::LoadUnit(wr + j * wstep), L::LoadUnit(wi + j * wstep));
+        }
     }
+};
+
+// Interleaved data whose lanes are neighbouring complex values, for lanes that load those whole
+// (kUnitPairs; see Avx2Lanes::LoadPairUnit). Element j of the lanes starts at p + j step.
+template <class L>
+constexpr bool kUnitPairs = requires { L::kUnitPairs; };
+
+template <class L>
+struct UnitPairIn {
+    using V = typename L::V;
+    const double* p;
+    ptrdiff_t step;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const { L::LoadPairUnit(p + j * step, r, i); }
+};
+
+template <class L>
+struct UnitPairOut {
+    using V = typename L::V;
+    double* p;
+    ptrdiff_t step;
+    TW_FFT_INLINE void C(int32_t k, V r, V i) const { L::StorePairUnit(p + k * step, r, i); }
 };
 
 // The same with one column's twiddles for all lanes, which then run across transforms that are
@@ -445,6 +472,15 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
             if (const Status st = RunComplex<typename L::V>(p, in, out)) return st;
         }
     }
+    if constexpr (Pair && kUnitPairs<L>) {
+        if (s == 2) {
+            for (; j + L::kWidth <= end; j += L::kWidth) {
+                const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ws = Opaque<P, ptrdiff_t>(m - 1);
+                const TwiddledIn<L, UnitPairIn<L>, true> in{{re + j * s, rs}, twRe + w, twIm + w, ws};
+                if (const Status st = RunComplex<typename L::V>(p, in, UnitPairOut<L>{re + j * s, rs})) return st;
+            }
+        }
+    }
     for (; j + L::kWidth <= end; j += L::kWidth) {
         const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ls = Opaque<P>(s), ws = Opaque<P, ptrdiff_t>(m - 1);
         const TwiddledIn<L, ComplexIn<L, Pair>> in{{re + j * s, im + j * s, rs, ls}, twRe + w, twIm + w, ws};
@@ -647,9 +683,15 @@ int32_t ComplexCombineChunks(const P& p, double* data, const double* twRe, const
             for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(buf + i * 2 * C + c, _mm_loadu_pd(data + i * ms + 2 * j0 + c));
         for (int32_t j = 0; j < C; j += L::kWidth) {
             const ptrdiff_t w = ColumnTwiddles(j0 + j, m);
-            const TwiddledIn<L, ComplexIn<L, true>> in{{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2}, twRe + w, twIm + w, m - 1};
-            const ComplexOut<L, true> out{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2, 0};
-            RunComplex<typename L::V>(p, in, out);
+            if constexpr (kUnitPairs<L>) {
+                const TwiddledIn<L, UnitPairIn<L>, true> in{{buf + 2 * j, 2 * C}, twRe + w, twIm + w, m - 1};
+                RunComplex<typename L::V>(p, in, UnitPairOut<L>{buf + 2 * j, 2 * C});
+            } else {
+                const TwiddledIn<L, ComplexIn<L, true>> in{{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2}, twRe + w, twIm + w,
+                                                           m - 1};
+                const ComplexOut<L, true> out{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2, 0};
+                RunComplex<typename L::V>(p, in, out);
+            }
         }
         for (int32_t i = 0; i < R; ++i)
             for (int32_t c = 0; c < 2 * C; c += 2) _mm_storeu_pd(data + i * ms + 2 * j0 + c, _mm_loadu_pd(buf + i * 2 * C + c));
