@@ -59,6 +59,14 @@ struct Avx2Lanes {
         _mm256_storeu_pd(p + 4, _mm256_unpackhi_pd(re, im));
     }
     static V LoadUnitCrossed(const double* p) { return _mm256_permute4x64_pd(_mm256_loadu_pd(p), 0xD8); }
+    // StorePair of lanes in that order: the first unpack holds the values for p and p + lane.
+    static void StorePairCrossed(double* p, ptrdiff_t lane, V re, V im) {
+        const __m256d a = _mm256_unpacklo_pd(re, im), b = _mm256_unpackhi_pd(re, im);
+        _mm_storeu_pd(p, _mm256_castpd256_pd128(a));
+        _mm_storeu_pd(p + lane, _mm256_extractf128_pd(a, 1));
+        _mm_storeu_pd(p + 2 * lane, _mm256_castpd256_pd128(b));
+        _mm_storeu_pd(p + 3 * lane, _mm256_extractf128_pd(b, 1));
+    }
     // Loads whose lanes 1 to 3 stand at the offsets o[1..3] (o[0] is 0), for blocks that repeat a
     // transform in several lanes.
     static V LoadAt(const double* p, const ptrdiff_t* o) { return _mm256_set_pd(p[o[3]], p[o[2]], p[o[1]], p[0]); }

@@ -145,6 +145,15 @@ struct UnitPairIn {
     TW_FFT_INLINE void C(int32_t j, V& r, V& i) const { L::LoadPairUnit(p + j * step, r, i); }
 };
 
+// Interleaved outputs of lanes in that order, lane by lane at `lane` apart.
+template <class L>
+struct CrossedPairOut {
+    using V = typename L::V;
+    double* p;
+    ptrdiff_t step, lane;
+    TW_FFT_INLINE void C(int32_t k, V r, V i) const { L::StorePairCrossed(p + k * step, lane, r, i); }
+};
+
 template <class L>
 struct UnitPairOut {
     using V = typename L::V;
@@ -403,6 +412,15 @@ Status ComplexLeafLoop(const P& p, const double* inRe, const double* inIm, doubl
             if (const Status s = RunComplex<typename L::V>(p, in, out)) return s;
         }
     }
+    if constexpr (Pair && kUnitPairs<L>) {
+        if (is == 2) {
+            for (; q + L::kWidth <= end; q += L::kWidth) {
+                const ptrdiff_t st = Opaque<P>(step), so = Opaque<P>(os), lo = Opaque<P>(ro);
+                const CrossedPairOut<L> out{outRe + q * ro, so, lo};
+                if (const Status s = RunComplex<typename L::V>(p, UnitPairIn<L>{inRe + q * is, st}, out)) return s;
+            }
+        }
+    }
     for (; q + L::kWidth <= end; q += L::kWidth) {
         const ptrdiff_t st = Opaque<P>(step), li = Opaque<P>(is), so = Opaque<P>(os), lo = Opaque<P>(ro);
         const ComplexIn<L, Pair> in{inRe + q * is, inIm + q * is, st, li};
@@ -612,6 +630,12 @@ void ComplexLeafLanesForm(const P& p, const double* inRe, const double* inIm, do
             for (int32_t h = 0; h < whole; h += L::kWidth) {
                 const ptrdiff_t x = q * is + h * il, y = q * ro + h * ol;
                 const ptrdiff_t st = Opaque<P>(step), li = Opaque<P>(il), so = Opaque<P>(os), lo = Opaque<P>(ol);
+                if constexpr (kUnitPairs<L>) {
+                    if (pair && il == 2) {
+                        RunComplex<typename L::V>(p, UnitPairIn<L>{inRe + x, st}, CrossedPairOut<L>{outRe + y, so, lo});
+                        continue;
+                    }
+                }
                 if (pair)
                     RunComplex<typename L::V>(p, ComplexIn<L, true>{inRe + x, inIm + x, st, li},
                                               ComplexOut<L, true>{outRe + y, outIm + y, so, lo, 0});
