@@ -237,14 +237,16 @@ Status CombineLanes(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, 
     return 0;
 }
 
-// Long transforms run the sub-transforms of their first level of radix 4 or more (with two levels
-// below it) in groups, in step: each leaf call serves the leaves of the whole group at once, and
-// each combine runs once per member. Members of a group start at neighbouring inputs, so their
-// leaves share the cache lines that one leaf alone, reading one value per line at a stride of a
-// power of two, would fetch again and again. Each member does the work of its own recursion, only
-// in another order among independent parts: the bits are those of the plain recursion.
+// Transforms of three levels or more run the sub-transforms of their first level of radix 4 or
+// more (with two levels below it) in groups, in step: each leaf call serves the leaves of the whole
+// group at once, and the combines run once per member, or side by side when short (CombineLanes).
+// Members of a group start at neighbouring inputs, so their leaves share the cache lines that one
+// leaf alone, reading one value per line at a stride of a power of two, would fetch again and
+// again, and the short leaves and combines fill vector lanes that their own few transforms would
+// leave partly empty. Each member does the work of its own recursion, only in another order among
+// independent parts: the bits are those of the plain recursion.
 inline constexpr int32_t kLaneGroup = 8;
-inline constexpr int32_t kLaneGroupSize = 1 << 12;  // shorter transforms keep their input in cache
+inline constexpr int32_t kLaneGroupSize = 1 << 8;  // below, the groups no longer pay for themselves
 
 template <class D>
 Status RecurseLanes(const FftTable* t, int32_t level, int32_t length, D in, D out, ptrdiff_t si, ptrdiff_t so,
@@ -277,7 +279,7 @@ Status Recurse(const FftTable* t, int32_t level, int32_t length, D in, D out, pt
     return Combine(t, level, out, so, m);
 }
 
-// The recursion of long transforms, down to the level whose sub-transforms run in groups; kept out
+// The recursion down to the level whose sub-transforms run in groups; kept out
 // of line, so that the plain recursion of the many short transforms stays as lean as it was.
 template <class D>
 __attribute__((noinline)) Status RecurseLong(const FftTable* t, int32_t level, int32_t length, D in, D out,
