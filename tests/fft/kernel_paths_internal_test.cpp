@@ -37,6 +37,7 @@ const PathCase kCases[] = {
     {10007, "Rader three deep: 10007, 5003 one by one, 61 in groups of 4 and a last one"},
     {100000, "top level of 10 in a group of 8 with leaves side by side, and 2 alone"},
     {1000, "a group of 8 whose radix-10 leaves and combines of 10 columns run side by side, and 2 alone"},
+    {4096, "a group of 4 whose radix-32 combines of 32 columns run side by side"},
     {1 << 20, "radix-32 leaves side by side under four radix-32 levels"},
     {78125, "group of 5 over radix-5 leaves: 4 in vector lanes, 1 alone"},
     {71875, "group of 5 over radix-23 leaves, one by one"},

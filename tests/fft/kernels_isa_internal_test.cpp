@@ -142,4 +142,25 @@ TEST_F(KernelIsa, ComplexCombinesSideBySide) {
     }
 }
 
+TEST_F(KernelIsa, RealCombinesSideBySide) {
+    const int32_t group = 5;
+    for (int32_t r = 2; r <= tw::kFftMaxRadix; ++r) {
+        if (base_.combineReal[r] == nullptr) continue;
+        for (const int32_t m : {1, 2, 3, 12, 13}) {
+            for (const ptrdiff_t s : {1, 3}) {
+                const std::vector<double> twRe = Random(static_cast<size_t>(r - 1) * (m - 1) + 1, gen_);
+                const std::vector<double> twIm = Random(twRe.size(), gen_);
+                const ptrdiff_t lane = static_cast<ptrdiff_t>(r) * m * s + 5;
+                const std::vector<double> data = Random(static_cast<size_t>(lane) * group, gen_);
+                std::vector<double> one = data, a = data, b = data;
+                for (int32_t g = 0; g < group; ++g)
+                    base_.combineReal[r](one.data() + g * lane, twRe.data(), twIm.data(), s, m);
+                base_.combineRealLanes[r](a.data(), twRe.data(), twIm.data(), s, m, group, lane);
+                wide_->combineRealLanes[r](b.data(), twRe.data(), twIm.data(), s, m, group, lane);
+                EXPECT_TRUE(Same(one, a) && Same(one, b)) << "radix " << r << " m " << m << " stride " << s;
+            }
+        }
+    }
+}
+
 }  // namespace

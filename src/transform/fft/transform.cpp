@@ -217,8 +217,17 @@ Status LeafLanes(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, pt
 inline constexpr int32_t kLaneCombineColumns = 32;
 inline constexpr ptrdiff_t kLaneCombineSpan = 1 << 12;  // f64
 
+bool SideBySide(const FftTable* t, int32_t i, int32_t m, int32_t group, ptrdiff_t lane) {
+    return t->kinds[i] == KindCodelet && m <= kLaneCombineColumns && group * lane <= kLaneCombineSpan;
+}
+
 Status CombineLanes(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int32_t m, int32_t group,
                     ptrdiff_t lane) {
+    if (SideBySide(t, i, m, group, lane)) {
+        const FftStage* st = t->stages[i];
+        Codelets().combineRealLanes[t->factors[i]](data.p, st->laneTwiddleRe, st->laneTwiddleIm, s, m, group, lane);
+        return 0;
+    }
     for (int32_t g = 0; g < group; ++g)
         if (const Status st = Combine(t, i, data.At(g * lane), s, m); st < 0) return st;
     return 0;
@@ -226,7 +235,7 @@ Status CombineLanes(const FftTable* t, int32_t i, RealPtr data, ptrdiff_t s, int
 
 Status CombineLanes(const FftTable* t, int32_t i, ComplexPtr data, ptrdiff_t s, int32_t m, int32_t group,
                     ptrdiff_t lane) {
-    if (t->kinds[i] == KindCodelet && m <= kLaneCombineColumns && group * lane <= kLaneCombineSpan) {
+    if (SideBySide(t, i, m, group, lane)) {
         const FftStage* st = t->stages[i];
         Codelets().combineComplexLanes[t->factors[i]](data.re, data.im, st->laneTwiddleRe, st->laneTwiddleIm, s, m,
                                                       group, lane);

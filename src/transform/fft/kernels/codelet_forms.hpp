@@ -129,6 +129,11 @@ struct CodeletForms {
     }
 
     template <int R>
+    static void RealCombineLanes(double* data, const double* twRe, const double* twIm, ptrdiff_t s, int32_t m,
+                                 int32_t group, ptrdiff_t lane) {
+        RealCombineLanesForm<L>(CodeletDft<R>{}, data, twRe, twIm, s, m, group, lane);
+    }
+    template <int R>
     static void ComplexCombineLanes(double* re, double* im, const double* twRe, const double* twIm, ptrdiff_t s,
                                     int32_t m, int32_t group, ptrdiff_t lane) {
         ComplexCombineLanesForm<L>(CodeletDft<R>{}, re, im, twRe, twIm, s, m, group, lane);
@@ -140,7 +145,8 @@ struct CodeletForms {
           t.combineComplex[R] = &ComplexCombine<R>, t.leafRealFrom[R] = &RealLeafFrom<R>,
           t.combineRealFrom[R] = &RealCombineFrom<R>, t.leafComplexFrom[R] = &ComplexLeafFrom<R>,
           t.combineComplexFrom[R] = &ComplexCombineFrom<R>, t.leafRealLanes[R] = &RealLeafLanes<R>,
-          t.leafComplexLanes[R] = &ComplexLeafLanes<R>, t.combineComplexLanes[R] = &ComplexCombineLanes<R>),
+          t.leafComplexLanes[R] = &ComplexLeafLanes<R>, t.combineRealLanes[R] = &RealCombineLanes<R>,
+          t.combineComplexLanes[R] = &ComplexCombineLanes<R>),
          ...);
     }
 };

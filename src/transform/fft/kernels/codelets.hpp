@@ -24,7 +24,9 @@ using FftRealLeafLanes = void (*)(const double* in, double* out, ptrdiff_t inStr
 using FftComplexLeafLanes = void (*)(const double* inRe, const double* inIm, double* outRe, double* outIm,
                                      ptrdiff_t inStride, ptrdiff_t outStride, int32_t count, int32_t group,
                                      ptrdiff_t inLane, ptrdiff_t outLane);
-// Complex combines side by side: `group` combines, combine g at re + g lane and im + g lane.
+// Combines side by side: `group` combines, combine g at data + g lane (complex: re and im).
+using FftRealCombineLanes = void (*)(double* data, const double* twRe, const double* twIm, ptrdiff_t stride,
+                                     int32_t m, int32_t group, ptrdiff_t lane);
 using FftComplexCombineLanes = void (*)(double* re, double* im, const double* twRe, const double* twIm,
                                         ptrdiff_t stride, int32_t m, int32_t group, ptrdiff_t lane);
 
@@ -39,6 +41,7 @@ struct CodeletTables {
     FftComplexCombineFrom combineComplexFrom[kFftMaxRadix + 1];
     FftRealLeafLanes leafRealLanes[kFftMaxRadix + 1];
     FftComplexLeafLanes leafComplexLanes[kFftMaxRadix + 1];
+    FftRealCombineLanes combineRealLanes[kFftMaxRadix + 1];
     FftComplexCombineLanes combineComplexLanes[kFftMaxRadix + 1];
 };
 

@@ -283,6 +283,66 @@ struct MiddleColumnOut {
     }
 };
 
+// The column pair (k, m-k) and the middle column of a real combine, with the lanes across
+// combines that stand side by side, `lane` apart (see RealCombineLanesForm).
+template <class L>
+struct MemberPairIn {
+    using V = typename L::V;
+    const double* front;
+    const double* back;
+    ptrdiff_t ms, lane;
+    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
+        r = L::Load(front + j * ms, lane);
+        i = L::Load(back + j * ms, lane);
+    }
+};
+
+template <class L>
+struct MemberPairOut {
+    using V = typename L::V;
+    double* front;
+    double* back;
+    ptrdiff_t ms, lane;
+    int32_t r;
+    TW_FFT_INLINE void C(int32_t q, V re, V im) const {
+        const bool low = 2 * q < r;
+        L::Store(front + q * ms, lane, low ? re : -im);
+        L::Store(back + (r - 1 - q) * ms, lane, low ? im : re);
+    }
+};
+
+template <class L>
+struct MemberMiddleIn {
+    using V = typename L::V;
+    const double* p;
+    const double* wr;
+    const double* wi;
+    ptrdiff_t ms, wstep, lane;
+    TW_FFT_INLINE void C(int32_t j, V& re, V& im) const {
+        if (j == 0) {
+            re = L::Load(p, lane);
+            im = V{};
+        } else {
+            const V v = L::Load(p + j * ms, lane);
+            re = v * L::Broadcast(wr + j * wstep);
+            im = v * L::Broadcast(wi + j * wstep);
+        }
+    }
+};
+
+template <class L>
+struct MemberMiddleOut {
+    using V = typename L::V;
+    double* p;
+    ptrdiff_t ms, lane;
+    int32_t r;
+    TW_FFT_INLINE void C(int32_t q, V re, V im) const {
+        if (2 * q + 1 > r) return;
+        L::Store(p + q * ms, lane, re);
+        if (2 * q + 1 < r) L::Store(p + (r - 1 - q) * ms, lane, im);
+    }
+};
+
 // Scalar columns: on the stack for a compile-time radix, else the policy's scratch (4 radix f64).
 template <int R>
 struct Columns {
@@ -682,6 +742,40 @@ void ComplexCombineLanesForm(const P& p, double* re, double* im, const double* t
         }
     }
     for (; g < group; ++g) ComplexCombineForm<L>(p, re + g * lane, im + g * lane, twRe, twIm, s, m);
+}
+
+// `group` real combines side by side, combine g at data + g lane, with the vector lanes across
+// the combines as in ComplexCombineLanesForm: column 0, the column pairs and the middle column
+// each take one block per four combines. For the outlined radices only, whose scalar column 0 and
+// middle column cost each combine as much as two vector blocks; the small ones do better alone,
+// where their columns load whole.
+template <class L, class P>
+void RealCombineLanesForm(const P& p, double* data, const double* twRe, const double* twIm, ptrdiff_t s,
+                          int32_t m, int32_t group, ptrdiff_t lane) {
+    int32_t g = 0;
+    if constexpr (L::kWidth > 1 && P::kOutlined) {
+        using V = typename L::V;
+        const int32_t r = p.radix;
+        const ptrdiff_t ms = static_cast<ptrdiff_t>(m) * s;
+        for (; g + L::kWidth <= group; g += L::kWidth) {
+            double* d = data + g * lane;
+            RunReal<V>(p, RealIn<L, false>{d, ms, lane}, RealOut<L>{d, ms, lane, 0});
+            for (int32_t k = 1; k <= (m - 1) / 2; ++k) {
+                const ptrdiff_t w = ColumnTwiddles(k, m), rs = Opaque<P>(ms), ls = Opaque<P>(lane);
+                double* front = d + k * s;
+                double* back = d + (m - k) * s;
+                const SharedTwiddledIn<L, MemberPairIn<L>> in{{front, back, rs, ls}, twRe + w, twIm + w, m - 1};
+                RunComplex<V>(p, in, MemberPairOut<L>{front, back, rs, ls, r});
+            }
+            if (m % 2 == 0) {
+                const ptrdiff_t w = ColumnTwiddles(m / 2, m);
+                double* mid = d + (m / 2) * s;
+                RunComplex<V>(p, MemberMiddleIn<L>{mid, twRe + w, twIm + w, ms, m - 1, lane},
+                              MemberMiddleOut<L>{mid, ms, lane, r});
+            }
+        }
+    }
+    for (; g < group; ++g) RealCombineForm<L>(p, data + g * lane, twRe, twIm, s, m);
 }
 
 // Combines whose rows lie far apart (the upper levels of long transforms) run in chunks of
