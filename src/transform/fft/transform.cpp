@@ -114,30 +114,27 @@ int32_t RaderGroup(int32_t p, int32_t count) {
     return p - 1 < kRaderGroupLength ? std::min(count, kRaderGroup) : 1;
 }
 
-Status RaderLeaf(const FftTable* t, int32_t i, RealPtr in, RealPtr out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
-    const int32_t p = t->factors[i], group = RaderGroup(p, count);
-    Scratch<double> scratch;
-    if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p) * static_cast<size_t>(group))) return s;
-    Status s = 0;
-    for (int32_t q = 0; q < count && s == 0; q += group) {
-        const int32_t g = std::min(group, count - q);
-        s = RaderReal(t->stages[i], p, in.p + q * si, count * si, si, out.p + static_cast<ptrdiff_t>(q) * p * so, so,
-                      static_cast<ptrdiff_t>(p) * so, g, scratch.get());
-    }
-    return MergeRelease(s, scratch.Release());
+// Rader's DFTs of a group of g members (see RaderComplex), on either kind of data.
+Status RaderGroupDft(const FftStage* st, int32_t p, RealPtr x, ptrdiff_t xs, ptrdiff_t xl, RealPtr y, ptrdiff_t ys,
+                     ptrdiff_t yl, int32_t g, double* work) {
+    return RaderReal(st, p, x.p, xs, xl, y.p, ys, yl, g, work);
 }
 
-Status RaderLeaf(const FftTable* t, int32_t i, ComplexPtr in, ComplexPtr out, ptrdiff_t si, ptrdiff_t so,
-                 int32_t count) {
+Status RaderGroupDft(const FftStage* st, int32_t p, ComplexPtr x, ptrdiff_t xs, ptrdiff_t xl, ComplexPtr y,
+                     ptrdiff_t ys, ptrdiff_t yl, int32_t g, double* work) {
+    return RaderComplex(st, p, x.re, x.im, xs, xl, y.re, y.im, ys, yl, g, work);
+}
+
+template <class D>
+Status RaderLeaf(const FftTable* t, int32_t i, D in, D out, ptrdiff_t si, ptrdiff_t so, int32_t count) {
     const int32_t p = t->factors[i], group = RaderGroup(p, count);
     Scratch<double> scratch;
     if (const Status s = scratch.Allocate(4 * static_cast<size_t>(p) * static_cast<size_t>(group))) return s;
     Status s = 0;
     for (int32_t q = 0; q < count && s == 0; q += group) {
         const int32_t g = std::min(group, count - q);
-        const ptrdiff_t o = static_cast<ptrdiff_t>(q) * p * so;
-        s = RaderComplex(t->stages[i], p, in.re + q * si, in.im + q * si, count * si, si, out.re + o, out.im + o, so,
-                         static_cast<ptrdiff_t>(p) * so, g, scratch.get());
+        s = RaderGroupDft(t->stages[i], p, in.At(q * si), count * si, si, out.At(static_cast<ptrdiff_t>(q) * p * so),
+                          so, static_cast<ptrdiff_t>(p) * so, g, scratch.get());
     }
     return MergeRelease(s, scratch.Release());
 }

@@ -111,24 +111,31 @@ inline ptrdiff_t ColumnTwiddles(int32_t c, int32_t m) {
     return static_cast<ptrdiff_t>(c - 1) - static_cast<ptrdiff_t>(m - 1);
 }
 
+// How a block's lanes take their twiddles: Columns, the lanes are neighbouring columns; Crossed,
+// the same in the lane order of the unit pair loads below; Shared, the lanes run across transforms
+// at the same column, which all take that column's twiddle (see ComplexCombineLanesForm).
+enum class TwiddleLanes { Columns, Crossed, Shared };
+
 // An input whose element j >= 1 is multiplied by the twiddle at j of its column; w is the
-// column's ColumnTwiddles offset, rows of twiddles stand wstep apart. Crossed: the lanes are in
-// the order of the unit pair loads below.
-template <class L, class In, bool Crossed = false>
+// column's ColumnTwiddles offset, rows of twiddles stand wstep apart.
+template <class L, class In, TwiddleLanes T = TwiddleLanes::Columns>
 struct TwiddledIn {
     using V = typename L::V;
     In data;
     const double* wr;
     const double* wi;
     ptrdiff_t wstep;
+    static TW_FFT_INLINE V Load(const double* w) {
+        if constexpr (T == TwiddleLanes::Crossed)
+            return L::LoadUnitCrossed(w);
+        else if constexpr (T == TwiddleLanes::Shared)
+            return L::Broadcast(w);
+        else
+            return L::LoadUnit(w);
+    }
     TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
         data.C(j, r, i);
-        if (j > 0) {
-            if constexpr (Crossed)
-                Twiddle(r, i, L::LoadUnitCrossed(wr + j * wstep), L::LoadUnitCrossed(wi + j * wstep));
-            else
-                Twiddle(r, i, L::LoadUnit(wr + j * wstep), L::LoadUnit(wi + j * wstep));
-        }
+        if (j > 0) Twiddle(r, i, Load(wr + j * wstep), Load(wi + j * wstep));
     }
 };
 
@@ -160,21 +167,6 @@ struct UnitPairOut {
     double* p;
     ptrdiff_t step;
     TW_FFT_INLINE void C(int32_t k, V r, V i) const { L::StorePairUnit(p + k * step, r, i); }
-};
-
-// The same with one column's twiddles for all lanes, which then run across transforms that are
-// at the same column (see ComplexCombineLanesForm).
-template <class L, class In>
-struct SharedTwiddledIn {
-    using V = typename L::V;
-    In data;
-    const double* wr;
-    const double* wi;
-    ptrdiff_t wstep;
-    TW_FFT_INLINE void C(int32_t j, V& r, V& i) const {
-        data.C(j, r, i);
-        if (j > 0) Twiddle(r, i, L::Broadcast(wr + j * wstep), L::Broadcast(wi + j * wstep));
-    }
 };
 
 // Real values at p, element j at j step; lanes at `lane`, which is 1 when Unit.
@@ -554,7 +546,7 @@ Status ComplexCombineLoop(const P& p, double* re, double* im, const double* twRe
         if (s == 2) {
             for (; j + L::kWidth <= end; j += L::kWidth) {
                 const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ws = Opaque<P, ptrdiff_t>(m - 1);
-                const TwiddledIn<L, UnitPairIn<L>, true> in{{re + j * s, rs}, twRe + w, twIm + w, ws};
+                const TwiddledIn<L, UnitPairIn<L>, TwiddleLanes::Crossed> in{{re + j * s, rs}, twRe + w, twIm + w, ws};
                 if (const Status st = RunComplex<typename L::V>(p, in, UnitPairOut<L>{re + j * s, rs})) return st;
             }
         }
@@ -725,7 +717,7 @@ void ComplexCombineLanesLoop(const P& p, double* re, double* im, const double* t
         RunComplex<typename L::V>(p, ComplexIn<L, true>{r, i, ms, lane}, ComplexOut<L, true>{r, i, ms, lane, 0});
         for (int32_t j = 1; j < m; ++j) {
             const ptrdiff_t w = ColumnTwiddles(j, m), rs = Opaque<P>(ms), ls = Opaque<P>(lane);
-            const SharedTwiddledIn<L, ComplexIn<L, true>> in{{r + j * s, i + j * s, rs, ls}, twRe + w, twIm + w, m - 1};
+            const TwiddledIn<L, ComplexIn<L, true>, TwiddleLanes::Shared> in{{r + j * s, i + j * s, rs, ls}, twRe + w, twIm + w, m - 1};
             RunComplex<typename L::V>(p, in, ComplexOut<L, true>{r + j * s, i + j * s, rs, ls, 0});
         }
     }
@@ -764,7 +756,7 @@ void RealCombineLanesForm(const P& p, double* data, const double* twRe, const do
                 const ptrdiff_t w = ColumnTwiddles(k, m), rs = Opaque<P>(ms), ls = Opaque<P>(lane);
                 double* front = d + k * s;
                 double* back = d + (m - k) * s;
-                const SharedTwiddledIn<L, MemberPairIn<L>> in{{front, back, rs, ls}, twRe + w, twIm + w, m - 1};
+                const TwiddledIn<L, MemberPairIn<L>, TwiddleLanes::Shared> in{{front, back, rs, ls}, twRe + w, twIm + w, m - 1};
                 RunComplex<V>(p, in, MemberPairOut<L>{front, back, rs, ls, r});
             }
             if (m % 2 == 0) {
@@ -802,7 +794,7 @@ int32_t ComplexCombineChunks(const P& p, double* data, const double* twRe, const
         for (int32_t j = 0; j < C; j += L::kWidth) {
             const ptrdiff_t w = ColumnTwiddles(j0 + j, m);
             if constexpr (kUnitPairs<L>) {
-                const TwiddledIn<L, UnitPairIn<L>, true> in{{buf + 2 * j, 2 * C}, twRe + w, twIm + w, m - 1};
+                const TwiddledIn<L, UnitPairIn<L>, TwiddleLanes::Crossed> in{{buf + 2 * j, 2 * C}, twRe + w, twIm + w, m - 1};
                 RunComplex<typename L::V>(p, in, UnitPairOut<L>{buf + 2 * j, 2 * C});
             } else {
                 const TwiddledIn<L, ComplexIn<L, true>> in{{buf + 2 * j, buf + 2 * j + 1, 2 * C, 2}, twRe + w, twIm + w,
