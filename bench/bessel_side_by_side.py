@@ -2,22 +2,15 @@
 # Usage: /usr/bin/python3 bench/bessel_side_by_side.py <build dir with bench_bessel_bench>
 """Runs bench_bessel_bench and times the SciPy ufuncs on the same 1e6 arguments in the same
 session; prints median nanoseconds per point and the ratio ours / SciPy. CPU times throughout."""
-import json
-import subprocess
 import sys
-import time
 
 import numpy as np
 import scipy.special as sc
 
+from per_point import header, our_medians, peer_ns, report
+
 build = sys.argv[1] if len(sys.argv) > 1 else "build"
-raw = subprocess.run([build + "/bench_bessel_bench", "--benchmark_format=json", "--benchmark_repetitions=5",
-                      "--benchmark_report_aggregates_only=true"],
-                     check=True, capture_output=True, text=True).stdout
-ours = {}
-for b in json.loads(raw)["benchmarks"]:
-    if b.get("aggregate_name") == "median":
-        ours[b["run_name"]] = b["cpu_time"]  # milliseconds per 1e6 points: nanoseconds per point
+ours = our_medians(build, "bench_bessel_bench")
 
 n = 1000000
 i = np.arange(n)
@@ -30,12 +23,6 @@ peers = {
     "kn": lambda: sc.kn(v.astype(np.int32), x), "airy": lambda: sc.airy(x - 25.0),
     "ber_bei": lambda: (sc.ber(x), sc.bei(x)), "ker_kei": lambda: (sc.ker(x), sc.kei(x)),
 }
-print("%-8s %10s %10s %8s" % ("function", "ours ns", "scipy ns", "ratio"))
+header()
 for name, f in peers.items():
-    runs = []
-    for _ in range(5):
-        t = time.process_time()
-        f()
-        runs.append(time.process_time() - t)
-    theirs = 1e9 * sorted(runs)[2] / n
-    print("%-8s %10.1f %10.1f %8.2f" % (name, ours[name], theirs, ours[name] / theirs))
+    report(ours, name, peer_ns(f, n))

@@ -3,22 +3,15 @@
 """Runs bench_special_other_bench and times the SciPy ufuncs on the same 1e6 arguments in the same
 session; prints median nanoseconds per point and the ratio ours / SciPy. CPU times throughout.
 Note that sici and shichi are two exports on our side (each computes both) and one ufunc in SciPy."""
-import json
-import subprocess
 import sys
-import time
 
 import numpy as np
 import scipy.special as sc
 
+from per_point import header, our_medians, peer_ns, report
+
 build = sys.argv[1] if len(sys.argv) > 1 else "build"
-raw = subprocess.run([build + "/bench_special_other_bench", "--benchmark_format=json",
-                      "--benchmark_repetitions=5", "--benchmark_report_aggregates_only=true"],
-                     check=True, capture_output=True, text=True).stdout
-ours = {}
-for b in json.loads(raw)["benchmarks"]:
-    if b.get("aggregate_name") == "median":
-        ours[b["run_name"]] = b["cpu_time"]  # milliseconds per 1e6 points: nanoseconds per point
+ours = our_medians(build, "bench_special_other_bench")
 
 n = 1000000
 i = np.arange(n)
@@ -41,14 +34,8 @@ peers = {
     "expn": lambda k: sc.expn((20 * q[k]).astype(np.int32), 0.01 + 20 * p[k]),
     "sici": lambda k: sc.sici(50 * p[k]), "shichi": lambda k: sc.shichi(50 * p[k]),
 }
-print("%-10s %10s %10s %8s" % ("function", "ours ns", "scipy ns", "ratio"))
+header(10)
 with np.errstate(all="ignore"):
     for name, f in peers.items():
         stride = STRIDE.get(name, 1)
-        runs = []
-        for _ in range(5):
-            t = time.process_time()
-            f(slice(None, None, stride))
-            runs.append(time.process_time() - t)
-        theirs = 1e9 * sorted(runs)[2] / (n // stride)
-        print("%-10s %10.1f %10.1f %8.2f" % (name, ours[name], theirs, ours[name] / theirs))
+        report(ours, name, peer_ns(lambda: f(slice(None, None, stride)), n // stride), 10)
